@@ -1,0 +1,12 @@
+# qel_options carries the warnings and sanitizers that everything of ours is built with.
+add_library(qel_options INTERFACE)
+target_compile_options(qel_options INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wconversion)
+
+if(QEL_WERROR)
+  target_compile_options(qel_options INTERFACE -Werror)
+endif()
+
+if(QEL_SANITIZE)
+  target_compile_options(qel_options INTERFACE -fsanitize=${QEL_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  target_link_options(qel_options INTERFACE -fsanitize=${QEL_SANITIZE})
+endif()

@@ -1,0 +1,27 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "platform/PointInTime.h"
+
+namespace platform {
+
+/// Writes points in time by a pattern of Unicode's date-field symbols (UTS #35), in the locale and
+/// the time zone of the process: LC_ALL, LC_TIME or LANG, and TZ, as they are when it is made.
+class DateFormatter {
+ public:
+  explicit DateFormatter(std::string_view pattern);
+  ~DateFormatter();
+  DateFormatter(const DateFormatter&) = delete;
+  DateFormatter& operator=(const DateFormatter&) = delete;
+
+  std::string format(PointInTime date) const;
+
+ private:
+  class Implementation;
+  std::unique_ptr<Implementation> implementation_;
+};
+
+}  // namespace platform

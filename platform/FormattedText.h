@@ -1,0 +1,41 @@
+#pragma once
+
+#include <concepts>
+#include <cstdint>
+#include <initializer_list>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <variant>
+
+namespace platform {
+
+/// One value for a placeholder of `formattedText`.
+class FormatArgument {
+ public:
+  FormatArgument(std::string_view text) : value_(std::optional<std::string_view>(text)) {}
+  FormatArgument(const char* text) : FormatArgument(std::string_view(text)) {}
+  FormatArgument(const std::string& text) : FormatArgument(std::string_view(text)) {}
+  /// An absent text is inserted as "(null)".
+  template <typename TextType>
+  requires std::convertible_to<const TextType&, std::string_view> FormatArgument(
+      const std::optional<TextType>& text)
+      : value_(text ? std::optional<std::string_view>(std::string_view(*text)) : std::nullopt) {}
+  FormatArgument(std::signed_integral auto number) : value_(std::int64_t{number}) {}
+  FormatArgument(std::unsigned_integral auto number) : value_(std::uint64_t{number}) {}
+  FormatArgument(double number) : value_(number) {}
+
+  using Value = std::variant<std::optional<std::string_view>, std::int64_t, std::uint64_t, double>;
+  const Value& value() const { return value_; }
+
+ private:
+  Value value_;
+};
+
+/// The format with its placeholders replaced by the arguments in order, as printf does it: "%@" and
+/// "%s" take a text, "%ld" and "%lu" an integer, "%0.1f" a floating-point number with one decimal,
+/// "%%" is a percent sign. Surplus arguments are ignored; a placeholder without an argument inserts
+/// "(null)".
+std::string formattedText(std::string_view format, std::initializer_list<FormatArgument> arguments);
+
+}  // namespace platform

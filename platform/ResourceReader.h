@@ -1,0 +1,18 @@
+#pragma once
+
+#include <optional>
+#include <string>
+
+#include "platform/ErrorRecord.h"
+#include "platform/URL.h"
+
+namespace platform {
+
+/// Reads the whole resource of a URL (http, https, file:) into memory in one blocking call.
+///
+/// http and https: a final status of 200 is success and nothing else is; at most 20 redirects, to
+/// http and https only; a compressed body is asked for and decompressed; a body cut short is a
+/// failure. On any failure gives no value and fills the slot. The limit is kWholeReadLimit.
+std::optional<std::string> readResource(const URL& url, ErrorSlot& error);
+
+}  // namespace platform

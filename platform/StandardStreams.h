@@ -1,0 +1,45 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "platform/ByteSink.h"
+
+namespace platform {
+
+/// Standard input read to its end, in chunks of whatever size is available. A read error ends it as
+/// the end of the input does, and so does kWholeReadLimit.
+std::string readStandardInput();
+
+/// Writes to standard output through the process's buffered stream; failures are not reported.
+void writeToStandardOutput(std::string_view text);
+void flushStandardOutput();
+
+/// Writes to standard error, unbuffered; failures are not reported.
+void writeToStandardError(std::string_view text);
+
+/// The path that stands for standard output where an output path is expected.
+inline constexpr std::string_view kStandardOutputPath = "/dev/stdout";
+
+/// An output path opened for writing, its content replaced or appended to.
+///
+/// kStandardOutputPath is served by the already open standard output, behind anything printed
+/// before, so that a shell's ">>" appends and a pipe or a socket will do. Failures to open or write
+/// are not reported beyond the result of `write`.
+class OutputFile {
+ public:
+  enum class Mode { kReplace, kAppend };
+  OutputFile(const std::string& path, Mode mode);
+  ~OutputFile();
+  OutputFile(const OutputFile&) = delete;
+  OutputFile& operator=(const OutputFile&) = delete;
+
+  /// False when the file is not open or did not take all bytes.
+  bool write(std::string_view bytes);
+
+ private:
+  int descriptor_ = -1;
+  bool owned_ = false;
+};
+
+}  // namespace platform

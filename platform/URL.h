@@ -1,0 +1,46 @@
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace platform {
+
+/// An absolute URL (RFC 3986), taken apart by the same library that fetches it.
+///
+/// Refused are: texts without a scheme, white space, control characters, any of <>"{}|\^ and the
+/// backquote, a "%" that two hexadecimal digits do not follow, an http or https URL without a host,
+/// a file: URL with a host other than none or localhost. Non-ASCII characters are accepted and
+/// count as their percent-encoded UTF-8.
+class URL {
+ public:
+  static std::optional<URL> parse(std::string_view text);
+
+  /// The URL as it was given.
+  const std::string& text() const { return text_; }
+  /// The URL with non-ASCII characters percent-encoded, as it is sent.
+  const std::string& encodedText() const { return encodedText_; }
+  /// In lower case: "http", "https", "file", ...
+  const std::string& scheme() const { return scheme_; }
+  /// The path as it stands, percent-encoded, without query and fragment.
+  const std::string& encodedPath() const { return encodedPath_; }
+  /// The path percent-decoded; may hold any byte, NUL included.
+  std::string path() const;
+
+  friend bool operator==(const URL& left, const URL& right) { return left.text_ == right.text_; }
+
+ private:
+  std::string text_;
+  std::string encodedText_;
+  std::string scheme_;
+  std::string encodedPath_;
+};
+
+/// The text percent-decoded: "%41" gives "A". A "%" without two hexadecimal digits stays.
+std::string percentDecoded(std::string_view text);
+
+/// The file URL of an absolute path ("/a b" gives "file:///a%20b"), every byte percent-encoded that
+/// RFC 3986 does not allow in a path.
+std::string fileURLText(std::string_view absolutePath);
+
+}  // namespace platform

@@ -1,0 +1,17 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+
+namespace platform {
+
+/// Appends the text to `output`, escaped for the content of an XML 1.0 element so that a parser
+/// reads back the very same text: markup characters and carriage returns as references. Characters
+/// that XML 1.0 cannot hold and bytes that are no UTF-8 are left out.
+void appendEscapedText(std::string& output, std::string_view text);
+
+/// The same for an attribute value in double quotes: tabs, line breaks and double quotes as
+/// references too.
+void appendEscapedAttribute(std::string& output, std::string_view value);
+
+}  // namespace platform

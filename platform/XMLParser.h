@@ -1,0 +1,74 @@
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "platform/ErrorRecord.h"
+
+namespace platform {
+
+/// The name of an element as the document writes it, and its part behind the prefix.
+///
+/// Prefixes are not looked up: a feed with an undeclared prefix is common and readable all the
+/// same, and whoever cares for a prefix compares the qualified name.
+struct XMLName {
+  std::string_view qualified;  // "orvane:image"
+  std::string_view local;      // "image"
+};
+
+/// The attributes of one start tag, valid during the event only.
+class XMLAttributes {
+ public:
+  /// `pairs` is a null-terminated array of name, value, name, value, ...
+  explicit XMLAttributes(const char* const* pairs) : pairs_(pairs) {}
+  /// The value of the attribute of this qualified name, references resolved; absent when there is
+  /// none.
+  std::optional<std::string_view> value(std::string_view name) const;
+
+ private:
+  const char* const* pairs_;
+};
+
+/// Receives the events of an XMLParser. Every text is UTF-8 and valid during the call only.
+class XMLParserEvents {
+ public:
+  virtual ~XMLParserEvents() = default;
+  virtual void didStartElement(const XMLName& name, const XMLAttributes& attributes) = 0;
+  virtual void didEndElement(const XMLName& name) = 0;
+  /// A run of character data, CDATA included. One text may arrive in any number of runs.
+  virtual void foundCharacters(std::string_view text) = 0;
+};
+
+/// An event-driven parser of XML 1.0 over a buffer of bytes, in one pass.
+///
+/// The encoding is told by a byte order mark or the declaration and may be any that the conversion
+/// library knows; without either it is UTF-8. White space before the declaration is skipped.
+/// Internal entities are resolved within the parser's limits on amplification; external entities
+/// and DTDs are never loaded.
+class XMLParser {
+ public:
+  /// Neither the bytes nor the receiver are copied: both must outlive `parse`.
+  XMLParser(std::string_view bytes, XMLParserEvents& events) : bytes_(bytes), events_(events) {}
+
+  /// Runs the whole parse on the calling thread. On a malformed document returns false with a
+  /// description that names the fault, the line and the column (both counted from 1); events that
+  /// came before the fault have been delivered.
+  bool parse(ErrorSlot& error);
+
+  /// Ends the parse from inside an event: `parse` then returns false with this record.
+  void abort(ErrorRecord error) { abortedWith_ = std::move(error); }
+
+  /// Where the current event stands, for messages of the receiver: "line 3, column 7".
+  std::string position() const;
+
+ private:
+  friend struct XMLParserCallbacks;
+  std::string_view bytes_;
+  XMLParserEvents& events_;
+  ErrorSlot abortedWith_;
+  void* running_ = nullptr;  // the library's parser, while parse() runs
+};
+
+}  // namespace platform
