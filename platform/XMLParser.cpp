@@ -2,9 +2,12 @@
 
 #include <expat.h>
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
+#include <cstdint>
 #include <exception>
+#include <iterator>
 #include <memory>
 #include <new>
 #include <type_traits>
