@@ -102,10 +102,11 @@ std::string replacingAll(std::string_view text, std::string_view target,
   return result.append(text);
 }
 
-std::vector<std::string_view> splitAt(std::string_view text, char separator) {
+std::vector<std::string_view> splitAt(std::string_view text, char separator, std::size_t most) {
   std::vector<std::string_view> pieces;
-  for (std::size_t found = text.find(separator); found != std::string_view::npos;
-       found = text.find(separator)) {
+  while (pieces.size() + 1 < most) {
+    const std::size_t found = text.find(separator);
+    if (found == std::string_view::npos) break;
     pieces.push_back(text.substr(0, found));
     text.remove_prefix(found + 1);
   }
@@ -113,10 +114,10 @@ std::vector<std::string_view> splitAt(std::string_view text, char separator) {
   return pieces;
 }
 
-std::vector<std::string_view> splitAtWhitespace(std::string_view text) {
+std::vector<std::string_view> splitAtWhitespace(std::string_view text, std::size_t most) {
   std::vector<std::string_view> pieces;
   std::size_t start = 0;
-  for (std::size_t position = 0; position < text.size();) {
+  for (std::size_t position = 0; position < text.size() && pieces.size() + 1 < most;) {
     const std::size_t characterStart = position;
     if (isHorizontalWhitespace(nextCharacter(text, position))) {
       pieces.push_back(text.substr(start, characterStart - start));
