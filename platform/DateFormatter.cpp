@@ -52,7 +52,7 @@ class DateFormatter::Implementation {
   explicit Implementation(std::string_view pattern)
       : format_(icu::UnicodeString::fromUTF8(icu::StringPiece(pattern)), locale(localeVariable()),
                 status_) {
-    if (U_FAILURE(status_)) return;
+    if (U_FAILURE(status_) != 0) return;
     format_.setTimeZone(TimeZone::local().implementation()->zone());
     // The calendars of some locales are not Gregorian, or count their years otherwise; those that
     // are follow the rules of GregorianCalendar before the year 1582 too.
@@ -65,7 +65,7 @@ class DateFormatter::Implementation {
 
   std::string format(PointInTime date) const {
     std::string result;
-    if (U_FAILURE(status_)) return result;
+    if (U_FAILURE(status_) != 0) return result;
     icu::UnicodeString text;
     format_.format(static_cast<UDate>(date.time_since_epoch().count()), text);
     return text.toUTF8String(result);

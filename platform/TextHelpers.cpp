@@ -20,10 +20,11 @@ bool isASCII(std::string_view text) {
 
 /// Takes the character at `position` and moves behind it; negative for a malformed sequence.
 UChar32 nextCharacter(std::string_view text, std::size_t& position) {
+  const char* bytes = text.data();
   UChar32 character = 0;
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wconversion"  // within the macro
-  U8_NEXT(text.data(), position, text.size(), character);
+  U8_NEXT(bytes, position, text.size(), character);
 #pragma GCC diagnostic pop
   return character;
 }
@@ -59,8 +60,9 @@ std::string caseMapped(std::string_view text, CaseMapping mapping) {
   while (!text.empty()) {
     std::size_t length = text.size();
     if (length > kPieceLimit) {
+      const char* bytes = text.data();
       length = kPieceLimit;
-      U8_TRUNCATE_IF_INCOMPLETE(text.data(), 0, length);
+      U8_TRUNCATE_IF_INCOMPLETE(bytes, 0, length);
     }
     UErrorCode status = U_ZERO_ERROR;
     mapping("", 0, icu::StringPiece(text.data(), static_cast<std::int32_t>(length)), sink, nullptr,

@@ -1,10 +1,10 @@
 #include "platform/TimeZone.h"
 
-#include <time.h>
 #include <unicode/simpletz.h>
 #include <unicode/unistr.h>
 
 #include <cstdlib>
+#include <ctime>
 #include <mutex>
 
 #include "platform/TimeZoneImplementation.h"
@@ -36,7 +36,9 @@ std::unique_ptr<const icu::TimeZone> databaseZone(std::string_view name) {
   UBool isInDatabase = 0;
   UErrorCode status = U_ZERO_ERROR;
   icu::TimeZone::getCanonicalID(id, canonicalID, isInDatabase, status);
-  if (U_FAILURE(status) || !isInDatabase || canonicalID == UCAL_UNKNOWN_ZONE_ID) return nullptr;
+  if (U_FAILURE(status) != 0 || isInDatabase == 0 || canonicalID == UCAL_UNKNOWN_ZONE_ID) {
+    return nullptr;
+  }
   return std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id));
 }
 
