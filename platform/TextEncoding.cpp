@@ -3,11 +3,11 @@
 #include <unicode/ucnv.h>
 #include <unicode/ucnv_cb.h>
 
-#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <utility>
 
 namespace platform {
 
@@ -36,7 +36,7 @@ void writeReplacementCharacter(const void* /*context*/, UConverterToUnicodeArgs*
 Converter openConverter(const std::string& encoding) {
   UErrorCode status = U_ZERO_ERROR;
   Converter converter(ucnv_open(encoding.c_str(), &status));
-  return U_SUCCESS(status) ? std::move(converter) : nullptr;
+  return U_SUCCESS(status) != 0 ? std::move(converter) : nullptr;
 }
 
 }  // namespace
@@ -67,7 +67,7 @@ std::optional<std::string> convertedToUTF8(std::string_view bytes, std::string_v
     if (status != U_BUFFER_OVERFLOW_ERROR) break;
     result.resize(result.size() * 2);
   }
-  if (U_FAILURE(status)) return std::nullopt;
+  if (U_FAILURE(status) != 0) return std::nullopt;
   result.resize(written);
   return result;
 }
@@ -76,7 +76,7 @@ std::optional<std::string> canonicalEncodingName(std::string_view encoding) {
   if (!isPlausibleName(encoding)) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
   const char* const name = ucnv_getAlias(std::string(encoding).c_str(), 0, &status);
-  if (U_FAILURE(status) || name == nullptr) return std::nullopt;
+  if (U_FAILURE(status) != 0 || name == nullptr) return std::nullopt;
   return name;
 }
 
