@@ -13,9 +13,10 @@ namespace platform {
 /// One value for a placeholder of `formattedText`.
 class FormatArgument {
  public:
-  FormatArgument(std::string_view text) : value_(std::optional<std::string_view>(text)) {}
-  FormatArgument(const char* text) : FormatArgument(std::string_view(text)) {}
-  FormatArgument(const std::string& text) : FormatArgument(std::string_view(text)) {}
+  template <typename TextType>
+  requires std::convertible_to<const TextType&, std::string_view> FormatArgument(
+      const TextType& text)
+      : value_(std::optional<std::string_view>(std::string_view(text))) {}
   /// An absent text is inserted as "(null)".
   template <typename TextType>
   requires std::convertible_to<const TextType&, std::string_view> FormatArgument(

@@ -10,4 +10,8 @@ namespace platform {
 /// Malformed input becomes U+FFFD. Absent when the encoding is not known.
 std::optional<std::string> convertedToUTF8(std::string_view bytes, std::string_view encoding);
 
+/// The one name of an encoding that all its aliases lead to ("ISO-8859-1" for "latin1"). Absent
+/// when the encoding is not known.
+std::optional<std::string> canonicalEncodingName(std::string_view encoding);
+
 }  // namespace platform

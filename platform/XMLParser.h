@@ -44,31 +44,40 @@ class XMLParserEvents {
 /// An event-driven parser of XML 1.0 over a buffer of bytes, in one pass.
 ///
 /// The encoding is told by a byte order mark or the declaration and may be any that the conversion
-/// library knows; without either it is UTF-8. White space before the declaration is skipped.
+/// library knows; without either it is UTF-8. A document labelled ISO-8859-1 or US-ASCII is read as
+/// windows-1252, which is what such documents mean. White space before the declaration is skipped.
+///
 /// Internal entities are resolved within the parser's limits on amplification; external entities
-/// and DTDs are never loaded.
+/// and DTDs are never loaded. A reference to a declared external entity gives no characters; a
+/// reference to an undeclared one is a fault, unless the document names an external DTD that could
+/// declare it and is not standalone: then it gives no characters either.
 class XMLParser {
  public:
   /// Neither the bytes nor the receiver are copied: both must outlive `parse`.
   XMLParser(std::string_view bytes, XMLParserEvents& events) : bytes_(bytes), events_(events) {}
 
   /// Runs the whole parse on the calling thread. On a malformed document returns false with a
-  /// description that names the fault, the line and the column (both counted from 1); events that
-  /// came before the fault have been delivered.
+  /// description that names the fault, the line and the column (both counted from 1, the column in
+  /// characters): "mismatched tag at line 3, column 7". Events that came before the fault have been
+  /// delivered. Records have the domain "XML" and expat's codes. Exhausted memory, in an event too,
+  /// is such an error, but may have no place; other exceptions of an event pass through.
   bool parse(ErrorSlot& error);
 
-  /// Ends the parse from inside an event: `parse` then returns false with this record.
+  /// Ends the parse from inside an event: no other event follows, and `parse` returns false with
+  /// this record.
   void abort(ErrorRecord error) { abortedWith_ = std::move(error); }
 
-  /// Where the current event stands, for messages of the receiver: "line 3, column 7".
+  /// Where the current event stands, for messages of the receiver: "line 3, column 7". Counts from
+  /// the start of the document, so it is not for every event. Empty outside of `parse`.
   std::string position() const;
 
  private:
-  friend struct XMLParserCallbacks;
+  struct Run;
+
   std::string_view bytes_;
   XMLParserEvents& events_;
   ErrorSlot abortedWith_;
-  void* running_ = nullptr;  // the library's parser, while parse() runs
+  const Run* run_ = nullptr;  // while parse() runs
 };
 
 }  // namespace platform

@@ -1,0 +1,287 @@
+#include "platform/XMLParser.h"
+
+#include <expat.h>
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <exception>
+#include <iterator>
+#include <memory>
+#include <new>
+#include <type_traits>
+
+#include "platform/TextEncoding.h"
+
+namespace platform {
+
+using namespace std::string_view_literals;
+
+namespace {
+
+constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
+constexpr std::string_view kWhitespace = " \t\r\n";
+constexpr std::string_view kDeclarationStart = "<?xml";
+
+// The parser takes its input in ints and copies it into a buffer that it grows by doubling, and it
+// scans a tag that a piece cuts anew with the next one. Pieces of this size bound the buffer, and
+// are so few that the scanning stays linear.
+constexpr std::size_t kPieceSize = std::size_t{64} << 20;
+
+struct ByteOrderMark {
+  std::string_view bytes;
+  std::string_view encoding;
+};
+// The marks of UTF-32 stand before those of UTF-16 that they begin with.
+constexpr std::array<ByteOrderMark, 5> kByteOrderMarks = {{{kUTF8Mark, "UTF-8"},
+                                                           {"\xFF\xFE\0\0"sv, "UTF-32LE"},
+                                                           {"\0\0\xFE\xFF"sv, "UTF-32BE"},
+                                                           {"\xFF\xFE"sv, "UTF-16LE"},
+                                                           {"\xFE\xFF"sv, "UTF-16BE"}}};
+
+struct ShownEncoding {
+  std::string_view encoding;
+  std::size_t markLength = 0;
+};
+
+// "line 3, column 7" for what stands behind these characters.
+std::string positionBehind(std::string_view text) {
+  std::size_t line = 1;
+  std::size_t column = 1;
+  char previous = '\0';
+  for (const char character : text) {
+    const bool endsLine = character == '\n' || character == '\r';
+    if (endsLine && !(character == '\n' && previous == '\r')) {
+      ++line;
+      column = 1;
+    } else if (!endsLine && (static_cast<unsigned char>(character) & 0xC0U) != 0x80U) {
+      ++column;
+    }
+    previous = character;
+  }
+  return "line " + std::to_string(line) + ", column " + std::to_string(column);
+}
+
+ErrorRecord recordOf(XML_Error code, std::string description) {
+  return {"XML", static_cast<std::int64_t>(code), std::move(description)};
+}
+
+bool isEncodingName(std::string_view name) {
+  constexpr std::string_view kLetters = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
+  constexpr std::string_view kCharacters =
+      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789._-";
+  return !name.empty() && kLetters.find(name.front()) != std::string_view::npos &&
+         name.find_first_not_of(kCharacters) == std::string_view::npos;
+}
+
+// The encoding that the XML declaration names; empty when there is none, and when the declaration
+// is malformed, which is then the parser's to report.
+std::string_view declaredEncoding(std::string_view text) {
+  text.remove_prefix(std::min(text.find_first_not_of(kWhitespace), text.size()));
+  if (!text.starts_with(kDeclarationStart)) return {};
+  text = text.substr(kDeclarationStart.size(), text.find('>') - kDeclarationStart.size());
+  const auto skipWhitespace = [&text] {
+    text.remove_prefix(std::min(text.find_first_not_of(kWhitespace), text.size()));
+  };
+  while (true) {
+    skipWhitespace();
+    const std::string_view name = text.substr(0, text.find_first_of("= \t\r\n"));
+    text.remove_prefix(name.size());
+    skipWhitespace();
+    if (!text.starts_with('=')) return {};
+    text.remove_prefix(1);
+    skipWhitespace();
+    if (!text.starts_with('"') && !text.starts_with('\'')) return {};
+    const std::size_t end = text.find(text.front(), 1);
+    if (end == std::string_view::npos) return {};
+    const std::string_view value = text.substr(1, end - 1);
+    text.remove_prefix(end + 1);
+    if (name == "encoding") return isEncodingName(value) ? value : std::string_view();
+  }
+}
+
+// The encoding that the first bytes of a document show, and the length of their byte order mark.
+// No encoding when they show none: then the declaration can be read byte by byte.
+ShownEncoding encodingShownBy(std::string_view bytes) {
+  for (const ByteOrderMark& mark : kByteOrderMarks) {
+    if (bytes.starts_with(mark.bytes)) return {mark.encoding, mark.bytes.size()};
+  }
+  // Without a mark, UTF-16 and UTF-32 show in the zeros around the first character, which is "<" or
+  // white space.
+  if (bytes.size() < 4) return {};
+  const auto isZero = [bytes](std::size_t index) { return bytes[index] == '\0'; };
+  if (isZero(0) && isZero(1) && isZero(2)) return {"UTF-32BE"};
+  if (isZero(1) && isZero(2) && isZero(3)) return {"UTF-32LE"};
+  if (isZero(0)) return {"UTF-16BE"};
+  if (isZero(1)) return {"UTF-16LE"};
+  return {};
+}
+
+// The encoding to read a document as whose declaration, readable byte by byte, names this one.
+// Absent when it is not known.
+std::optional<std::string> encodingMeantBy(std::string_view declared) {
+  std::optional<std::string> name = canonicalEncodingName(declared);
+  // Such a declaration is wrong when it claims wide characters.
+  if (name && (name->starts_with("UTF-16") || name->starts_with("UTF-32"))) return "UTF-8";
+  if (name == "ISO-8859-1" || name == "US-ASCII") return "windows-1252";
+  return name;
+}
+
+// A document as UTF-8 without a byte order mark: a view of the bytes themselves where they are that
+// already, of `converted` otherwise. Absent, with the error, when the encoding is not known.
+std::optional<std::string_view> textOf(std::string_view bytes, std::string& converted,
+                                       ErrorSlot& error) {
+  const ShownEncoding shown = encodingShownBy(bytes);
+  const std::string_view text = bytes.substr(shown.markLength);
+  std::string_view label = shown.encoding;
+  std::optional<std::string> encoding(label);
+  std::size_t labelPosition = 0;
+  if (label.empty()) {
+    label = declaredEncoding(text);
+    if (label.empty()) return text;
+    labelPosition = static_cast<std::size_t>(label.data() - text.data());
+    encoding = encodingMeantBy(label);
+  }
+  if (encoding == "UTF-8") return text;
+
+  std::optional<std::string> result;
+  if (encoding) result = convertedToUTF8(text, *encoding);
+  if (!result) {
+    error =
+        recordOf(XML_ERROR_UNKNOWN_ENCODING, "unknown encoding \"" + std::string(label) + "\" at " +
+                                                 positionBehind(text.substr(0, labelPosition)));
+    return std::nullopt;
+  }
+  converted = std::move(*result);
+  return converted;
+}
+
+XMLName nameOf(const XML_Char* name) {
+  const std::string_view qualified(name);
+  return {qualified, qualified.substr(qualified.find(':') + 1)};
+}
+
+struct ParserFreer {
+  void operator()(XML_Parser parser) const { XML_ParserFree(parser); }
+};
+
+}  // namespace
+
+std::optional<std::string_view> XMLAttributes::value(std::string_view name) const {
+  for (const char* const* pair = pairs_; *pair != nullptr; pair += 2) {
+    if (name == pair[0]) return pair[1];
+  }
+  return std::nullopt;
+}
+
+// One run of the library's parser over the text of a document.
+struct XMLParser::Run {
+  Run(XMLParser& parser, std::string_view documentText) : owner(parser), text(documentText) {
+    // The text is UTF-8 by now, whatever its declaration says.
+    handle.reset(XML_ParserCreate("UTF-8"));
+    if (!handle) throw std::bad_alloc();
+    XML_SetUserData(handle.get(), this);
+    XML_SetElementHandler(handle.get(), startElement, endElement);
+    XML_SetCharacterDataHandler(handle.get(), characters);
+    owner.run_ = this;
+  }
+  ~Run() { owner.run_ = nullptr; }
+  Run(const Run&) = delete;
+  Run& operator=(const Run&) = delete;
+
+  // False when the library found a fault or an event ended the run.
+  bool feed() {
+    start = std::min(text.find_first_not_of(kWhitespace), text.size());
+    // A mark in front keeps the library from guessing at UTF-16.
+    const auto feedPiece = [this](std::string_view piece, bool isLast) {
+      return XML_Parse(handle.get(), piece.data(), static_cast<int>(piece.size()),
+                       static_cast<int>(isLast)) == XML_STATUS_OK;
+    };
+    bool succeeded = feedPiece(kUTF8Mark, false);
+    std::string_view rest = text.substr(start);
+    do {
+      const std::string_view piece = rest.substr(0, kPieceSize);
+      rest.remove_prefix(piece.size());
+      succeeded = succeeded && feedPiece(piece, rest.empty());
+    } while (succeeded && !rest.empty());
+    return succeeded;
+  }
+
+  std::string position() const {
+    const XML_Index index = XML_GetCurrentByteIndex(handle.get()) - std::ssize(kUTF8Mark);
+    return positionBehind(
+        text.substr(0, start + static_cast<std::size_t>(std::max<XML_Index>(index, 0))));
+  }
+
+  ErrorRecord fault() const {
+    const XML_Error code = XML_GetErrorCode(handle.get());
+    return recordOf(code, std::string(XML_ErrorString(code)) + " at " + position());
+  }
+
+  bool isEnded() const { return thrown || owner.abortedWith_; }
+
+  // An exception must not pass through the library, and no event may follow the one that ended the
+  // run, though the library may have some left (the end of an empty element).
+  template <typename Event>
+  void deliver(Event event) {
+    if (isEnded()) return;
+    try {
+      event(owner.events_);
+    } catch (...) {
+      thrown = std::current_exception();
+    }
+    if (isEnded()) XML_StopParser(handle.get(), XML_FALSE);
+  }
+
+  static void XMLCALL startElement(void* run, const XML_Char* name, const XML_Char** attributes) {
+    static_cast<Run*>(run)->deliver([&](XMLParserEvents& events) {
+      events.didStartElement(nameOf(name), XMLAttributes(attributes));
+    });
+  }
+
+  static void XMLCALL endElement(void* run, const XML_Char* name) {
+    static_cast<Run*>(run)->deliver(
+        [&](XMLParserEvents& events) { events.didEndElement(nameOf(name)); });
+  }
+
+  static void XMLCALL characters(void* run, const XML_Char* characters, int length) {
+    static_cast<Run*>(run)->deliver([&](XMLParserEvents& events) {
+      events.foundCharacters({characters, static_cast<std::size_t>(length)});
+    });
+  }
+
+  XMLParser& owner;
+  std::string_view text;
+  std::size_t start = 0;  // where in the text the library's input begins
+  std::unique_ptr<std::remove_pointer_t<XML_Parser>, ParserFreer> handle;
+  std::exception_ptr thrown;  // by an event
+};
+
+bool XMLParser::parse(ErrorSlot& error) {
+  abortedWith_.reset();
+  try {
+    std::string converted;
+    const std::optional<std::string_view> text = textOf(bytes_, converted, error);
+    if (!text) return false;
+
+    Run run(*this, *text);
+    const bool succeeded = run.feed();
+    if (run.thrown) std::rethrow_exception(run.thrown);
+    if (abortedWith_) {
+      error = std::move(abortedWith_);
+      return false;
+    }
+    if (!succeeded) error = run.fault();
+    return succeeded;
+  } catch (const std::bad_alloc&) {
+    error = recordOf(XML_ERROR_NO_MEMORY, XML_ErrorString(XML_ERROR_NO_MEMORY));
+    return false;
+  }
+}
+
+std::string XMLParser::position() const {
+  return run_ != nullptr ? run_->position() : std::string();
+}
+
+}  // namespace platform
