@@ -20,10 +20,11 @@ bool isASCII(std::string_view text) {
 
 /// Takes the character at `position` and moves behind it; negative for a malformed sequence.
 UChar32 nextCharacter(std::string_view text, std::size_t& position) {
+  const char* bytes = text.data();
   UChar32 character = 0;
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wconversion"  // within the macro
-  U8_NEXT(text.data(), position, text.size(), character);
+  U8_NEXT(bytes, position, text.size(), character);
 #pragma GCC diagnostic pop
   return character;
 }
@@ -59,8 +60,9 @@ std::string caseMapped(std::string_view text, CaseMapping mapping) {
   while (!text.empty()) {
     std::size_t length = text.size();
     if (length > kPieceLimit) {
+      const char* bytes = text.data();
       length = kPieceLimit;
-      U8_TRUNCATE_IF_INCOMPLETE(text.data(), 0, length);
+      U8_TRUNCATE_IF_INCOMPLETE(bytes, 0, length);
     }
     UErrorCode status = U_ZERO_ERROR;
     mapping("", 0, icu::StringPiece(text.data(), static_cast<std::int32_t>(length)), sink, nullptr,
@@ -102,10 +104,11 @@ std::string replacingAll(std::string_view text, std::string_view target,
   return result.append(text);
 }
 
-std::vector<std::string_view> splitAt(std::string_view text, char separator) {
+std::vector<std::string_view> splitAt(std::string_view text, char separator, std::size_t most) {
   std::vector<std::string_view> pieces;
-  for (std::size_t found = text.find(separator); found != std::string_view::npos;
-       found = text.find(separator)) {
+  while (pieces.size() + 1 < most) {
+    const std::size_t found = text.find(separator);
+    if (found == std::string_view::npos) break;
     pieces.push_back(text.substr(0, found));
     text.remove_prefix(found + 1);
   }
@@ -113,10 +116,10 @@ std::vector<std::string_view> splitAt(std::string_view text, char separator) {
   return pieces;
 }
 
-std::vector<std::string_view> splitAtWhitespace(std::string_view text) {
+std::vector<std::string_view> splitAtWhitespace(std::string_view text, std::size_t most) {
   std::vector<std::string_view> pieces;
   std::size_t start = 0;
-  for (std::size_t position = 0; position < text.size();) {
+  for (std::size_t position = 0; position < text.size() && pieces.size() + 1 < most;) {
     const std::size_t characterStart = position;
     if (isHorizontalWhitespace(nextCharacter(text, position))) {
       pieces.push_back(text.substr(start, characterStart - start));

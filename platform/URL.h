@@ -6,19 +6,21 @@
 
 namespace platform {
 
-/// An absolute URL (RFC 3986), taken apart by the same library that fetches it.
+/// An absolute URL (RFC 3986); what is valid for http and https is what the transfer library takes.
 ///
 /// Refused are: texts without a scheme, white space, control characters, any of <>"{}|\^ and the
-/// backquote, a "%" that two hexadecimal digits do not follow, an http or https URL without a host,
-/// a file: URL with a host other than none or localhost. Non-ASCII characters are accepted and
-/// count as their percent-encoded UTF-8.
+/// backquote, a "%" that two hexadecimal digits do not follow, brackets but around an IP address,
+/// an http or https URL without "//" and a host, a file: URL with a host other than none or
+/// localhost or with a relative path. Non-ASCII characters (of valid UTF-8) are accepted and count
+/// as percent-encoded, those of the host as its internationalised name. Any other scheme is valid.
 class URL {
  public:
   static std::optional<URL> parse(std::string_view text);
 
   /// The URL as it was given.
   const std::string& text() const { return text_; }
-  /// The URL with non-ASCII characters percent-encoded, as it is sent.
+  /// The URL as it is sent: non-ASCII characters percent-encoded, a host with such characters in
+  /// its ASCII form ("xn--...").
   const std::string& encodedText() const { return encodedText_; }
   /// In lower case: "http", "https", "file", ...
   const std::string& scheme() const { return scheme_; }

@@ -40,6 +40,11 @@ constexpr std::array<ByteOrderMark, 5> kByteOrderMarks = {{{kUTF8Mark, "UTF-8"},
                                                            {"\xFF\xFE"sv, "UTF-16LE"},
                                                            {"\xFE\xFF"sv, "UTF-16BE"}}};
 
+struct ShownEncoding {
+  std::string_view encoding;
+  std::size_t markLength = 0;
+};
+
 // "line 3, column 7" for what stands behind these characters.
 std::string positionBehind(std::string_view text) {
   std::size_t line = 1;
@@ -96,57 +101,60 @@ std::string_view declaredEncoding(std::string_view text) {
   }
 }
 
-// UTF-16 and UTF-32 without a byte order mark show in the zeros around the first character, which
-// is "<" or white space.
-std::string_view encodingFromFirstBytes(std::string_view bytes) {
+// The encoding that the first bytes of a document show, and the length of their byte order mark.
+// No encoding when they show none: then the declaration can be read byte by byte.
+ShownEncoding encodingShownBy(std::string_view bytes) {
+  for (const ByteOrderMark& mark : kByteOrderMarks) {
+    if (bytes.starts_with(mark.bytes)) return {mark.encoding, mark.bytes.size()};
+  }
+  // Without a mark, UTF-16 and UTF-32 show in the zeros around the first character, which is "<" or
+  // white space.
   if (bytes.size() < 4) return {};
   const auto isZero = [bytes](std::size_t index) { return bytes[index] == '\0'; };
-  if (isZero(0) && isZero(1) && isZero(2)) return "UTF-32BE";
-  if (isZero(1) && isZero(2) && isZero(3)) return "UTF-32LE";
-  if (isZero(0)) return "UTF-16BE";
-  if (isZero(1)) return "UTF-16LE";
+  if (isZero(0) && isZero(1) && isZero(2)) return {"UTF-32BE"};
+  if (isZero(1) && isZero(2) && isZero(3)) return {"UTF-32LE"};
+  if (isZero(0)) return {"UTF-16BE"};
+  if (isZero(1)) return {"UTF-16LE"};
   return {};
+}
+
+// The encoding to read a document as whose declaration, readable byte by byte, names this one.
+// Absent when it is not known.
+std::optional<std::string> encodingMeantBy(std::string_view declared) {
+  std::optional<std::string> name = canonicalEncodingName(declared);
+  // Such a declaration is wrong when it claims wide characters.
+  if (name && (name->starts_with("UTF-16") || name->starts_with("UTF-32"))) return "UTF-8";
+  if (name == "ISO-8859-1" || name == "US-ASCII") return "windows-1252";
+  return name;
 }
 
 // A document as UTF-8 without a byte order mark: a view of the bytes themselves where they are that
 // already, of `converted` otherwise. Absent, with the error, when the encoding is not known.
 std::optional<std::string_view> textOf(std::string_view bytes, std::string& converted,
                                        ErrorSlot& error) {
-  const auto convert = [&](std::string_view encoded,
-                           std::string_view encoding) -> std::optional<std::string_view> {
-    std::optional<std::string> text = convertedToUTF8(encoded, encoding);
-    if (!text) return std::nullopt;
-    converted = std::move(*text);
-    return converted;
-  };
+  const ShownEncoding shown = encodingShownBy(bytes);
+  const std::string_view text = bytes.substr(shown.markLength);
+  std::string_view label = shown.encoding;
+  std::optional<std::string> encoding(label);
+  std::size_t labelPosition = 0;
+  if (label.empty()) {
+    label = declaredEncoding(text);
+    if (label.empty()) return text;
+    labelPosition = static_cast<std::size_t>(label.data() - text.data());
+    encoding = encodingMeantBy(label);
+  }
+  if (encoding == "UTF-8") return text;
 
-  for (const ByteOrderMark& mark : kByteOrderMarks) {
-    if (!bytes.starts_with(mark.bytes)) continue;
-    bytes.remove_prefix(mark.bytes.size());
-    return mark.bytes == kUTF8Mark ? bytes : convert(bytes, mark.encoding);
+  std::optional<std::string> result;
+  if (encoding) result = convertedToUTF8(text, *encoding);
+  if (!result) {
+    error =
+        recordOf(XML_ERROR_UNKNOWN_ENCODING, "unknown encoding \"" + std::string(label) + "\" at " +
+                                                 positionBehind(text.substr(0, labelPosition)));
+    return std::nullopt;
   }
-  const std::string_view wide = encodingFromFirstBytes(bytes);
-  if (!wide.empty()) return convert(bytes, wide);
-
-  const std::string_view declared = declaredEncoding(bytes);
-  if (declared.empty()) return bytes;
-  const std::optional<std::string> name = canonicalEncodingName(declared);
-  // A declaration that could be read byte by byte is wrong when it claims wide characters.
-  if (name && (*name == "UTF-8" || name->starts_with("UTF-16") || name->starts_with("UTF-32"))) {
-    return bytes;
-  }
-  std::optional<std::string_view> text;
-  if (name) {
-    const bool isLatin = *name == "ISO-8859-1" || *name == "US-ASCII";
-    text = convert(bytes, isLatin ? "windows-1252" : *name);
-  }
-  if (!text) {
-    const std::string_view before =
-        bytes.substr(0, static_cast<std::size_t>(declared.data() - bytes.data()));
-    error = recordOf(XML_ERROR_UNKNOWN_ENCODING, "unknown encoding \"" + std::string(declared) +
-                                                     "\" at " + positionBehind(before));
-  }
-  return text;
+  converted = std::move(*result);
+  return converted;
 }
 
 XMLName nameOf(const XML_Char* name) {

@@ -56,10 +56,11 @@ class XMLParser {
   /// Neither the bytes nor the receiver are copied: both must outlive `parse`.
   XMLParser(std::string_view bytes, XMLParserEvents& events) : bytes_(bytes), events_(events) {}
 
-  /// Runs the whole parse on the calling thread. On a malformed document, and when memory runs out,
-  /// returns false with a description that names the fault, the line and the column (both counted
-  /// from 1, the column in characters): "mismatched tag at line 3, column 7". Events that came
-  /// before the fault have been delivered. Records have the domain "XML" and expat's codes.
+  /// Runs the whole parse on the calling thread. On a malformed document returns false with a
+  /// description that names the fault, the line and the column (both counted from 1, the column in
+  /// characters): "mismatched tag at line 3, column 7". Events that came before the fault have been
+  /// delivered. Records have the domain "XML" and expat's codes. Exhausted memory, in an event too,
+  /// is such an error, but may have no place; other exceptions of an event pass through.
   bool parse(ErrorSlot& error);
 
   /// Ends the parse from inside an event: no other event follows, and `parse` returns false with

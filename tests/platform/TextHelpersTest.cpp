@@ -70,6 +70,17 @@ TEST(TextHelpersTest, SplitAt) {
   EXPECT_THAT(splitAt("::a:", ':'), ElementsAre("", "", "a", ""));
 }
 
+TEST(TextHelpersTest, SplittingStopsAtTheMostPieces) {
+  EXPECT_THAT(splitAt("a:b:c", ':', 4), ElementsAre("a", "b", "c"));
+  EXPECT_THAT(splitAt("a:b:c", ':', 3), ElementsAre("a", "b", "c"));
+  EXPECT_THAT(splitAt("a:b:c", ':', 2), ElementsAre("a", "b:c"));
+  EXPECT_THAT(splitAt("a:b:c", ':', 1), ElementsAre("a:b:c"));
+  EXPECT_THAT(splitAtWhitespace("a b\tc", 4), ElementsAre("a", "b", "c"));
+  EXPECT_THAT(splitAtWhitespace("a b\tc", 3), ElementsAre("a", "b", "c"));
+  EXPECT_THAT(splitAtWhitespace("a b\tc", 2), ElementsAre("a", "b\tc"));
+  EXPECT_THAT(splitAtWhitespace("a b\tc", 1), ElementsAre("a b\tc"));
+}
+
 TEST(TextHelpersTest, SplitAtWhitespaceSeparatesAtEverySingleSpace) {
   EXPECT_THAT(splitAtWhitespace(""), ElementsAre(""));
   EXPECT_THAT(splitAtWhitespace("one"), ElementsAre("one"));

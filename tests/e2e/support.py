@@ -1,0 +1,242 @@
+"""What the end-to-end tests share: running the tool, building its input, judging its output.
+
+The tool is the executable that the environment variable QEL names. It is judged from outside only: by
+its exit status, its two output streams and the files that it writes, read back with Python's own
+property-list and XML modules.
+"""
+
+import os
+import plistlib
+import re
+import resource
+import shutil
+import subprocess
+import tempfile
+import unittest
+import xml.etree.ElementTree as ElementTree
+from pathlib import Path
+from typing import NamedTuple
+from xml.sax.saxutils import escape, quoteattr
+
+from feed_server import FeedServer
+
+DC = "{http://purl.org/dc/elements/1.1/}"
+ORVANE = "{https://orvane.example/ns/podcast-1.0}"
+QEL_NAMESPACE = "{https://qel.example/ns/1.0}"
+
+LOADING = b"[N] Loading/interpreting source...\n"
+
+# A sanitizer that finds a fault ends the tool with this status, which the tool itself never uses.
+SANITIZER_STATUS = 99
+
+# Nothing of the machine may decide a result, unless a test asks for it.
+_HIDDEN_VARIABLES = {"http_proxy", "https_proxy", "all_proxy", "no_proxy", "lang", "language"}
+
+
+class Result(NamedTuple):
+    status: int
+    stdout: bytes
+    stderr: bytes
+
+
+class Crash(AssertionError):
+    """The tool was ended by a signal or by a sanitizer, which no input may bring about."""
+
+
+def tool():
+    """The path of the executable under test."""
+    path = os.environ.get("QEL")
+    if not path:
+        raise RuntimeError("the environment variable QEL must name the executable to test")
+    return path
+
+
+def environment(changes=None):
+    """The environment of a run: this process's, without what could decide a result, and the changes."""
+    values = {name: value for name, value in os.environ.items()
+              if name.lower() not in _HIDDEN_VARIABLES and not name.startswith("LC_")}
+    values.update(TZ="UTC", LC_ALL="C",
+                  ASAN_OPTIONS=f"exitcode={SANITIZER_STATUS}",
+                  UBSAN_OPTIONS=f"halt_on_error=1:print_stacktrace=1:exitcode={SANITIZER_STATUS}")
+    values.update(changes or {})
+    return values
+
+
+def start(*arguments, env=None, **options):
+    """Starts the tool with Popen's options and returns the process."""
+    return subprocess.Popen([tool(), *arguments], env=environment(env), **options)
+
+
+def checked(arguments, status, stdout=b"", stderr=b""):
+    """The result of a run that has ended, whatever it says, unless it crashed."""
+    if status < 0 or status == SANITIZER_STATUS:
+        raise Crash(f"{arguments!r} ended with {status}: {stderr[-4000:].decode(errors='replace')}")
+    return Result(status, stdout, stderr)
+
+
+def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=(), **options):
+    """Runs the tool to its end. A crash and a run longer than the timeout (seconds) are failures.
+
+    memory_limit is the number of bytes that the tool may take, for input made to exhaust memory; closed
+    lists those of the descriptors 0 to 2 that the tool starts without.
+    """
+    env = dict(env or {})
+    address_space = None
+    if memory_limit is not None:
+        if _is_sanitized():
+            env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
+        else:
+            address_space = memory_limit
+
+    def prepare():
+        if address_space is not None:
+            resource.setrlimit(resource.RLIMIT_AS, (address_space, address_space))
+        for descriptor in closed:
+            os.close(descriptor)
+
+    options = {"stdout": subprocess.PIPE, "stderr": subprocess.PIPE, "preexec_fn": prepare, **options}
+    finished = subprocess.run([tool(), *arguments], input=stdin, env=environment(env), timeout=timeout,
+                              check=False, **options)
+    return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
+
+
+def _is_sanitized():
+    """Whether the executable has its own idea of the address space, which a limit would break."""
+    return b"__asan_init" in Path(tool()).read_bytes()
+
+
+# Feeds. Nothing is inserted between the parts, so that every character of a feed is the test's own.
+
+NAMESPACES = ('xmlns:dc="http://purl.org/dc/elements/1.1/" '
+              'xmlns:orvane="https://orvane.example/ns/podcast-1.0" '
+              'xmlns:qel="https://qel.example/ns/1.0"')
+
+
+def rss_text(*parts):
+    """The text of an RSS document whose channel holds the parts."""
+    return f'<rss version="2.0" {NAMESPACES}><channel>{"".join(parts)}</channel></rss>'
+
+
+def rss(*parts):
+    """The bytes of an RSS document in UTF-8 whose channel holds the parts."""
+    return f'<?xml version="1.0" encoding="UTF-8"?>\n{rss_text(*parts)}\n'.encode()
+
+
+def item(*parts):
+    return f'<item>{"".join(parts)}</item>'
+
+
+def element(name, text="", **attributes):
+    """One element with escaped text and attributes, for values that are not written out by hand."""
+    written = "".join(f" {key}={quoteattr(value)}" for key, value in attributes.items())
+    return f"<{name}{written}>{escape(text)}</{name}>"
+
+
+def without_publication_date(feed):
+    """A feed's bytes without the channel's moment of generation, which differs from run to run."""
+    return re.sub(rb"<pubDate>[^<]*</pubDate>", b"", feed, count=1)
+
+
+def tags(parent):
+    """The names of an element's children, with the prefixes that the tool declares."""
+    prefixes = {DC: "dc:", ORVANE: "orvane:", QEL_NAMESPACE: "qel:"}
+    names = []
+    for child in parent:
+        namespace, brace, local = child.tag.rpartition("}")
+        names.append(prefixes.get(namespace + brace, namespace + brace) + local)
+    return names
+
+
+class ToolTestCase(unittest.TestCase):
+    """A test with a directory of its own, in which the tool runs and which is removed afterwards."""
+
+    maxDiff = None
+
+    def setUp(self):
+        self.directory = Path(tempfile.mkdtemp(prefix="qel-e2e-")).resolve()
+        self.addCleanup(shutil.rmtree, self.directory, ignore_errors=True)
+
+    # Input
+
+    def path(self, name):
+        return self.directory / name
+
+    def write(self, name, content):
+        """Writes a file of the test's directory and returns its path."""
+        path = self.path(name)
+        path.write_bytes(content if isinstance(content, bytes) else content.encode())
+        return path
+
+    def reference(self, dictionary=None, name="reference.plist", fmt=plistlib.FMT_XML):
+        """Writes a reference file and returns its path."""
+        return self.write(name, plistlib.dumps(dictionary or {}, fmt=fmt))
+
+    def feed(self, content, name="feed.xml"):
+        """Writes a feed and returns its file: URL."""
+        return self.write(name, content).as_uri()
+
+    def server(self):
+        """A feed server that runs until the test ends."""
+        server = FeedServer()
+        self.addCleanup(server.stop)
+        return server
+
+    # Running
+
+    def run_tool(self, *arguments, **options):
+        options.setdefault("cwd", self.directory)
+        return run(*arguments, **options)
+
+    def parsefeed(self, source, **options):
+        """The reference dictionary that parsefeed writes on standard output for the source."""
+        result = self.run_tool("parsefeed", source, **options)
+        self.assertSucceeds(result)
+        return plistlib.loads(result.stdout)
+
+    def createfeed(self, source, **options):
+        """The root element of the feed that createfeed writes on standard output for the source."""
+        result = self.run_tool("createfeed", source, **options)
+        self.assertSucceeds(result)
+        return ElementTree.fromstring(result.stdout)
+
+    def channel_of(self, dictionary, **options):
+        """The channel element that createfeed makes of a reference dictionary."""
+        source = self.reference(dictionary, fmt=plistlib.FMT_BINARY)
+        channel = self.createfeed(source, **options).find("channel")
+        self.assertIsNotNone(channel)
+        return channel
+
+    def item_of(self, episode, **options):
+        """The item element that createfeed makes of an episode dictionary."""
+        items = self.channel_of({"Episodes": [episode]}, **options).findall("item")
+        self.assertEqual(len(items), 1)
+        return items[0]
+
+    def podcast_of(self, *parts, **options):
+        """The reference dictionary that parsefeed makes of a feed whose channel holds the parts."""
+        return self.parsefeed(self.feed(rss(*parts)), **options)
+
+    def episode_of(self, *parts, **options):
+        """The episode dictionary that parsefeed makes of a feed's item that holds the parts."""
+        episodes = self.podcast_of(item(*parts), **options)["Episodes"]
+        self.assertEqual(len(episodes), 1)
+        return episodes[0]
+
+    # Judging
+
+    def assertSucceeds(self, result, stdout=None):
+        self.assertEqual((result.status, result.stderr), (0, b""))
+        if stdout is not None:
+            self.assertEqual(result.stdout, stdout)
+
+    def assertFails(self, result, message, stdout=b""):
+        """Exit status 1, exactly the message on standard error and exactly stdout on standard output."""
+        expected = message if isinstance(message, bytes) else message.encode()
+        self.assertEqual(result, Result(1, stdout, expected))
+
+    def assertLoadFails(self, result, pattern=r".+", stdout=b""):
+        """A failed load whose description, one that is not the tool's own, matches the whole pattern."""
+        self.assertEqual((result.status, result.stdout), (1, stdout))
+        message = result.stderr.decode()
+        self.assertRegex(message, rf"\A(?s:Could not load source: {pattern})\Z")
+        self.assertNotIn("\n", message)
