@@ -74,20 +74,29 @@ def checked(arguments, status, stdout=b"", stderr=b""):
     return Result(status, stdout, stderr)
 
 
-def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, **options):
+def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=(), **options):
     """Runs the tool to its end. A crash and a run longer than the timeout (seconds) are failures.
 
-    memory_limit is the number of bytes that the tool may take, for input made to exhaust memory.
+    memory_limit is the number of bytes that the tool may take, for input made to exhaust memory; closed
+    lists those of the descriptors 0 to 2 that the tool starts without.
     """
-    limits = {}
+    env = dict(env or {})
+    address_space = None
     if memory_limit is not None:
         if _is_sanitized():
-            env = {"ASAN_OPTIONS": f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}",
-                   **(env or {})}
+            env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
         else:
-            limits["preexec_fn"] = lambda: resource.setrlimit(resource.RLIMIT_AS, (memory_limit,) * 2)
+            address_space = memory_limit
+
+    def prepare():
+        if address_space is not None:
+            resource.setrlimit(resource.RLIMIT_AS, (address_space, address_space))
+        for descriptor in closed:
+            os.close(descriptor)
+
+    options = {"stdout": subprocess.PIPE, "stderr": subprocess.PIPE, "preexec_fn": prepare, **options}
     finished = subprocess.run([tool(), *arguments], input=stdin, env=environment(env), timeout=timeout,
-                              stdout=subprocess.PIPE, stderr=subprocess.PIPE, check=False, **limits, **options)
+                              check=False, **options)
     return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
 
 

@@ -3,11 +3,13 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <functional>
 
 /// Runs the function in a forked child, whose exit status is the function's result, and gives the
 /// status that waitpid told. For what changes or ends a whole process.
 inline int statusOfChild(const std::function<int()>& run) {
+  std::fflush(stdout);  // or the child would print it again
   const pid_t child = ::fork();
   if (child == 0) {
     ::_exit(run());
