@@ -42,6 +42,10 @@ class FeedServer:
         self._server.server_close()
         self._thread.join()
 
+    def use_tls(self, context):
+        """Speaks TLS from now on, by the ssl module's context."""
+        self._server.socket = context.wrap_socket(self._server.socket, server_side=True, do_handshake_on_connect=False)
+
     @property
     def port(self):
         return self._server.server_address[1]
