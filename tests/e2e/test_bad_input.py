@@ -318,7 +318,7 @@ class BinaryListTest(ToolTestCase):
 
     def test_objects_of_every_kind_are_handled(self):
         for kind in range(256):
-            for filling in (b"", b"\x00" * 40, b"\xff" * 40):
+            for filling in (b"", b"\xff" * 40):
                 with self.subTest(kind, filling=filling[:1]):
                     self.assertHandled(binary_list([b"\xd1\x01\x02", self.NAME, bytes([kind]) + filling]))
 

@@ -388,7 +388,7 @@ class DocumentFormTest(ElementTestCase):
         self.assertEqual(self.parsefeed(self.feed(b"\r\n \t" + rss("<title>t</title>"))), {"PodcastName": "t"})
 
     def test_internal_entities_are_resolved(self):
-        document = b'<!DOCTYPE rss [<!ENTITY walk "Night &#38; Walks">]><rss><title>&walk;!</title></rss>'
+        document = b'<!DOCTYPE rss [<!ENTITY walk "Night &#38;#38; Walks">]><rss><title>&walk;!</title></rss>'
         self.assertEqual(self.parsefeed(self.feed(document)), {"PodcastName": "Night & Walks!"})
 
     def test_comments_and_instructions_around_the_root(self):

@@ -223,7 +223,7 @@ class XMLFormTest(ToolTestCase):
         self.assertEqual(self.read(b"<plist><dict/></plist>"), {})
 
     def test_internal_entities_are_resolved(self):
-        content = (b'<!DOCTYPE plist [<!ENTITY name "Night &#38; Walks">]><plist><dict><key>PodcastName</key>'
+        content = (b'<!DOCTYPE plist [<!ENTITY name "Night &#38;#38; Walks">]><plist><dict><key>PodcastName</key>'
                    b"<string>&name;</string></dict></plist>")
         self.assertEqual(self.read(content), {"PodcastName": "Night & Walks"})
 
