@@ -8,5 +8,7 @@ endif()
 
 if(QEL_SANITIZE)
   target_compile_options(qel_options INTERFACE -fsanitize=${QEL_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  # Through the instrumentation g++ takes initialised members for uninitialised ones.
+  target_compile_options(qel_options INTERFACE $<$<CXX_COMPILER_ID:GNU>:-Wno-maybe-uninitialized>)
   target_link_options(qel_options INTERFACE -fsanitize=${QEL_SANITIZE})
 endif()

@@ -44,6 +44,8 @@ class Download {
 
  private:
   class Transfer;
+  class NetworkDownload;
+  class FileDownload;
   std::unique_ptr<Transfer> transfer_;
 };
 

@@ -14,8 +14,9 @@ std::string_view lastPathComponent(std::string_view path);
 /// the component (".profile") and for one that ends it ("name.").
 std::string_view pathExtension(std::string_view path);
 
-/// The last component's extension and its dot removed; a component that only begins with a dot
-/// stays. "name." loses its dot.
+/// The path without its last component's extension, the dot before it and separators behind it; a
+/// path without an extension stays, and so does one that only begins with a dot. "name." loses its
+/// dot.
 std::string_view pathWithoutExtension(std::string_view path);
 
 /// The two joined by one separator, doubled separators collapsed ("a/" and "/b" give "a/b"). An
@@ -24,8 +25,10 @@ std::string joinedPath(std::string_view parent, std::string_view child);
 
 bool isAbsolutePath(std::string_view path);
 
-/// A leading tilde expanded to the home directory, empty and "." components removed, ".." removing
-/// the component before it ("/.." is "/"), no trailing separator. Symbolic links are not resolved.
+/// A leading "~" (or "~user") expanded to the home directory, empty and "." components removed,
+/// ".." removing the component before it ("/.." is "/"), no trailing separator. Symbolic links are
+/// not resolved. A relative path stays relative: it may keep ".." at its start, and is "." when
+/// nothing else is left of it.
 std::string standardisedPath(std::string_view path);
 
 /// The process's working directory, absolute; "/" when it cannot be told.

@@ -3,7 +3,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/ByteSink.h"
+#include "platform/FileDescriptor.h"
 
 namespace platform {
 
@@ -30,7 +30,7 @@ class OutputFile {
  public:
   enum class Mode { kReplace, kAppend };
   OutputFile(const std::string& path, Mode mode);
-  ~OutputFile();
+  ~OutputFile() = default;
   OutputFile(const OutputFile&) = delete;
   OutputFile& operator=(const OutputFile&) = delete;
 
@@ -38,8 +38,8 @@ class OutputFile {
   bool write(std::string_view bytes);
 
  private:
+  FileDescriptor file_;  // not open for standard output
   int descriptor_ = -1;
-  bool owned_ = false;
 };
 
 }  // namespace platform

@@ -4,15 +4,16 @@
 #include <string_view>
 
 #include "platform/ErrorRecord.h"
+#include "platform/FileDescriptor.h"
 
 namespace platform {
 
 /// A file that is written under a hidden name in its destination's directory and gets its final
 /// name in one step once it is whole.
 ///
-/// Unless a commit succeeded, the destructor removes it; so do SIGINT and SIGTERM. A symbolic link
-/// at the final name is replaced, never written through. Move-only is not needed: one scope owns
-/// it.
+/// Unless a commit succeeded, the destructor removes it; so does any failure, and so do SIGINT,
+/// SIGTERM and SIGHUP where they would end the process. A symbolic link at the final name is
+/// replaced, never written through. Move-only is not needed: one scope owns it.
 class TemporaryFile {
  public:
   TemporaryFile() = default;
@@ -21,26 +22,33 @@ class TemporaryFile {
   TemporaryFile& operator=(const TemporaryFile&) = delete;
 
   /// Creates the hidden file beside `destination`, which may be 255 bytes long in its last
-  /// component.
+  /// component. A file that this object had before is removed.
   bool create(const std::string& destination, ErrorSlot& error);
   /// Appends the bytes; a short write is a failure.
   bool write(std::string_view bytes, ErrorSlot& error);
   /// Closes the file, checks that, and moves it to the destination, replacing what is there (but
   /// never a directory).
   bool commitReplacing(ErrorSlot& error);
-  /// The same, failing when anything exists at the destination.
+  /// The same, failing when anything exists at the destination, be it a dangling symbolic link.
   bool commitNew(ErrorSlot& error);
 
-  /// The open file, -1 before `create` and after a commit.
-  int descriptor() const { return descriptor_; }
+  /// The open file, -1 before `create`, after a commit and after a failure.
+  int descriptor() const { return descriptor_.get(); }
 
  private:
-  bool close(ErrorSlot& error);
+  class Registry;
+
+  bool commit(int (*move)(const char* from, const char* to), ErrorSlot& error);
   void discard();
 
-  int descriptor_ = -1;
+  FileDescriptor descriptor_;
   std::string path_;  // of the hidden file; empty when there is none
   std::string destination_;
+  TemporaryFile* next_ = nullptr;  // in the registry
 };
+
+/// Removes from a directory the hidden files that a killed run left there. A file that a living
+/// process still writes is not touched, nor is any other; failures are not reported.
+void removeStaleTemporaryFiles(const std::string& directory);
 
 }  // namespace platform

@@ -20,7 +20,8 @@ TEST(FormattedTextTest, InsertsTexts) {
 }
 
 TEST(FormattedTextTest, InsertsNullForAbsentTextsAndMissingArguments) {
-  EXPECT_EQ(formattedText("<%@>", {std::optional<platform::Text>()}), "<(null)>");
+  const std::optional<platform::Text> absent;
+  EXPECT_EQ(formattedText("<%@>", {absent}), "<(null)>");
   EXPECT_EQ(formattedText("<%@>", {std::optional<platform::Text>("x")}), "<x>");
   EXPECT_EQ(formattedText("%@ %s %ld %lu %0.1f", {}), "(null) (null) (null) (null) (null)");
 }

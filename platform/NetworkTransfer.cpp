@@ -1,0 +1,222 @@
+#include "platform/NetworkTransfer.h"
+
+#include <curl/curl.h>
+
+#include <algorithm>
+#include <climits>
+#include <cstddef>
+#include <exception>
+#include <utility>
+#include <vector>
+
+namespace platform {
+namespace {
+
+constexpr long kMaximumRedirects = 20;
+constexpr long kReceiveBufferSize = 512L * 1024;
+/// The library's largest, 24 days: the operating system gives up on a connection long before.
+constexpr long kNoConnectTimeout = INT_MAX / 1000;
+/// A short page with the reason of a failure is read to its end, which keeps the connection alive.
+constexpr std::uint64_t kIgnoredBodyLimit = std::uint64_t{64} * 1024;
+
+static_assert(static_cast<int>(TransferErrorCode::kUnsupportedScheme) ==
+              CURLE_UNSUPPORTED_PROTOCOL);
+static_assert(static_cast<int>(TransferErrorCode::kOutOfMemory) == CURLE_OUT_OF_MEMORY);
+static_assert(static_cast<int>(TransferErrorCode::kBadContentEncoding) ==
+              CURLE_BAD_CONTENT_ENCODING);
+static_assert(static_cast<int>(TransferErrorCode::kTooLarge) == CURLE_FILESIZE_EXCEEDED);
+
+/// The library quotes what servers sent; none of that may steer a terminal or break the encoding.
+std::string shownText(std::string_view text) {
+  while (!text.empty() && (text.back() == '\n' || text.back() == '\r' || text.back() == '.')) {
+    text.remove_suffix(1);
+  }
+  std::string shown(text);
+  std::replace_if(
+      shown.begin(), shown.end(), [](char c) { return c < ' ' || c > '~'; }, '?');
+  return shown;
+}
+
+ErrorRecord outOfMemory() {
+  return transferError(TransferErrorCode::kOutOfMemory, "Out of memory");
+}
+
+}  // namespace
+
+ErrorRecord transferError(TransferErrorCode code, std::string description) {
+  return {"transfer", static_cast<std::int64_t>(code), std::move(description)};
+}
+
+/// The connections of one thread, and its transfers that are running.
+class NetworkTransfer::Connections {
+ public:
+  static Connections& ofThisThread() {
+    thread_local Connections connections;
+    return connections;
+  }
+
+  CURLcode add(NetworkTransfer& transfer) {
+    if (!handle_) return CURLE_FAILED_INIT;
+    running_.push_back(&transfer);
+    const CURLMcode code = curl_multi_add_handle(handle_.get(), transfer.handle_.get());
+    return code == CURLM_OK ? CURLE_OK : CURLE_OUT_OF_MEMORY;
+  }
+
+  void remove(NetworkTransfer& transfer) {
+    curl_multi_remove_handle(handle_.get(), transfer.handle_.get());
+    running_.erase(std::remove(running_.begin(), running_.end(), &transfer), running_.end());
+  }
+
+  bool run() {
+    if (running_.empty()) return false;
+    int count = 0;
+    CURLMcode code = curl_multi_poll(handle_.get(), nullptr, 0, INT_MAX, nullptr);
+    if (code == CURLM_OK) code = curl_multi_perform(handle_.get(), &count);
+    if (code != CURLM_OK) {
+      const CURLcode result = code == CURLM_OUT_OF_MEMORY ? CURLE_OUT_OF_MEMORY : CURLE_FAILED_INIT;
+      while (!running_.empty()) running_.back()->end(result);
+      return true;
+    }
+    while (const CURLMsg* message = curl_multi_info_read(handle_.get(), &count)) {
+      if (message->msg != CURLMSG_DONE) continue;
+      const CURLcode result = message->data.result;
+      void* transfer = nullptr;
+      curl_easy_getinfo(message->easy_handle, CURLINFO_PRIVATE, &transfer);
+      static_cast<NetworkTransfer*>(transfer)->end(result);
+    }
+    return true;
+  }
+
+ private:
+  struct Closer {
+    void operator()(CURLM* handle) const { curl_multi_cleanup(handle); }
+  };
+
+  // What the library sets up once costs milliseconds, which only a run with transfers pays.
+  static CURLM* newHandle() {
+    static const CURLcode libraryState = curl_global_init(CURL_GLOBAL_DEFAULT);
+    return libraryState == CURLE_OK ? curl_multi_init() : nullptr;
+  }
+
+  std::unique_ptr<CURLM, Closer> handle_{newHandle()};
+  std::vector<NetworkTransfer*> running_;
+};
+
+void NetworkTransfer::HandleCloser::operator()(void* handle) const {
+  curl_easy_cleanup(handle);
+}
+
+NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink)
+    : sink_(sink) {
+  if (url.scheme() != "http" && url.scheme() != "https") {
+    error_ = transferError(TransferErrorCode::kUnsupportedScheme,
+                           "URLs of the scheme \"" + url.scheme() + "\" are not supported");
+    ended_ = true;
+    return;
+  }
+  Connections& connections = Connections::ofThisThread();
+  int result = configure(url, acceptedEncoding);
+  if (result == CURLE_OK) result = connections.add(*this);
+  if (result != CURLE_OK) end(result);
+}
+
+NetworkTransfer::~NetworkTransfer() {
+  if (!ended_) Connections::ofThisThread().remove(*this);
+}
+
+int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
+  handle_.reset(curl_easy_init());
+  if (!handle_) return CURLE_OUT_OF_MEMORY;
+
+  CURLcode result = CURLE_OK;
+  const auto set = [this, &result](CURLoption option, auto value) {
+    if (result == CURLE_OK) result = curl_easy_setopt(handle_.get(), option, value);
+  };
+  static_assert(sizeof(errorText_) >= CURL_ERROR_SIZE);
+  set(CURLOPT_PRIVATE, static_cast<void*>(this));
+  set(CURLOPT_ERRORBUFFER, errorText_.data());
+  set(CURLOPT_URL, url.encodedText().c_str());
+  set(CURLOPT_PROTOCOLS_STR, "http,https");
+  set(CURLOPT_REDIR_PROTOCOLS_STR, "http,https");
+  set(CURLOPT_FOLLOWLOCATION, 1L);
+  set(CURLOPT_MAXREDIRS, kMaximumRedirects);
+  set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
+  set(CURLOPT_USERAGENT, "qel/" QEL_VERSION);
+  // The sink undoes the coding itself: the library takes a stream that stops early for whole.
+  set(CURLOPT_ACCEPT_ENCODING, acceptedEncoding);
+  set(CURLOPT_HTTP_CONTENT_DECODING, 0L);
+  set(CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
+  set(CURLOPT_NOSIGNAL, 1L);
+  set(CURLOPT_CONNECTTIMEOUT, kNoConnectTimeout);
+  set(CURLOPT_BUFFERSIZE, kReceiveBufferSize);
+  set(CURLOPT_HEADERFUNCTION, &NetworkTransfer::headerCallback);
+  set(CURLOPT_HEADERDATA, static_cast<void*>(this));
+  set(CURLOPT_WRITEFUNCTION, &NetworkTransfer::bodyCallback);
+  set(CURLOPT_WRITEDATA, static_cast<void*>(this));
+  return result;
+}
+
+int NetworkTransfer::status() const {
+  long status = 0;
+  curl_easy_getinfo(handle_.get(), CURLINFO_RESPONSE_CODE, &status);
+  return static_cast<int>(status);
+}
+
+void NetworkTransfer::end(int resultCode) {
+  Connections::ofThisThread().remove(*this);
+  ended_ = true;
+  if (error_) return;
+  const auto result = static_cast<CURLcode>(resultCode);
+  if ((result == CURLE_OK && !begun_) || ignoredSize_ > kIgnoredBodyLimit) {
+    error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
+  } else if (result != CURLE_OK) {
+    const std::string_view detail = errorText_.data();
+    error_ = {"transfer", result, shownText(detail.empty() ? curl_easy_strerror(result) : detail)};
+  }
+}
+
+bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
+  const bool endsHeader = line == "\r\n" || line == "\n";
+  if (!endsHeader || begun_ || status() != 200) return true;
+  begun_ = true;
+  curl_off_t length = -1;
+  curl_easy_getinfo(handle_.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &length);
+  curl_header* encoding = nullptr;
+  const bool isEncoded = curl_easy_header(handle_.get(), "Content-Encoding", 0, CURLH_HEADER, -1,
+                                          &encoding) == CURLHE_OK;
+  return sink_.begin(length, isEncoded ? encoding->value : "", error_);
+}
+
+bool NetworkTransfer::didReceiveBody(std::string_view bytes) {
+  if (begun_) return sink_.take(bytes, error_);
+  ignoredSize_ += bytes.size();
+  return ignoredSize_ <= kIgnoredBodyLimit;
+}
+
+std::size_t NetworkTransfer::headerCallback(char* bytes, std::size_t size, std::size_t count,
+                                            void* self) {
+  auto& transfer = *static_cast<NetworkTransfer*>(self);
+  try {
+    return transfer.didReceiveHeaderLine({bytes, size * count}) ? size * count : 0;
+  } catch (const std::exception&) {
+    transfer.error_ = outOfMemory();
+    return 0;
+  }
+}
+
+std::size_t NetworkTransfer::bodyCallback(char* bytes, std::size_t size, std::size_t count,
+                                          void* self) {
+  auto& transfer = *static_cast<NetworkTransfer*>(self);
+  try {
+    return transfer.didReceiveBody({bytes, size * count}) ? size * count : 0;
+  } catch (const std::exception&) {
+    transfer.error_ = outOfMemory();
+    return 0;
+  }
+}
+
+bool NetworkTransfer::runAll() {
+  return Connections::ofThisThread().run();
+}
+
+}  // namespace platform
