@@ -51,8 +51,10 @@ class IllFormedTest(ToolTestCase):
 
     def test_a_document_that_ends_too_early_is_told_at_its_end(self):
         for name, document in (("in text", b"<rss>\n<channel>\n<title>a"), ("in a tag", b"<rss>\n<channel>\n<ti"),
-                               ("in an attribute", b"<rss>\n<channel>\n<a b='"), ("in a comment", b"<rss>\n<channel>\n<!-- a"),
-                               ("in CDATA", b"<rss>\n<channel>\n<![CDATA[a"), ("in an entity", b"<rss>\n<channel>\na&am")):
+                               ("in an attribute", b"<rss>\n<channel>\n<a b='"),
+                               ("in a comment", b"<rss>\n<channel>\n<!-- a"),
+                               ("in CDATA", b"<rss>\n<channel>\n<![CDATA[a"),
+                               ("in an entity", b"<rss>\n<channel>\na&am")):
             with self.subTest(name):
                 self.assertLoadFails(self.run_tool("parsefeed", self.feed(document)), r".*line 3, column \d+.*")
 
@@ -99,8 +101,10 @@ class NoFeedTest(ToolTestCase):
 
     def test_files_of_other_kinds(self):
         noise = random.Random(1).randbytes(10_000)
-        for name, content in (("a picture", b"\x89PNG\r\n\x1a\n" + noise), ("sound", b"ID3\x03" + noise), ("noise", noise),
-                              ("an archive", b"PK\x03\x04" + noise), ("zeros", bytes(10_000)), ("JSON", b'{"version": "1.1"}'),
+        for name, content in (("a picture", b"\x89PNG\r\n\x1a\n" + noise), ("sound", b"ID3\x03" + noise),
+                              ("noise", noise),
+                              ("an archive", b"PK\x03\x04" + noise), ("zeros", bytes(10_000)),
+                              ("JSON", b'{"version": "1.1"}'),
                               ("a byte order mark", b"\xef\xbb\xbf"), ("half a byte order mark", b"\xff"),
                               ("a UTF-16 mark", b"\xff\xfe"), ("white space", b" \n\t ")):
             with self.subTest(name):
@@ -216,11 +220,13 @@ class SizeTest(ToolTestCase):
     def test_property_lists_of_unusual_shape(self):
         for name, content in (
                 ("deep elements never closed", b"<plist>" + b"<dict><key>a</key>" * 200_000),
-                ("a long number", b"<plist><dict><key>a</key><integer>" + b"1" * 5_000_000 + b"</integer></dict></plist>"),
+                ("a long number",
+                 b"<plist><dict><key>a</key><integer>" + b"1" * 5_000_000 + b"</integer></dict></plist>"),
                 ("a long date", b"<plist><dict><key>a</key><date>" + b"1" * 5_000_000 + b"</date></dict></plist>"),
                 ("long data", b"<plist><dict><key>a</key><data>" + b"QUJD" * 1_000_000 + b"</data></dict></plist>"),
                 ("data that are none", b"<plist><dict><key>a</key><data>?*=</data></dict></plist>"),
-                ("the same key", b"<plist><dict>" + b"<key>PodcastName</key><string>n</string>" * 100_000 + b"</dict></plist>"),
+                ("the same key",
+                 b"<plist><dict>" + b"<key>PodcastName</key><string>n</string>" * 100_000 + b"</dict></plist>"),
                 ("many keys", b"<plist><dict>" + b"".join(b"<key>%d</key><true/>" % n for n in range(100_000))
                  + b"</dict></plist>")):
             with self.subTest(name):
@@ -237,7 +243,8 @@ def binary_list(objects, top=0, offset_size=2, reference_size=1, count=None, tab
     start = len(body) if table is None else table
     for offset in offsets:
         body += (offset % 256**offset_size).to_bytes(offset_size, "big")
-    return body + struct.pack(">5xBBBQQQ", 0, offset_size, reference_size, len(objects) if count is None else count, top, start)
+    return body + struct.pack(">5xBBBQQQ", 0, offset_size, reference_size, len(objects) if count is None else count,
+                              top, start)
 
 
 class BinaryListTest(ToolTestCase):
@@ -286,9 +293,11 @@ class BinaryListTest(ToolTestCase):
 
     def test_counts_larger_than_the_file_are_refused(self):
         for name, content in (
-                ("text", b"\x5f\x13\x7f\xff\xff\xff\xff\xff\xff\xff"), ("wide text", b"\x6f\x13\x7f\xff\xff\xff\xff\xff\xff\xff"),
+                ("text", b"\x5f\x13\x7f\xff\xff\xff\xff\xff\xff\xff"),
+                ("wide text", b"\x6f\x13\x7f\xff\xff\xff\xff\xff\xff\xff"),
                 ("wide text of half the range", b"\x6f\x13\x40" + bytes(6) + b"\x01"),
-                ("data", b"\x4f\x13\xff\xff\xff\xff\xff\xff\xff\xff"), ("a list", b"\xaf\x13\x7f\xff\xff\xff\xff\xff\xff\xff"),
+                ("data", b"\x4f\x13\xff\xff\xff\xff\xff\xff\xff\xff"),
+                ("a list", b"\xaf\x13\x7f\xff\xff\xff\xff\xff\xff\xff"),
                 ("a dictionary", b"\xdf\x13\x40" + bytes(7)), ("some more text", b"\x5f\x11\xff\xff"),
                 ("a count that is no number", b"\x5f\x51a"), ("a count that is missing", b"\x5f")):
             with self.subTest(name):
@@ -347,7 +356,8 @@ class BinaryListTest(ToolTestCase):
     def test_numbers_beyond_every_range_are_handled(self):
         for key in (b"\x5cEpisodeOrder", b"\x5f\x10\x0fEpisodeFileSize", b"\x5bEpisodeName"):
             for value in (float("nan"), float("inf"), -float("inf"), 1e300, -1e300):
-                objects = [b"\xd1\x01\x02", b"\x58Episodes", b"\xa1\x03", b"\xd1\x04\x05", key, b"\x23" + struct.pack(">d", value)]
+                objects = [b"\xd1\x01\x02", b"\x58Episodes", b"\xa1\x03", b"\xd1\x04\x05", key,
+                           b"\x23" + struct.pack(">d", value)]
                 for command in ("parsefeed", "createfeed"):
                     with self.subTest(key=key, value=value, command=command):
                         result = self.run_tool(command, "-i", stdin=binary_list(objects), timeout=60)

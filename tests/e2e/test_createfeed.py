@@ -15,7 +15,8 @@ import xml.dom.minidom
 from support import (DC, LOADING, ORVANE, QEL_NAMESPACE, ToolTestCase, checked, environment, rss, start, tags, tool,
                      without_publication_date)
 
-PODCAST = {"PodcastUUID": "u", "PodcastName": "n", "PodcastAuthor": "a", "PodcastCopyright": "©", "PodcastKeywords": "k",
+PODCAST = {"PodcastUUID": "u", "PodcastName": "n", "PodcastAuthor": "a", "PodcastCopyright": "©",
+           "PodcastKeywords": "k",
            "PodcastCategory": "c", "PodcastDescription": "d", "PodcastAdvisoryLabel": "Explicit",
            "PodcastReference": "http://example.com/", "PodcastReferenceType": "remote",
            "PodcastPosterReference": "http://example.com/p.png", "PodcastPosterReferenceType": "remote"}
@@ -75,7 +76,8 @@ class DocumentTest(ToolTestCase):
         result = self.run_tool("createfeed", self.reference({**PODCAST, "Episodes": [EPISODE]}))
         document = xml.dom.minidom.parseString(result.stdout)
         names = {node.nodeName for node in document.getElementsByTagName("*")}
-        self.assertEqual(names, {"rss", "channel", "item", "title", "dc:creator", "orvane:author", "pubDate", "copyright",
+        self.assertEqual(names,
+                         {"rss", "channel", "item", "title", "dc:creator", "orvane:author", "pubDate", "copyright",
                                  "orvane:keywords", "orvane:category", "description", "orvane:summary",
                                  "orvane:explicit", "qel:uuid", "qel:order", "image", "url", "orvane:image", "link",
                                  "enclosure"})
@@ -134,7 +136,8 @@ class ChannelTest(ToolTestCase):
     def test_empty_texts_are_written(self):
         channel = self.channel_of({"PodcastName": "", "PodcastCategory": "", "PodcastReference": ""})
         self.assertEqual(tags(channel), ["title", "pubDate", "orvane:category", "link"])
-        self.assertEqual((channel.findtext("title"), channel.find(ORVANE + "category").attrib, channel.findtext("link")),
+        self.assertEqual((channel.findtext("title"), channel.find(ORVANE + "category").attrib,
+                          channel.findtext("link")),
                          ("", {"text": ""}, ""))
 
     def test_the_date_is_the_moment_of_generation(self):
@@ -150,7 +153,8 @@ class ChannelTest(ToolTestCase):
 
     def test_the_image_holds_url_and_title(self):
         image = self.channel_of(PODCAST).find("image")
-        self.assertEqual([(child.tag, child.text) for child in image], [("url", "http://example.com/p.png"), ("title", "n")])
+        self.assertEqual([(child.tag, child.text) for child in image],
+                         [("url", "http://example.com/p.png"), ("title", "n")])
 
     def test_the_image_of_an_untitled_podcast_holds_its_url_alone(self):
         image = self.channel_of({"PodcastPosterReference": "p.png"}).find("image")
@@ -232,7 +236,8 @@ class ItemTest(ToolTestCase):
         self.assertIsNone(channel.find("item/pubDate"))
 
     def test_advisory_labels(self):
-        for label, expected in (("Explicit", "yes"), ("explicit", "yes"), ("EXPLICIT", "yes"), ("Yes", "yes"), ("yes", "yes"),
+        for label, expected in (("Explicit", "yes"), ("explicit", "yes"), ("EXPLICIT", "yes"), ("Yes", "yes"),
+                                ("yes", "yes"),
                                 ("YES", "yes"), ("Clean", "clean"), ("CLEAN", "clean"), ("no", None), ("", None),
                                 ("true", None), (" yes", None), ("Explicit ", None)):
             with self.subTest(label):

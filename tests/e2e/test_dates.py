@@ -71,7 +71,8 @@ class FieldTest(ReadingTestCase):
 
     def test_months(self):
         names = ["Jan", "Feb", "Mar", "Apr", "May", "Jun", "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"]
-        self.assertDates([(f"05 {name} 2007 10:00 GMT", at(2007, number, 5, 10)) for number, name in enumerate(names, 1)])
+        self.assertDates([(f"05 {name} 2007 10:00 GMT", at(2007, number, 5, 10))
+                          for number, name in enumerate(names, 1)])
         self.assertDates([
             ("05 June 2007 10:00 GMT", at(2007, 6, 5, 10)),
             ("05 JUN 2007 10:00 GMT", at(2007, 6, 5, 10)),
@@ -154,7 +155,8 @@ class ZoneTest(ReadingTestCase):
         ], "Asia/Tokyo")
 
     def test_military_zones(self):
-        letters = {"A": 1, "B": 2, "C": 3, "D": 4, "E": 5, "F": 6, "G": 7, "H": 8, "I": 9, "J": 0, "K": 10, "L": 11, "M": 12,
+        letters = {"A": 1, "B": 2, "C": 3, "D": 4, "E": 5, "F": 6, "G": 7, "H": 8, "I": 9, "J": 0, "K": 10, "L": 11,
+                   "M": 12,
                    "N": -1, "O": -2, "P": -3, "Q": -4, "R": -5, "S": -6, "T": -7, "U": -8, "V": -9, "W": -10, "X": -11,
                    "Y": -12, "Z": 0, "1": 0, "?": 0, "_": 0}
         rows = []
@@ -245,7 +247,8 @@ class WritingTest(ToolTestCase):
         self.assertEqual(self.written([row[0] for row in self.DATES], TZ=LOS_ANGELES), [row[2] for row in self.DATES])
 
     def test_dates_in_a_zone_of_half_hours(self):
-        self.assertEqual(self.written([row[0] for row in self.DATES], TZ="Asia/Kolkata"), [row[3] for row in self.DATES])
+        self.assertEqual(self.written([row[0] for row in self.DATES], TZ="Asia/Kolkata"),
+                         [row[3] for row in self.DATES])
 
     def test_names_follow_the_locale(self):
         french, = self.written([at(2007, 6, 5, 14, 30)], LC_ALL="fr_FR.UTF-8")

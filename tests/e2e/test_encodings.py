@@ -29,7 +29,8 @@ ENCODINGS = (
     ("KOI8-R", "koi8-r", "Ночные прогулки"),
 )
 
-UTF_16 = (("UTF-16 little-endian", codecs.BOM_UTF16_LE, "utf-16-le"), ("UTF-16 big-endian", codecs.BOM_UTF16_BE, "utf-16-be"))
+UTF_16 = (("UTF-16 little-endian", codecs.BOM_UTF16_LE, "utf-16-le"),
+          ("UTF-16 big-endian", codecs.BOM_UTF16_BE, "utf-16-be"))
 TEXT = "Füße 夜 🚶"
 
 

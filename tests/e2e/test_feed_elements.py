@@ -86,7 +86,8 @@ class TextTest(ElementTestCase):
             ("<orvane:explicit>clean</orvane:explicit>", {"EpisodeAdvisoryLabel": "Clean"}),
             ("<orvane:category text='c'/>", {"EpisodeCategory": "c"}),
             ("<qel:uuid>u</qel:uuid>", {"EpisodeUUID": "u"}),
-            ("<pubDate>Tue, 05 Jun 2007 14:30:00 GMT</pubDate>", {"EpisodeDate": datetime.datetime(2007, 6, 5, 14, 30)}),
+            ("<pubDate>Tue, 05 Jun 2007 14:30:00 GMT</pubDate>",
+             {"EpisodeDate": datetime.datetime(2007, 6, 5, 14, 30)}),
             ("<orvane:summary>s</orvane:summary><guid>g</guid>", {}))
 
     def test_the_later_text_wins(self):
@@ -133,7 +134,8 @@ class TextTest(ElementTestCase):
 
     def test_an_unread_element_inside_a_text_may_empty_it(self):
         self.assertEpisode("<description>one<link>two</link>three</description>", {"EpisodeDescription": "twothree"})
-        self.assertEpisode("<description>one<x:uuid>two</x:uuid>three</description>", {"EpisodeDescription": "twothree"})
+        self.assertEpisode("<description>one<x:uuid>two</x:uuid>three</description>",
+                           {"EpisodeDescription": "twothree"})
 
     def test_a_long_text_arrives_whole(self):
         text = "0123456789 äöü " * 100_000
@@ -180,10 +182,12 @@ class EnclosureTest(ElementTestCase):
     def test_lengths(self):
         for written, expected in (("1234", 1234), (" 42", 42), ("\t\n 42", 42), ("+7", 7), ("12abc", 12), ("12.9", 12),
                                   ("0042", 42), ("4294967296", 2**32), ("9223372036854775807", 2**63 - 1),
-                                  ("0", None), ("-5", None), ("abc", None), ("", None), (" ", None), ("+", None), ("- 5", None),
+                                  ("0", None), ("-5", None), ("abc", None), ("", None), (" ", None), ("+", None),
+                                  ("- 5", None),
                                   ("0x10", None), ("1,234", 1)):
             with self.subTest(written):
-                self.assertEnclosure(f"length='{written}'", **({} if expected is None else {"EpisodeFileSize": expected}))
+                self.assertEnclosure(f"length='{written}'",
+                                     **({} if expected is None else {"EpisodeFileSize": expected}))
 
     def test_a_length_beyond_every_range_does_not_crash(self):
         self.assertIn("EpisodeReference", self.episode_of(f"<enclosure url='a.mp3' length='{'9' * 400}'/>"))
@@ -194,10 +198,12 @@ class EnclosureTest(ElementTestCase):
                             "EpisodeFileSize": 1, "EpisodeType": "audio/mpeg"})
 
     def test_an_enclosure_outside_items_is_dropped(self):
-        self.assertPodcast("<enclosure url='a.mp3' length='1' type='t'/><item/><enclosure url='b.mp3'/>", {"Episodes": [{}]})
+        self.assertPodcast("<enclosure url='a.mp3' length='1' type='t'/><item/><enclosure url='b.mp3'/>",
+                           {"Episodes": [{}]})
 
     def test_locations_are_classed(self):
-        for location, kind in (("https://example.com/a.mp3", "remote"), ("FILE:///a.mp3", "remote"), ("/a.mp3", "local"),
+        for location, kind in (("https://example.com/a.mp3", "remote"), ("FILE:///a.mp3", "remote"),
+                               ("/a.mp3", "local"),
                                ("a.mp3", "local"), ("ftp://example.com/a.mp3", "local")):
             with self.subTest(location):
                 self.assertEpisode(f"<enclosure url='{location}'/>",
@@ -289,7 +295,8 @@ class ImageTest(ElementTestCase):
         self.assertEpisodes(
             ("<orvane:image href='http://example.com/a.png'/>",
              {"EpisodePosterReference": "http://example.com/a.png", "EpisodePosterReferenceType": "remote"}),
-            ("<image><url>a.png</url></image>", {"EpisodePosterReference": "a.png", "EpisodePosterReferenceType": "local"}))
+            ("<image><url>a.png</url></image>",
+             {"EpisodePosterReference": "a.png", "EpisodePosterReferenceType": "local"}))
 
     def test_the_title_of_an_image_is_a_title(self):
         self.assertPodcasts(
@@ -298,7 +305,8 @@ class ImageTest(ElementTestCase):
             ("<image><description>image</description></image>", {"PodcastDescription": "image"}))
 
     def test_the_link_of_an_image_is_searched(self):
-        self.assertPodcast(f"<image><link>http://example.com/collection/uuid/{UUID}</link></image>", {"PodcastUUID": UUID})
+        self.assertPodcast(f"<image><link>http://example.com/collection/uuid/{UUID}</link></image>",
+                           {"PodcastUUID": UUID})
 
 
 class UUIDTest(ElementTestCase):
@@ -354,7 +362,8 @@ class OrderTest(ElementTestCase):
         self.assertEqual(self.episode_of(content).get("EpisodeOrder"), expected)
 
     def test_numbers(self):
-        for written, expected in (("3", 3), ("0", 0), ("-3", None), ("+3", 3), ("12abc", 12), ("abc", 0), ("", 0), (" 7", 7),
+        for written, expected in (("3", 3), ("0", 0), ("-3", None), ("+3", 3), ("12abc", 12), ("abc", 0), ("", 0),
+                                  (" 7", 7),
                                   ("\n  7\n", 7), ("9223372036854775807", 2**63 - 1)):
             with self.subTest(written):
                 self.assertOrder(f"<qel:order>{written}</qel:order>", expected)
@@ -392,7 +401,8 @@ class DocumentFormTest(ElementTestCase):
         self.assertEqual(self.parsefeed(self.feed(document)), {"PodcastName": "Night & Walks!"})
 
     def test_comments_and_instructions_around_the_root(self):
-        document = b"<?xml version='1.0'?><!-- a --><?xml-stylesheet href='x'?>" + rss().split(b"\n", 1)[1] + b"<!-- z -->\n"
+        document = b"<?xml version='1.0'?><!-- a --><?xml-stylesheet href='x'?>" + rss().split(b"\n",
+                                                                                               1)[1] + b"<!-- z -->\n"
         self.assertEqual(self.parsefeed(self.feed(document)), {})
 
     def test_attributes_in_either_quotes(self):

@@ -70,7 +70,8 @@ class BinaryFormTest(ToolTestCase):
         self.assertEqual(self.read(FULL), FULL)
 
     def test_texts_in_each_form(self):
-        for text in ("", "a", "a" * 14, "a" * 15, "a" * 256, "a" * 70_000, "ü", "ü" * 15, "ü" * 70_000, "🚶", "a\U0010ffffb"):
+        for text in ("", "a", "a" * 14, "a" * 15, "a" * 256, "a" * 70_000, "ü", "ü" * 15, "ü" * 70_000, "🚶",
+                     "a\U0010ffffb"):
             with self.subTest(text[:20], length=len(text)):
                 self.assertEqual(self.read({"PodcastName": text}), {"PodcastName": text})
 
@@ -98,7 +99,8 @@ class DateTest(ToolTestCase):
         episodes = [{"EpisodeDate": date} for date in (
             datetime.datetime(1, 1, 1), datetime.datetime(1500, 3, 1, 12), datetime.datetime(1582, 10, 10),
             datetime.datetime(1900, 1, 1), datetime.datetime(1969, 12, 31, 23, 59, 59), datetime.datetime(1970, 1, 1),
-            datetime.datetime(2000, 2, 29, 1, 2, 3), datetime.datetime(2001, 1, 1), datetime.datetime(2007, 3, 11, 2, 30),
+            datetime.datetime(2000, 2, 29, 1, 2, 3), datetime.datetime(2001, 1, 1),
+            datetime.datetime(2007, 3, 11, 2, 30),
             datetime.datetime(2038, 1, 19, 3, 14, 8), datetime.datetime(9999, 12, 31, 23, 59, 59))]
         for zone in ("UTC", "America/Los_Angeles", "Asia/Kolkata", "Pacific/Apia"):
             for fmt in (plistlib.FMT_XML, plistlib.FMT_BINARY):
@@ -168,7 +170,8 @@ class ValueTypeTest(ToolTestCase):
             for key in (b"EpisodeOrder", b"EpisodeFileSize", b"EpisodeName"):
                 for kind in (b"integer", b"real", b"string"):
                     with self.subTest(written[:30], key=key, kind=kind):
-                        source = self.write("big.plist", HEAD + b"<plist version='1.0'><dict><key>Episodes</key><array><dict>"
+                        source = self.write("big.plist",
+                                            HEAD + b"<plist version='1.0'><dict><key>Episodes</key><array><dict>"
                                             b"<key>%s</key><%s>%s</%s></dict></array></dict></plist>"
                                             % (key, kind, written, kind))
                         self.assertIn(self.run_tool("parsefeed", source).status, (0, 1))
@@ -185,7 +188,8 @@ class ValueTypeTest(ToolTestCase):
     def test_allowed_types_of_every_kind_are_harmless(self):
         for value in ("png", 1, [1, {}, "png"], {}, [[]]):
             with self.subTest(value):
-                self.assertEqual(self.parsefeed(self.reference({"AllowedPosterTypes": value, "AllowedEpisodeTypes": value})), {})
+                self.assertEqual(self.parsefeed(self.reference({"AllowedPosterTypes": value,
+                                                                "AllowedEpisodeTypes": value})), {})
 
 
 class XMLFormTest(ToolTestCase):
@@ -212,7 +216,8 @@ class XMLFormTest(ToolTestCase):
                 self.assertEqual(self.read(content), expected)
 
     def test_white_space_in_texts_is_kept(self):
-        for written, expected in ((b"  a  ", "  a  "), (b"\n\ta\n", "\n\ta\n"), (b"a\r\nb", "a\nb"), (b"a&#13;&#10;b", "a\r\nb")):
+        for written, expected in ((b"  a  ", "  a  "), (b"\n\ta\n", "\n\ta\n"), (b"a\r\nb", "a\nb"),
+                                  (b"a&#13;&#10;b", "a\r\nb")):
             with self.subTest(written):
                 self.assertEqual(self.read(b"<plist><dict><key>PodcastName</key><string>%s</string></dict></plist>" % written),
                                  {"PodcastName": expected})
@@ -238,12 +243,14 @@ class XMLFormTest(ToolTestCase):
 class DamageTest(ToolTestCase):
     def assertRefused(self, content):
         path = self.write("bad.plist", content)
-        self.assertFails(self.run_tool("parsefeed", path), f'Could not initialize podcast source with string "{path}".\n')
+        self.assertFails(self.run_tool("parsefeed", path),
+                         f'Could not initialize podcast source with string "{path}".\n')
 
     def test_what_is_no_reference_file(self):
         for name, content in (
                 ("nothing", b""), ("white space", b"\n"), ("text", b"Night Walks"), ("zeros", bytes(100)),
-                ("a feed", b"<rss><channel/></rss>"), ("an empty list", b"<plist/>"), ("a list without root", b"<plist></plist>"),
+                ("a feed", b"<rss><channel/></rss>"), ("an empty list", b"<plist/>"),
+                ("a list without root", b"<plist></plist>"),
                 ("an array", plistlib.dumps([])), ("a text", plistlib.dumps("text")), ("a number", plistlib.dumps(1)),
                 ("a binary array", plistlib.dumps(["a"], fmt=plistlib.FMT_BINARY)),
                 ("a binary text", plistlib.dumps("text", fmt=plistlib.FMT_BINARY)),

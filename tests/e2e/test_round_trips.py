@@ -52,7 +52,8 @@ class RoundTripTestCase(ToolTestCase):
 class FieldTest(RoundTripTestCase):
     def test_every_field_that_a_feed_can_carry(self):
         podcast = {
-            "PodcastUUID": "u", "PodcastName": "n", "PodcastAuthor": "a", "PodcastCopyright": "©", "PodcastKeywords": "k, l",
+            "PodcastUUID": "u", "PodcastName": "n", "PodcastAuthor": "a", "PodcastCopyright": "©",
+            "PodcastKeywords": "k, l",
             "PodcastCategory": "Arts", "PodcastDescription": "d", "PodcastAdvisoryLabel": "Clean",
             "PodcastPosterReference": "http://example.com/p.png", "PodcastPosterReferenceType": "remote",
             "Episodes": [
@@ -91,15 +92,18 @@ class FieldTest(RoundTripTestCase):
         self.assertEqual(self.episode_through_feed(episode), episode)
 
     def test_the_label_yes_comes_back_as_explicit(self):
-        self.assertEqual(self.episode_through_feed({"EpisodeAdvisoryLabel": "YES"}), {"EpisodeAdvisoryLabel": "Explicit"})
+        self.assertEqual(self.episode_through_feed({"EpisodeAdvisoryLabel": "YES"}),
+                         {"EpisodeAdvisoryLabel": "Explicit"})
 
     def test_large_numbers(self):
-        episode = {"EpisodeUUID": "u", "EpisodeOrder": 2**63 - 1, "EpisodeReference": "a", "EpisodeReferenceType": "local",
+        episode = {"EpisodeUUID": "u", "EpisodeOrder": 2**63 - 1, "EpisodeReference": "a",
+                   "EpisodeReferenceType": "local",
                    "EpisodeFileSize": 2**63 - 1}
         self.assertEqual(self.episode_through_feed(episode), episode)
 
     def test_dates_come_back_in_every_time_zone(self):
-        dates = [datetime.datetime(2007, 6, 5, 14, 30), datetime.datetime(2007, 12, 5, 4, 5, 6), datetime.datetime(1969, 7, 20, 20),
+        dates = [datetime.datetime(2007, 6, 5, 14, 30), datetime.datetime(2007, 12, 5, 4, 5, 6),
+                 datetime.datetime(1969, 7, 20, 20),
                  datetime.datetime(2030, 1, 1)]
         podcast = {"Episodes": [{"EpisodeDate": date} for date in dates]}
         for zone in ("UTC", "America/Los_Angeles", "Asia/Kolkata", "Europe/London", "Australia/Lord_Howe"):
@@ -118,7 +122,8 @@ class TextTest(RoundTripTestCase):
         for name, text in TEXTS.items():
             with self.subTest(name):
                 podcast = {**dict.fromkeys(PODCAST_TEXT_KEYS, text), "Episodes": [
-                    {**dict.fromkeys(EPISODE_TEXT_KEYS, text), "EpisodeReference": "x" + text, "EpisodeReferenceType": "local",
+                    {**dict.fromkeys(EPISODE_TEXT_KEYS, text), "EpisodeReference": "x" + text,
+                     "EpisodeReferenceType": "local",
                      "EpisodePosterReference": "x" + text, "EpisodePosterReferenceType": "local"}]}
                 podcast |= {"PodcastPosterReference": "x" + text, "PodcastPosterReferenceType": "local"}
                 self.assertEqual(self.through_feed(podcast), podcast)
@@ -150,7 +155,8 @@ class TextTest(RoundTripTestCase):
                 self.assertTrue(self.through_feed(podcast) == podcast, "the text differs")
 
     def test_10_thousand_episodes(self):
-        podcast = {"Episodes": [{"EpisodeName": f"Episode {number}", "EpisodeUUID": f"u{number}", "EpisodeOrder": number}
+        podcast = {"Episodes": [{"EpisodeName": f"Episode {number}", "EpisodeUUID": f"u{number}",
+                                 "EpisodeOrder": number}
                                 for number in range(10_000)]}
         self.assertTrue(self.through_feed(podcast) == podcast, "the episodes differ")
 

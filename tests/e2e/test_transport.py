@@ -111,7 +111,8 @@ class RedirectTest(TransportTestCase):
 
     def test_other_schemes_are_not_followed(self):
         secret = self.write("feed.xml", FEED).as_uri()
-        for location in (secret, f"ftp://127.0.0.1:{self.web.port}/feed.xml", f"gopher://127.0.0.1:{self.web.port}/feed.xml",
+        for location in (secret, f"ftp://127.0.0.1:{self.web.port}/feed.xml",
+                         f"gopher://127.0.0.1:{self.web.port}/feed.xml",
                          "data:text/xml,%3Crss/%3E", f"pcast://127.0.0.1:{self.web.port}/feed.xml"):
             with self.subTest(location):
                 self.assertFetchFails(self.web.redirect("/away", location))
@@ -261,7 +262,8 @@ class BrokenConnectionTest(TransportTestCase):
 
     @unittest.skipUnless(shutil.which("openssl"), "the certificate is made by openssl")
     def test_a_certificate_that_nobody_vouches_for(self):
-        subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-keyout", "key.pem", "-out", "cert.pem",
+        subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-keyout", "key.pem", "-out",
+                        "cert.pem",
                         "-days", "2", "-subj", "/CN=localhost", "-addext", "subjectAltName=DNS:localhost,IP:127.0.0.1"],
                        cwd=self.directory, check=True, capture_output=True)
         context = ssl.SSLContext(ssl.PROTOCOL_TLS_SERVER)
