@@ -10,7 +10,6 @@ import socket
 import struct
 import threading
 import time
-import zlib
 from http.server import BaseHTTPRequestHandler, ThreadingHTTPServer
 from typing import NamedTuple
 
@@ -41,6 +40,10 @@ class FeedServer:
         self._server.shutdown()
         self._server.server_close()
         self._thread.join()
+
+    def use_tls(self, context):
+        """Speaks TLS from now on, by the ssl module's context."""
+        self._server.socket = context.wrap_socket(self._server.socket, server_side=True, do_handshake_on_connect=False)
 
     @property
     def port(self):
@@ -76,17 +79,16 @@ class FeedServer:
             self.redirect(f"{path}/{number}", following)
         return self.url(f"{path}/0" if length else last)
 
-    def compressed(self, path, body, coding="gzip", cut=0):
-        """Serves the body compressed; the last `cut` bytes of the compressed form never come, and the
-        announced length does not tell."""
-        packed = gzip.compress(body) if coding == "gzip" else zlib.compress(body)
-        packed = packed[:len(packed) - cut]
-        return self.serve(path, packed, headers=[("Content-Encoding", coding)])
+    def compressed(self, path, body, cut=0):
+        """Serves the body compressed by gzip; the last `cut` bytes of the compressed form never come, and
+        the announced length does not tell."""
+        packed = gzip.compress(body)
+        return self.serve(path, packed[:len(packed) - cut], headers=[("Content-Encoding", "gzip")])
 
-    def chunked(self, path, chunks, finished=True):
+    def chunked(self, path, chunks, finished=True, headers=()):
         """Serves the body in chunks; an unfinished one lacks the last, empty chunk."""
         def answer(exchange):
-            exchange.head(200, [("Transfer-Encoding", "chunked")])
+            exchange.head(200, [("Transfer-Encoding", "chunked"), *headers])
             for chunk in chunks:
                 exchange.send(b"%x\r\n%s\r\n" % (len(chunk), chunk))
             if finished:

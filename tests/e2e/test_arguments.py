@@ -4,7 +4,6 @@ An option is known by its second character alone, unknown options are passed ove
 which faults are looked for decides which message people see.
 """
 
-import os
 import plistlib
 import subprocess
 import unittest
@@ -221,17 +220,6 @@ class HostileArgumentTest(ArgumentTest):
 
     def test_very_many_arguments(self):
         self.assertWritesReference("parsefeed", "podcast.plist", *["-x", "more"] * 10_000)
-
-    def test_an_empty_argument_vector(self):
-        read_end, write_end = os.pipe()
-        with open(read_end, "rb") as stderr:
-            executable = os.environ["QEL"]
-            child = os.posix_spawn(executable, [""], os.environ, file_actions=[(os.POSIX_SPAWN_DUP2, write_end, 2)])
-            os.close(write_end)
-            message = stderr.read()
-            _, status = os.waitpid(child, 0)
-        self.assertEqual((os.waitstatus_to_exitcode(status), message),
-                         (1, b'"(null)" is not a valid podcast source.\n'))
 
 
 if __name__ == "__main__":

@@ -70,7 +70,8 @@ class EpisodesTest(ToolTestCase):
         self.assertEqual(self.parsefeed(self.reference({"Episodes": []})), {})
 
     def test_episodes_keep_their_order(self):
-        names = [{"EpisodeName": name, "EpisodeOrder": order} for name, order in (("c", 9), ("a", 1), ("b", 5), ("a", 1))]
+        names = [{"EpisodeName": name, "EpisodeOrder": order}
+                 for name, order in (("c", 9), ("a", 1), ("b", 5), ("a", 1))]
         self.assertEqual(self.episodes(*names), names)
 
     def test_an_episode_without_anything_stays_an_episode(self):
@@ -89,7 +90,8 @@ class EpisodesTest(ToolTestCase):
         self.assertEqual(self.episodes({"EpisodeOrder": 0}), [{"EpisodeOrder": 0}])
 
     def test_a_negative_order_is_none(self):
-        self.assertEqual(self.episodes({"EpisodeOrder": -1}, {"EpisodeOrder": -5}, {"EpisodeOrder": -2**63}), [{}, {}, {}])
+        self.assertEqual(self.episodes({"EpisodeOrder": -1}, {"EpisodeOrder": -5}, {"EpisodeOrder": -2**63}),
+                         [{}, {}, {}])
 
     def test_the_largest_order(self):
         self.assertEqual(self.episodes({"EpisodeOrder": 2**63 - 1}), [{"EpisodeOrder": 2**63 - 1}])

@@ -60,7 +60,8 @@ class FeedURLTest(SourceTest):
         self.assertLoads("HTTP.plist")
 
     def test_texts_that_begin_like_a_url_but_are_none(self):
-        for source in ("http", "http:", "http://", "https://", "http:///feed.xml", "httpd", "pcast", "pcast:", "pcast://",
+        for source in ("http", "http:", "http://", "https://", "http:///feed.xml", "httpd", "pcast", "pcast:",
+                       "pcast://",
                        "http://host/a b", "http://[::1/", "http://host:port/", "http://host/%zz", "http://host/<x>",
                        'http://host/"', "http://host/\n"):
             with self.subTest(source):
