@@ -22,8 +22,8 @@ constexpr std::size_t kFileChunkSize = std::size_t{256} * 1024;
 /// Gathers what happened to a download and hands it to the receiver, one event at a time.
 class Download::Transfer : public EventSource {
  public:
-  Transfer(Download& download, const std::string& destination, DownloadReceiver& receiver)
-      : download_(download), destination_(destination), receiver_(receiver) {}
+  Transfer(Download& download, std::string destination, DownloadReceiver& receiver)
+      : download_(download), destination_(std::move(destination)), receiver_(receiver) {}
 
   bool hasEvent() const override { return response_.has_value() || writtenLength_ > 0; }
   void deliverEvent() final;

@@ -164,13 +164,13 @@ std::optional<std::string> hostInASCII(std::string_view host) {
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
                       &status),
       &uidna_close);
-  if (U_FAILURE(status)) return std::nullopt;
+  if (U_FAILURE(status) != 0) return std::nullopt;
   std::array<char, 256> ascii{};  // a longer name is an error anyway
   UIDNAInfo info = UIDNA_INFO_INITIALIZER;
   const std::int32_t length =
       uidna_nameToASCII_UTF8(converter.get(), host.data(), static_cast<std::int32_t>(host.size()),
                              ascii.data(), static_cast<std::int32_t>(ascii.size()), &info, &status);
-  if (U_FAILURE(status) || info.errors != 0) return std::nullopt;
+  if (U_FAILURE(status) != 0 || info.errors != 0) return std::nullopt;
   return std::string(ascii.data(), static_cast<std::size_t>(length));
 }
 
