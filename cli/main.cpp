@@ -1,1 +1,14 @@
-int main() { return 1; }
+#include <cstddef>
+#include <span>
+
+#include "cli/QELDriver.h"
+#include "platform/Process.h"
+#include "platform/StandardStreams.h"
+
+int main(int argc, char** argv) {
+  platform::prepareProcess();
+  const std::span<const char* const> arguments(argv, static_cast<std::size_t>(argc));
+  const int status = QELRun(arguments.empty() ? arguments : arguments.subspan(1));
+  platform::flushStandardOutput();
+  return status;
+}

@@ -57,6 +57,11 @@ bool fileExists(const std::string& path) {
   return path.find('\0') == std::string::npos && ::stat(path.c_str(), &status) == 0;
 }
 
+bool isSymbolicLink(const std::string& path) {
+  struct stat status {};
+  return ::lstat(path.c_str(), &status) == 0 && S_ISLNK(status.st_mode);
+}
+
 std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error) {
   const std::optional<RegularFile> file = RegularFile::open(path, error);
   if (!file) {

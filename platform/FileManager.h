@@ -14,6 +14,9 @@ inline constexpr std::uint64_t kWholeReadLimit = std::uint64_t{2} << 30U;
 /// Whether anything (file, directory, ...) exists at the path, symbolic links followed.
 bool fileExists(const std::string& path);
 
+/// Whether the path itself is a symbolic link, dangling or not.
+bool isSymbolicLink(const std::string& path);
+
 /// The whole content of a regular file. Anything else (directory, device, FIFO, socket), a file
 /// over kWholeReadLimit and a failed read give no value and fill the slot.
 std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error);

@@ -104,11 +104,10 @@ std::string standardisedPath(std::string_view path) {
     if (component.empty() || component == kWorkingDirectory) {
       continue;
     }
-    if (component != kParentDirectory) {
-      kept.push_back(component);
-    } else if (!kept.empty() && kept.back() != kParentDirectory) {
+    const bool isParent = component == kParentDirectory;
+    if (isParent && !kept.empty() && kept.back() != kParentDirectory) {
       kept.pop_back();
-    } else if (!isAbsolute) {
+    } else if (!isParent || !isAbsolute) {
       kept.push_back(component);
     }
   }

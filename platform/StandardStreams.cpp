@@ -42,7 +42,11 @@ OutputFile::OutputFile(const std::string& path, Mode mode) {
 }
 
 bool OutputFile::write(std::string_view bytes) {
-  return descriptor_ >= 0 && writeAll(descriptor_, bytes);
+  if (descriptor_ >= 0 && writeAll(descriptor_, bytes)) {
+    return true;
+  }
+  descriptor_ = -1;
+  return false;
 }
 
 }  // namespace platform

@@ -34,12 +34,12 @@ class OutputFile {
   OutputFile(const OutputFile&) = delete;
   OutputFile& operator=(const OutputFile&) = delete;
 
-  /// False when the file is not open or did not take all bytes.
+  /// False when the file is not open or did not take all bytes, and from then on.
   bool write(std::string_view bytes);
 
  private:
   FileDescriptor file_;  // not open for standard output
-  int descriptor_ = -1;
+  int descriptor_ = -1;  // -1 as well after a failure
 };
 
 }  // namespace platform

@@ -95,6 +95,18 @@ void appendEscaped(std::string& output, std::string_view text, const ByteRules& 
 
 }  // namespace
 
+bool isXMLText(std::string_view text) {
+  std::size_t next = 0;
+  while (next < text.size()) {
+    const auto byte = static_cast<unsigned char>(text[next]);
+    if (byte < 0x20 && reference(text[next]).empty()) return false;
+    const std::size_t length = byte < 0x80 ? 1 : lengthOfAllowedCharacter(text.substr(next));
+    if (length == 0) return false;
+    next += length;
+  }
+  return true;
+}
+
 void appendEscapedText(std::string& output, std::string_view text) {
   appendEscaped(output, text, kTextRules);
 }

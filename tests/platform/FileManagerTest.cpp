@@ -55,6 +55,17 @@ class FileManagerTest : public testing::Test {
   ErrorSlot error_;
 };
 
+TEST_F(FileManagerTest, IsSymbolicLinkLooksAtThePathItself) {
+  directory_.addFile("file", "");
+  std::filesystem::create_symlink("file", directory_ / "link");
+  std::filesystem::create_symlink("missing", directory_ / "dangling");
+  EXPECT_TRUE(isSymbolicLink(directory_ / "link"));
+  EXPECT_TRUE(isSymbolicLink(directory_ / "dangling"));
+  EXPECT_FALSE(isSymbolicLink(directory_ / "file"));
+  EXPECT_FALSE(isSymbolicLink(directory_.path()));
+  EXPECT_FALSE(isSymbolicLink(directory_ / "missing"));
+}
+
 TEST_F(FileManagerTest, FileExistsFollowsLinks) {
   directory_.addFile("file", "");
   std::filesystem::create_symlink("file", directory_ / "link");

@@ -99,6 +99,25 @@ TEST(XMLEscapingTest, LeavesOutWhatXMLCannotHold) {
   }
 }
 
+TEST(XMLEscapingTest, TellsWhatXMLCanHoldWhole) {
+  struct Row {
+    std::string_view text;
+    bool holds;
+  };
+  const Row rows[] = {
+      {"", true},
+      {"a\t\n\r<>&\"", true},
+      {"\xC3\xA9\xF0\x9F\x8E\xA7\xEF\xBF\xBD", true},
+      {"a\0b"sv, false},
+      {"\x0B", false},
+      {"\xFF", false},
+      {"\xC3", false},
+      {"\xED\xA0\x80", false},  // a surrogate
+      {"\xEF\xBF\xBE", false},  // U+FFFE
+  };
+  for (const Row& row : rows) EXPECT_EQ(isXMLText(row.text), row.holds) << row.text;
+}
+
 }  // namespace
 
 }  // namespace platform

@@ -1,0 +1,147 @@
+#include "cli/QELDriver.h"
+
+#include <initializer_list>
+#include <memory>
+#include <new>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "cli/QELArguments.h"
+#include "cli/QELProgress.h"
+#include "cli/QELSourceResolution.h"
+#include "generators/QELBundlePodcastGenerator.h"
+#include "generators/QELFeedPodcastGenerator.h"
+#include "generators/QELReferenceFilePodcastGenerator.h"
+#include "platform/FormattedText.h"
+#include "platform/Paths.h"
+#include "platform/PropertyListWriter.h"
+#include "platform/StandardStreams.h"
+#include "platform/TextHelpers.h"
+
+namespace {
+
+using platform::ErrorSlot;
+
+constexpr int kSuccess = 0;
+constexpr int kFailure = 1;
+
+int fail(std::string_view format, std::initializer_list<platform::FormatArgument> arguments = {}) {
+  platform::flushStandardOutput();
+  platform::writeToStandardError(platform::formattedText(format, arguments));
+  return kFailure;
+}
+
+std::optional<std::string_view> descriptionOf(const ErrorSlot& error) {
+  if (!error) return std::nullopt;
+  return error->description;
+}
+
+/// "Could not generate WHAT", with the cause where there is one.
+int failToGenerate(std::string_view what, const ErrorSlot& error) {
+  if (!error) return fail("Could not generate %@ because of an unspecified error.\n", {what});
+  return fail("Could not generate %@: %s\n", {what, descriptionOf(error)});
+}
+
+/// Runs one step that can fail; running out of memory is a failure like any other.
+template <typename Step>
+bool succeeds(Step step, ErrorSlot& error) {
+  error.reset();
+  try {
+    return step();
+  } catch (const std::bad_alloc&) {
+    error = platform::ErrorRecord{"POSIX", 0, "Out of memory"};
+    return false;
+  }
+}
+
+bool generate(QELPodcastGenerator& generator, QELPodcastSource& source, ErrorSlot& error) {
+  return succeeds([&] { return generator.generateFromSource(source, error); }, error);
+}
+
+std::string targetPath(const QELArguments& arguments) {
+  return arguments.outputPath.value_or(std::string(platform::kStandardOutputPath));
+}
+
+int createBundle(const QELArguments& arguments, QELPodcastSource& source) {
+  QELBundlePodcastGenerator generator;
+  // The path is the bundle itself, exactly as it was given, whatever its extension.
+  generator.setOutputPath(arguments.outputPath.value_or(platform::temporaryDirectory()));
+  ErrorSlot error;
+  if (!generate(generator, source, error)) return failToGenerate("bundle", error);
+  QELProgress("N", "Done!");
+  return kSuccess;
+}
+
+int createFeed(const QELArguments& arguments, QELPodcastSource& source) {
+  const std::string format = platform::lowercased(arguments.feedFormat.value_or("rss"));
+  if (format != "rss" && format != "atom") {
+    return fail("\"%s\" is not a recognized feed format.\n", {format});
+  }
+
+  QELFeedPodcastGenerator generator;
+  generator.setFormat(format);
+  ErrorSlot error;
+  if (!generate(generator, source, error)) return failToGenerate("feed", error);
+  if (!generator.xmlData()) return fail("Could not generate feed: no data was produced.\n");
+
+  // The line break is written apart, behind whatever the target holds by then.
+  const std::string target = targetPath(arguments);
+  platform::OutputFile(target, platform::OutputFile::Mode::kReplace).write(*generator.xmlData());
+  platform::OutputFile(target, platform::OutputFile::Mode::kAppend).write("\n");
+  return kSuccess;
+}
+
+int parseFeed(const QELArguments& arguments, QELPodcastSource& source) {
+  QELReferenceFilePodcastGenerator generator;
+  ErrorSlot error;
+  if (!generate(generator, source, error)) return failToGenerate("reference file", error);
+  if (!generator.referenceData()) {
+    return fail("Could not generate reference file: no data was produced.\n");
+  }
+
+  platform::OutputFile output(targetPath(arguments), platform::OutputFile::Mode::kReplace);
+  platform::writePropertyList(*generator.referenceData(),
+                              [&output](std::string_view bytes) { return output.write(bytes); });
+  return kSuccess;
+}
+
+int run(const QELArguments& arguments) {
+  QELShouldReportProgress = arguments.command == "createbundle" || arguments.outputPath.has_value();
+
+  if (!QELValidateSource(arguments.source, arguments.readStandardInput)) {
+    return fail("\"%s\" is not a valid podcast source.\n", {arguments.source});
+  }
+  const std::unique_ptr<QELPodcastSource> source = arguments.readStandardInput
+                                                       ? initWithStandardInput()
+                                                       : initWithSourceString(*arguments.source);
+  if (!source) {
+    return fail("Could not initialize podcast source with string \"%s\".\n", {arguments.source});
+  }
+
+  QELProgress("N", "Loading/interpreting source...");
+  ErrorSlot error;
+  if (!succeeds([&] { return source->loadSourceWithError(error); }, error)) {
+    return fail("Could not load source: %s", {descriptionOf(error)});
+  }
+
+  if (arguments.command == "createbundle") return createBundle(arguments, *source);
+  if (arguments.command == "createfeed") return createFeed(arguments, *source);
+  if (arguments.command == "parsefeed") return parseFeed(arguments, *source);
+  return fail("No recognizable command was provided.\n");
+}
+
+}  // namespace
+
+int QELRun(std::span<const char* const> arguments) {
+  try {
+    std::optional<std::string> unknownCommand;
+    const QELArguments scanned = QELScanArguments(arguments, unknownCommand);
+    if (unknownCommand) return fail("Command `%s' not recognized.\n", {*unknownCommand});
+    return run(scanned);
+  } catch (const std::bad_alloc&) {
+    // Nothing is left to make a message of.
+    platform::writeToStandardError("Out of memory.\n");
+    return kFailure;
+  }
+}

@@ -1,0 +1,63 @@
+#include "cli/QELSourceResolution.h"
+
+#include <string>
+#include <utility>
+
+#include "platform/FileManager.h"
+#include "platform/Paths.h"
+#include "platform/PropertyListReader.h"
+#include "platform/StandardStreams.h"
+#include "platform/TextHelpers.h"
+#include "platform/URL.h"
+#include "sources/QELBundlePodcastSource.h"
+#include "sources/QELFeedPodcastSource.h"
+#include "sources/QELReferenceFilePodcastSource.h"
+
+namespace {
+
+constexpr std::string_view kPcast = "pcast";
+
+/// Whether the string is a URL and not a path. Case counts here, unlike in the reference type of a
+/// location: "HTTP://..." is a path.
+bool namesURL(std::string_view source) {
+  return source.starts_with("http") || source.starts_with(kPcast) || source.starts_with("file:");
+}
+
+std::optional<platform::URL> urlFromSource(std::string_view source) {
+  if (!source.starts_with(kPcast)) return platform::URL::parse(source);
+  return platform::URL::parse("http" + std::string(source.substr(kPcast.size())));
+}
+
+}  // namespace
+
+bool QELValidateSource(std::optional<std::string_view> source, bool readStandardInput) {
+  if (source) return !namesURL(*source) || urlFromSource(*source).has_value();
+  return readStandardInput && QELPodcastFromStandardInput();
+}
+
+std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput() {
+  static std::shared_ptr<const platform::PropertyListValue> cached;
+  if (!cached) {
+    platform::ErrorSlot ignored;  // what is wrong with the input is not told apart here
+    if (auto value = platform::readPropertyList(platform::readStandardInput(), ignored)) {
+      cached = std::make_shared<const platform::PropertyListValue>(std::move(*value));
+    }
+  }
+  return cached;
+}
+
+std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source) {
+  if (namesURL(source)) return QELFeedPodcastSource::initWithURL(urlFromSource(source));
+
+  const std::string path(source);
+  if (!platform::fileExists(path)) return nullptr;
+  const std::string extension = platform::lowercased(platform::pathExtension(path));
+  if (extension == "podcast") return QELBundlePodcastSource::initWithPath(path);
+  if (extension == "plist") return QELReferenceFilePodcastSource::initWithPath(path);
+  return nullptr;
+}
+
+std::unique_ptr<QELPodcastSource> initWithStandardInput() {
+  return QELReferenceFilePodcastSource::initWithDictionary(
+      QELSharedDictionary(QELPodcastFromStandardInput()));
+}

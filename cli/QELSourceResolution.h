@@ -1,0 +1,26 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string_view>
+
+#include "model/QELPodcastSource.h"
+#include "platform/PropertyListValue.h"
+
+/// Whether the source string is acceptable at all. One that begins with "http", "pcast" or "file:"
+/// (in lower case) must be a valid URL, "pcast" read as "http"; any other, even an empty one, is
+/// acceptable, whether it names a file or not. Without a source string, standard input must be
+/// asked for and hold a property list.
+bool QELValidateSource(std::optional<std::string_view> source, bool readStandardInput);
+
+/// The property list on standard input, read and parsed once for the whole process; null when it is
+/// none.
+std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput();
+
+/// The source that the string names: a feed for a URL (see QELValidateSource), a bundle or a
+/// reference file for an existing path with the extension "podcast" or "plist" in any mix of case.
+/// Null when there is no such thing. Nothing is fetched yet.
+std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source);
+
+/// The source for the reference file on standard input; null when there is none.
+std::unique_ptr<QELPodcastSource> initWithStandardInput();

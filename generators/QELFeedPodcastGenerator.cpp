@@ -1,0 +1,174 @@
+#include "generators/QELFeedPodcastGenerator.h"
+
+#include <chrono>
+#include <cstdint>
+#include <string_view>
+#include <type_traits>
+#include <utility>
+
+#include "cli/QELError.h"
+#include "cli/QELReferenceType.h"
+#include "platform/DateFormatter.h"
+#include "platform/FormattedText.h"
+#include "platform/Paths.h"
+#include "platform/PointInTime.h"
+#include "platform/TextHelpers.h"
+#include "platform/URL.h"
+
+namespace {
+
+using platform::PointInTime;
+using platform::Text;
+using platform::XMLElement;
+
+constexpr std::string_view kDublinCoreNamespace = "http://purl.org/dc/elements/1.1/";
+constexpr std::string_view kOrvaneNamespace = "https://orvane.example/ns/podcast-1.0";
+constexpr std::string_view kQELNamespace = "https://qel.example/ns/1.0";
+
+template <typename Item>
+constexpr bool isPodcast = std::is_base_of_v<QELPodcastSource, Item>;
+
+PointInTime now() {
+  return std::chrono::floor<PointInTime::duration>(std::chrono::system_clock::now());
+}
+
+/// RFC 822 as RSS 2.0 asks for it, in the locale and the time zone of the process.
+std::string dateText(PointInTime date) {
+  static const platform::DateFormatter formatter("EEE, dd MMM yyyy HH:mm:ss ZZZZ");
+  return formatter.format(date);
+}
+
+std::optional<Text> descriptionOf(const QELPodcastSource& podcast) {
+  return podcast.podcastDescription();
+}
+std::optional<Text> descriptionOf(const QELEpisode& episode) {
+  return episode.episodeDescription();
+}
+
+/// The value of "orvane:explicit" for an advisory label; absent for a label without one.
+std::optional<std::string_view> explicitValue(const std::optional<Text>& label) {
+  if (!label) return std::nullopt;
+  const std::string lowercased = platform::lowercased(*label);
+  if (lowercased == "explicit" || lowercased == "yes") return "yes";
+  if (lowercased == "clean") return "clean";
+  return std::nullopt;
+}
+
+/// The location as a feed can carry it: an absolute local path becomes a file URL, a relative path
+/// and a URL stay as they are. Absent for an absent location and for an unknown reference type.
+std::optional<Text> resolvedURL(const std::optional<Text>& location,
+                                const std::optional<Text>& referenceType) {
+  if (!location || !referenceType || *referenceType == kReferenceTypeRemote) return location;
+  if (*referenceType != kReferenceTypeLocal) return std::nullopt;
+  if (!platform::isAbsolutePath(*location)) return location;
+  return Text(platform::fileURLText(*location));
+}
+
+void appendTextChild(XMLElement element, std::string_view name, const std::optional<Text>& text) {
+  if (text) element.appendChild(name, *text);
+}
+
+void appendPoster(XMLElement element, const std::optional<Text>& url) {
+  if (url) element.appendChild("orvane:image").appendAttribute("href", *url);
+}
+
+void appendChannelImage(XMLElement channel, const QELPodcastSource& podcast,
+                        const std::optional<Text>& posterURL) {
+  if (!posterURL) return;
+  XMLElement image = channel.appendChild("image");
+  image.appendChild("url", *posterURL);
+  appendTextChild(image, "title", podcast.title());
+}
+
+void appendEnclosure(XMLElement item, const QELEpisode& episode) {
+  const std::optional<Text> url = resolvedURL(episode.location(), episode.referenceType());
+  if (!url) return;
+  XMLElement enclosure = item.appendChild("enclosure");
+  enclosure.appendAttribute("url", *url);
+  if (const auto type = episode.contentType()) enclosure.appendAttribute("type", *type);
+  if (const std::uint64_t length = episode.contentLength(); length != 0) {
+    enclosure.appendAttribute("length", platform::formattedText("%lu", {length}));
+  }
+}
+
+/// Both kinds of item go through the same rows, so that their common children stand in one order.
+template <typename Item>
+void populate(XMLElement element, const Item& item, bool stampNow) {
+  appendTextChild(element, "title", item.title());
+  appendTextChild(element, "dc:creator", item.author());
+  appendTextChild(element, "orvane:author", item.author());
+  if (stampNow) {
+    element.appendChild("pubDate", dateText(now()));
+  } else if constexpr (!isPodcast<Item>) {
+    if (const auto date = item.date()) element.appendChild("pubDate", dateText(*date));
+  }
+  if constexpr (isPodcast<Item>) appendTextChild(element, "copyright", item.copyright());
+  appendTextChild(element, "orvane:keywords", item.keywords());
+  if (const auto category = item.category()) {
+    element.appendChild("orvane:category").appendAttribute("text", *category);
+  }
+  appendTextChild(element, "description", descriptionOf(item));
+  appendTextChild(element, "orvane:summary", descriptionOf(item));
+  if (const auto value = explicitValue(item.advisoryLabel())) {
+    element.appendChild("orvane:explicit", *value);
+  }
+  appendTextChild(element, "qel:uuid", item.uuid());
+  if constexpr (!isPodcast<Item>) {
+    if (const std::int64_t order = item.orvaneOrder(); order >= 0) {
+      element.appendChild("qel:order", platform::formattedText("%ld", {order}));
+    }
+  }
+
+  const std::optional<Text> posterURL =
+      resolvedURL(item.posterLocation(), item.posterReferenceType());
+  if constexpr (isPodcast<Item>) appendChannelImage(element, item, posterURL);
+  appendPoster(element, posterURL);
+  if constexpr (isPodcast<Item>) {
+    appendTextChild(element, "link", item.location());
+  } else {
+    appendEnclosure(element, item);
+  }
+}
+
+void addRSS(platform::XMLDocument& document, const QELPodcastSource& source, bool stampNow) {
+  XMLElement rss = document.setRoot("rss");
+  rss.appendAttribute("version", "2.0");
+  rss.declareNamespace("dc", kDublinCoreNamespace);
+  rss.declareNamespace("orvane", kOrvaneNamespace);
+  rss.declareNamespace("qel", kQELNamespace);
+
+  XMLElement channel = rss.appendChild("channel");
+  QELPopulateRSSElementFromItem(channel, source, stampNow);
+  if (!source.episodes()) return;
+  for (const auto& episode : *source.episodes()) {
+    QELPopulateRSSElementFromItem(channel.appendChild("item"), *episode, false);
+  }
+}
+
+}  // namespace
+
+bool QELFeedPodcastGenerator::generateFromSource(QELPodcastSource& source,
+                                                 platform::ErrorSlot& error) {
+  platform::XMLDocument document;
+  if (format_ == "rss") {
+    addRSS(document, source, generatePubDate_);
+  } else if (format_ != "atom") {
+    error =
+        QELError(2, platform::formattedText("\"%@\" is not a recognized feed format", {format_}));
+    return false;
+  }
+  setXmlData(std::make_shared<const std::string>(document.serialised()));
+  return true;
+}
+
+void QELPopulateRSSElementFromItem(XMLElement element, const QELPodcastSource& item,
+                                   bool stampNow) {
+  populate(element, item, stampNow);
+}
+
+void QELPopulateRSSElementFromItem(XMLElement element, const QELEpisode& item, bool stampNow) {
+  populate(element, item, stampNow);
+}
+
+void QELPopulateAtomElementFromItem(XMLElement /*element*/, const QELPodcastSource& /*item*/) {}
+void QELPopulateAtomElementFromItem(XMLElement /*element*/, const QELEpisode& /*item*/) {}

@@ -1,0 +1,15 @@
+#include "generators/QELNameLedger.h"
+
+#include "platform/FormattedText.h"
+
+std::string QELNameLedger::reserve(const std::string& name) {
+  if (taken_.insert(name).second) return name;
+
+  constexpr std::uint64_t kFirstNumber = 2;
+  std::uint64_t& number = nextNumbers_.try_emplace(name, kFirstNumber).first->second;
+  while (true) {
+    std::string numbered = platform::formattedText("%@-%lu", {name, number});
+    ++number;
+    if (taken_.insert(numbered).second) return numbered;
+  }
+}

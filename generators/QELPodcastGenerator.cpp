@@ -1,0 +1,9 @@
+#include "generators/QELPodcastGenerator.h"
+
+#include "cli/QELError.h"
+
+bool QELPodcastGenerator::generateFromSource(QELPodcastSource& /*source*/,
+                                             platform::ErrorSlot& error) {
+  error = QELError(1, "Attempt to generate with an abstract generator");
+  return false;
+}

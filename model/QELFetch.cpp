@@ -1,0 +1,23 @@
+#include "model/QELFetch.h"
+
+#include "cli/QELReferenceType.h"
+#include "platform/EventLoop.h"
+#include "platform/FileManager.h"
+#include "platform/URL.h"
+
+bool QELFetchToPath(const std::optional<platform::Text>& location,
+                    const std::optional<platform::Text>& referenceType, const std::string& path,
+                    platform::DownloadReceiver& receiver, QELDownloadState& state,
+                    const std::function<void()>& willDownload) {
+  if (!location) return false;
+  if (referenceType != kReferenceTypeRemote) return platform::copyFile(location->string(), path);
+  const std::optional<platform::URL> url = platform::URL::parse(*location);
+  if (!url) return false;
+
+  willDownload();
+  state = QELDownloadState();
+  const platform::Download download(*url, path, receiver);
+  while (!state.downloadFinished && platform::runEventLoopOnce()) {
+  }
+  return state.downloadSuccess;
+}

@@ -1,0 +1,40 @@
+#include "model/QELPodcastKeys.h"
+
+namespace {
+
+using Source = QELPodcastSource;
+
+constexpr QELPodcastKey kKeys[] = {
+    {"PodcastUUID", &Source::uuid, &Source::setUuid},
+    {"PodcastName", &Source::title, &Source::setTitle},
+    {"PodcastAuthor", &Source::author, &Source::setAuthor},
+    {"PodcastCopyright", &Source::copyright, &Source::setCopyright},
+    {"PodcastKeywords", &Source::keywords, &Source::setKeywords},
+    {"PodcastCategory", &Source::category, &Source::setCategory},
+    {"PodcastDescription", &Source::podcastDescription, &Source::setPodcastDescription},
+    {"PodcastAdvisoryLabel", &Source::advisoryLabel, &Source::setAdvisoryLabel},
+    {"PodcastReference", &Source::location, &Source::setLocation},
+    {"PodcastReferenceType", &Source::referenceType, &Source::setReferenceType},
+    {"PodcastPosterReference", &Source::posterLocation, &Source::setPosterLocation},
+    {"PodcastPosterReferenceType", &Source::posterReferenceType, &Source::setPosterReferenceType},
+};
+constexpr std::size_t kDescriptiveKeyCount = 8;
+
+}  // namespace
+
+std::span<const QELPodcastKey> QELPodcastKeys() {
+  return kKeys;
+}
+
+std::span<const QELPodcastKey> QELPodcastDescriptiveKeys() {
+  return std::span(kKeys).first(kDescriptiveKeyCount);
+}
+
+void QELAddPodcastKeys(std::span<const QELPodcastKey> keys, const QELPodcastSource& source,
+                       platform::Dictionary& dictionary) {
+  for (const QELPodcastKey& field : keys) {
+    if (const auto& value = (source.*field.value)()) {
+      dictionary.insert_or_assign(std::string(field.key), *value);
+    }
+  }
+}

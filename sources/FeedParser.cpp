@@ -1,0 +1,181 @@
+#include "sources/FeedParser.h"
+
+#include <algorithm>
+#include <cstdint>
+
+#include "cli/QELError.h"
+#include "dates/RFC822Parsing.h"
+#include "platform/Text.h"
+#include "platform/TextHelpers.h"
+
+namespace {
+
+using platform::Dictionary;
+using platform::Text;
+
+/// The local names of the elements whose start empties the text buffer. Built once, at the first
+/// element of the first feed, and shared by all parsers.
+struct TextBearingElements {
+  std::vector<std::string_view> RSScdataElements{"title",     "pubDate",  "description", "author",
+                                                 "creator",   "link",     "url",         "uuid",
+                                                 "copyright", "keywords", "explicit"};
+  /// The place for Atom's, should Atom be read one day.
+  std::vector<std::string_view> AtomcdataElements;
+};
+
+const TextBearingElements& textBearingElements() {
+  static const TextBearingElements elements;
+  return elements;
+}
+
+/// The length of a uuid in its 8-4-4-4-12 form (RFC 4122), in characters.
+constexpr std::size_t kUuidLength = 36;
+
+/// The uuid at the start of the text; absent when the text is too short to hold one.
+std::optional<std::string_view> leadingUuid(std::optional<std::string_view> text) {
+  if (!text) return std::nullopt;
+  const std::string_view uuid = platform::firstCharacters(*text, kUuidLength);
+  if (platform::characterCount(uuid) < kUuidLength) return std::nullopt;
+  return uuid;
+}
+
+}  // namespace
+
+std::optional<std::string_view> FeedParser::MarkerSearch::textBehindMarker(std::string_view text) {
+  if (!found_) {
+    const std::size_t place = text.find(marker_, searched_);
+    if (place == std::string_view::npos) {
+      // A marker may have begun in the last bytes.
+      searched_ = std::max(searched_, text.size() - std::min(text.size(), marker_.size() - 1));
+      return std::nullopt;
+    }
+    found_ = place + marker_.size();
+  }
+  return text.substr(*found_);
+}
+
+std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::string_view> data) {
+  if (!data) return nullptr;
+  return std::unique_ptr<FeedParser>(new FeedParser(*data));
+}
+
+bool FeedParser::parseWithError(platform::ErrorSlot& error) {
+  if (!feedParser_.parse(error)) return false;
+  if (feedType_ == "rss" || feedType_ == "atom") return true;
+  error = QELError(3, "The feed was neither RSS nor Atom");
+  return false;
+}
+
+void FeedParser::didStartElement(const platform::XMLName& name,
+                                 const platform::XMLAttributes& attributes) {
+  const std::vector<std::string_view>& textBearing = textBearingElements().RSScdataElements;
+  if (name.local == "rss") {
+    setFeedType("rss");
+    return;
+  }
+  if (!readsRSS()) return;
+
+  if (name.local == "item") {
+    currentEpisode_ = &episodes_.emplace_back();
+  } else if (name.local == "enclosure") {
+    readEnclosure(attributes);
+  } else if (name.local == "image") {
+    parsingImage_ = true;
+    if (name.qualified == "orvane:image") {
+      if (const auto href = attributes.value("href")) {
+        target().insert_or_assign("poster", Text(*href));
+      }
+    }
+  } else if (name.qualified == "orvane:category") {
+    // The first category wins: later ones and nested subcategories find the key taken.
+    if (const auto text = attributes.value("text")) target().try_emplace("category", Text(*text));
+  }
+
+  if (std::find(textBearing.begin(), textBearing.end(), name.local) != textBearing.end()) {
+    emptyBuffer();
+  }
+}
+
+void FeedParser::didEndElement(const platform::XMLName& name) {
+  if (!readsRSS()) return;
+
+  const std::string_view local = name.local;
+  if (local == "item") {
+    currentEpisode_ = nullptr;
+  } else if (local == "title") {
+    takeText(target(), "title");
+  } else if (local == "author" || local == "creator") {
+    takeText(target(), "author");
+  } else if (local == "description") {
+    takeText(target(), "description");
+  } else if (local == "copyright") {
+    takeText(target(), "copyright");
+  } else if (local == "keywords") {
+    takeText(target(), "keywords");
+  } else if (local == "explicit") {
+    readAdvisoryLabel(target());
+  } else if (local == "pubDate") {
+    readDate(target());
+  } else if (local == "image") {
+    parsingImage_ = false;
+  } else if (local == "url") {
+    if (parsingImage_) target().try_emplace("poster", Text(std::string_view(cdataBuffer_)));
+    emptyBuffer();
+  } else if (local == "link") {
+    readLink();
+  } else if (name.qualified == "qel:uuid") {
+    takeText(target(), "QELUUID");
+  } else if (name.qualified == "qel:order") {
+    takeText(target(), "order");
+  }
+}
+
+void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
+  if (!currentEpisode_) return;
+  if (const auto url = attributes.value("url")) {
+    currentEpisode_->insert_or_assign("url", Text(*url));
+  }
+  if (const auto length = attributes.value("length")) {
+    const std::int64_t number = platform::leadingInteger(*length);
+    if (number > 0) currentEpisode_->insert_or_assign("contentLength", number);
+  }
+  if (const auto type = attributes.value("type")) {
+    currentEpisode_->insert_or_assign("contentType", Text(*type));
+  }
+}
+
+void FeedParser::readAdvisoryLabel(Dictionary& target) {
+  const std::string label = platform::lowercased(cdataBuffer_);
+  if (label == "yes") {
+    target.insert_or_assign("advisoryLabel", "Explicit");
+  } else if (label == "clean") {
+    target.insert_or_assign("advisoryLabel", "Clean");
+  }
+  emptyBuffer();
+}
+
+void FeedParser::readDate(Dictionary& target) {
+  if (const auto date = dateWithRFC822String(cdataBuffer_)) target.insert_or_assign("date", *date);
+  emptyBuffer();
+}
+
+/// A link itself is kept nowhere, but may carry the uuid of the podcast or of the episode. The
+/// buffer is not emptied.
+void FeedParser::readLink() {
+  if (const auto uuid = leadingUuid(documentMarker_.textBehindMarker(cdataBuffer_))) {
+    if (currentEpisode_) currentEpisode_->insert_or_assign("QELUUID", Text(*uuid));
+  } else if (const auto feedUuid = leadingUuid(collectionMarker_.textBehindMarker(cdataBuffer_))) {
+    feedAttributes_.insert_or_assign("QELUUID", Text(*feedUuid));
+  }
+}
+
+void FeedParser::takeText(Dictionary& target, const char* key) {
+  target.insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
+  emptyBuffer();
+}
+
+void FeedParser::emptyBuffer() {
+  cdataBuffer_.clear();
+  collectionMarker_.restart();
+  documentMarker_.restart();
+}

@@ -1,0 +1,90 @@
+#pragma once
+
+#include <cstddef>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "platform/ErrorRecord.h"
+#include "platform/PropertyListValue.h"
+#include "platform/XMLParser.h"
+
+/// Turns the bytes of a podcast feed into two plain results: the feed attributes (one dictionary
+/// for the channel) and the episodes (a feed item dictionary for each "item").
+///
+/// It understands RSS 2.0 with the podcast-directory elements (prefix "orvane"), Dublin Core's
+/// creator and the tool's own elements (prefix "qel"). It is deliberately shallow: it knows whether
+/// it is inside an item or an image and no more, goes by local names (a few by the qualified name
+/// as written), and keeps the text of the most recent text-bearing element in one buffer that all
+/// elements share. Texts are kept exactly as they stand, white space included.
+///
+/// Keys of both dictionaries, each absent when its element never came: "title", "author",
+/// "description", "copyright", "keywords", "category", "poster", "QELUUID" and "order" (texts),
+/// "advisoryLabel" ("Explicit" or "Clean"), "date" (a point in time); items also have "url",
+/// "contentType" (texts) and "contentLength" (an integer over 0).
+///
+/// Made for one feed, parsed once, read and dropped.
+class FeedParser : private platform::XMLParserEvents {
+ public:
+  /// A parser over the bytes, which are not copied and must outlive the parse; null for absent
+  /// data.
+  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string_view> data);
+
+  /// Runs the whole parse. False for malformed XML, with the XML parser's own record, and for a
+  /// document without an "rss" element, with code 3.
+  bool parseWithError(platform::ErrorSlot& error);
+
+  /// "rss" once an element of that local name has been seen; nothing else is ever recognised.
+  const std::optional<std::string>& feedType() const { return feedType_; }
+  void setFeedType(std::optional<std::string> type) { feedType_ = std::move(type); }
+
+  const platform::Dictionary& feedAttributes() const { return feedAttributes_; }
+  /// In document order.
+  const std::vector<platform::Dictionary>& episodes() const { return episodes_; }
+
+ private:
+  /// The first place of a marker in a text that only grows at its end; no byte is looked at twice,
+  /// so that asking again and again costs no more than asking once.
+  class MarkerSearch {
+   public:
+    explicit MarkerSearch(std::string_view marker) : marker_(marker) {}
+    /// What follows the first marker; absent while there is none.
+    std::optional<std::string_view> textBehindMarker(std::string_view text);
+    void restart() { *this = MarkerSearch(marker_); }
+
+   private:
+    std::string_view marker_;
+    std::optional<std::size_t> found_;
+    std::size_t searched_ = 0;
+  };
+
+  explicit FeedParser(std::string_view data) : feedParser_(data, *this) {}
+
+  void didStartElement(const platform::XMLName& name,
+                       const platform::XMLAttributes& attributes) override;
+  void didEndElement(const platform::XMLName& name) override;
+  void foundCharacters(std::string_view text) override { cdataBuffer_.append(text); }
+
+  void readEnclosure(const platform::XMLAttributes& attributes);
+  void readAdvisoryLabel(platform::Dictionary& target);
+  void readDate(platform::Dictionary& target);
+  void readLink();
+
+  bool readsRSS() const { return feedType_ == "rss"; }
+  /// The open item, or the channel between items.
+  platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
+  void takeText(platform::Dictionary& target, const char* key);
+  void emptyBuffer();
+
+  platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items
+  std::vector<platform::Dictionary> episodes_;
+  bool parsingImage_ = false;
+  platform::Dictionary feedAttributes_;
+  std::string cdataBuffer_;
+  MarkerSearch collectionMarker_{"collection/uuid/"};
+  MarkerSearch documentMarker_{"document/uuid/"};
+  platform::XMLParser feedParser_;
+  std::optional<std::string> feedType_;
+};

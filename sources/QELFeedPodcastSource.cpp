@@ -1,0 +1,72 @@
+#include "sources/QELFeedPodcastSource.h"
+
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "cli/QELError.h"
+#include "cli/QELReferenceType.h"
+#include "platform/PropertyListValue.h"
+#include "platform/ResourceReader.h"
+#include "sources/FeedParser.h"
+
+namespace {
+
+/// What a failing service said, or the tool's own record where it said nothing.
+void fillSlot(platform::ErrorSlot& error, platform::ErrorSlot said, const char* otherwise) {
+  error = said ? std::move(said) : QELError(3, otherwise);
+}
+
+}  // namespace
+
+std::unique_ptr<QELFeedPodcastSource> QELFeedPodcastSource::initWithURL(
+    std::optional<platform::URL> url) {
+  if (!url) return nullptr;
+  return std::make_unique<QELFeedPodcastSource>(std::move(url));
+}
+
+bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
+  if (!feedURL_) {
+    error = QELError(1, "No feed URL provided");
+    return false;
+  }
+
+  platform::ErrorSlot said;
+  std::optional<std::string> bytes = platform::readResource(*feedURL_, said);
+  if (!bytes || said) {
+    fillSlot(error, std::move(said), "Could not load or read the specified feed URL");
+    return false;
+  }
+  const std::unique_ptr<FeedParser> parser = FeedParser::parserWithFeedData(*bytes);
+  if (!parser->parseWithError(said)) {
+    fillSlot(error, std::move(said), "Could not parse the feed at the specified URL");
+    return false;
+  }
+  bytes.reset();  // as large as everything that was read from them
+
+  const platform::Dictionary& attributes = parser->feedAttributes();
+  const auto text = [&attributes](std::string_view key) -> std::optional<platform::Text> {
+    const platform::PropertyListValue* value = platform::valueForKey(attributes, key);
+    return value ? value->asText() : std::nullopt;
+  };
+  setUuid(text("QELUUID"));
+  setTitle(text("title"));
+  setAuthor(text("author"));
+  setCopyright(text("copyright"));
+  setKeywords(text("keywords"));
+  setCategory(text("category"));
+  setPodcastDescription(text("description"));
+  setAdvisoryLabel(text("advisoryLabel"));
+  setLocation(text("url"));
+  setReferenceType(QELReferenceType(location()));
+  setPosterLocation(text("poster"));
+  setPosterReferenceType(QELReferenceType(posterLocation()));
+
+  auto episodes = std::make_shared<QELEpisodeList>();
+  episodes->reserve(parser->episodes().size());
+  for (const platform::Dictionary& item : parser->episodes()) {
+    episodes->push_back(QELEpisode::episodeWithFeedDictionary(&item));
+  }
+  setEpisodes(std::move(episodes));
+  return true;
+}

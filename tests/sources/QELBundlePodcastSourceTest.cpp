@@ -1,0 +1,157 @@
+#include "sources/QELBundlePodcastSource.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+
+#include "platform/PropertyListWriter.h"
+#include "tests/support/TemporaryDirectory.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using platform::Dictionary;
+using platform::PropertyListValue;
+
+class QELBundlePodcastSourceTest : public testing::Test {
+ protected:
+  QELBundlePodcastSourceTest() : previous_(fs::current_path()) {}
+  ~QELBundlePodcastSourceTest() override { fs::current_path(previous_); }
+
+  /// A bundle with the dictionary as its "Info.plist"; its path.
+  std::string bundle(const Dictionary& dictionary, const char* name = "a.podcast") const {
+    fs::create_directories(directory() / name);
+    std::ofstream file(directory() / name / "Info.plist", std::ios::binary);
+    platform::writePropertyList(dictionary, [&file](std::string_view bytes) {
+      file << bytes;
+      return true;
+    });
+    return (directory() / name).string();
+  }
+
+  static std::unique_ptr<QELBundlePodcastSource> loaded(const std::string& path) {
+    auto source = QELBundlePodcastSource::initWithPath(path);
+    if (!source) {
+      ADD_FAILURE() << "no source for " << path;
+      return nullptr;
+    }
+    platform::ErrorSlot error;
+    EXPECT_TRUE(source->loadSourceWithError(error));
+    return source;
+  }
+
+  /// Without symbolic links, as the working directory is told.
+  fs::path directory() const { return fs::canonical(directory_.path()); }
+
+ private:
+  TemporaryDirectory directory_;
+  fs::path previous_;
+};
+
+TEST_F(QELBundlePodcastSourceTest, WhatIsNoBundleGivesNoSource) {
+  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "nowhere.podcast").string()),
+            nullptr);
+  fs::create_directories(directory() / "empty.podcast");
+  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "empty.podcast").string()),
+            nullptr);
+  std::ofstream(directory() / "file.podcast") << "text";
+  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "file.podcast").string()), nullptr);
+  fs::create_directories(directory() / "bad.podcast");
+  std::ofstream(directory() / "bad.podcast" / "Info.plist") << "text";
+  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "bad.podcast").string()), nullptr);
+}
+
+TEST_F(QELBundlePodcastSourceTest, SourceWithoutPathOrReferenceFileFailsWithCodeOne) {
+  const platform::ErrorRecord expected{
+      "QELDomain", 1, "Attempted to initialize a bundle source without a path or reference file"};
+  platform::ErrorSlot error;
+  EXPECT_FALSE(QELBundlePodcastSource("a.podcast", nullptr).loadSourceWithError(error));
+  EXPECT_EQ(error, expected);
+  error.reset();
+  EXPECT_FALSE(
+      QELBundlePodcastSource(std::nullopt, QELReferenceFilePodcastSource::initWithDictionary(
+                                               std::make_shared<const Dictionary>()))
+          .loadSourceWithError(error));
+  EXPECT_EQ(error, expected);
+}
+
+TEST_F(QELBundlePodcastSourceTest, DescriptiveFieldsComeFromTheReferenceFile) {
+  const auto source = loaded(bundle({{"PodcastUUID", "u"},
+                                     {"PodcastName", "t"},
+                                     {"PodcastAuthor", "a"},
+                                     {"PodcastCopyright", "c"},
+                                     {"PodcastKeywords", "k"},
+                                     {"PodcastCategory", "g"},
+                                     {"PodcastDescription", "d"},
+                                     {"PodcastAdvisoryLabel", "l"},
+                                     {"PodcastReference", "http://a.example/"},
+                                     {"PodcastReferenceType", "remote"},
+                                     {"AllowedPosterTypes", PropertyListValue::Array{"png"}},
+                                     {"AllowedEpisodeTypes", PropertyListValue::Array{"mp3"}}}));
+  EXPECT_EQ(source->uuid(), "u");
+  EXPECT_EQ(source->title(), "t");
+  EXPECT_EQ(source->author(), "a");
+  EXPECT_EQ(source->copyright(), "c");
+  EXPECT_EQ(source->keywords(), "k");
+  EXPECT_EQ(source->category(), "g");
+  EXPECT_EQ(source->podcastDescription(), "d");
+  EXPECT_EQ(source->advisoryLabel(), "l");
+  EXPECT_EQ(source->location(), (directory() / "a.podcast").string());
+  EXPECT_EQ(source->referenceType(), "local");
+  EXPECT_EQ(source->posterLocation(), std::nullopt);
+  EXPECT_EQ(source->posterReferenceType(), std::nullopt);
+  EXPECT_EQ(source->allowedPosterFileTypes(), QELPodcastSource::FileTypes{"png"});
+  EXPECT_EQ(source->allowedEpisodeFileTypes(), QELPodcastSource::FileTypes{"mp3"});
+}
+
+TEST_F(QELBundlePodcastSourceTest, RelativePathIsMadeAbsoluteAndStandardised) {
+  bundle({}, "shows/a.podcast");
+  fs::current_path(directory());
+  const std::string expected = (directory() / "shows/a.podcast").string();
+  for (const char* path : {"shows/a.podcast", "./shows/a.podcast", "shows/../shows//a.podcast/"}) {
+    EXPECT_EQ(loaded(path)->location(), platform::Text(expected)) << path;
+  }
+  EXPECT_EQ(loaded(directory().string() + "/./shows/../shows/a.podcast")->location(),
+            platform::Text(expected));
+}
+
+TEST_F(QELBundlePodcastSourceTest, LocationsAreRebasedAndEpisodePostersAreNot) {
+  const std::string path =
+      bundle({{"PodcastPosterReference", "Posters/p.jpg"},
+              {"Episodes",
+               PropertyListValue::Array{
+                   Dictionary{{"EpisodeReference", "a.mp3"},
+                              {"EpisodeReferenceType", "remote"},
+                              {"EpisodePosterReference", "Posters/1.jpg"},
+                              {"EpisodePosterReferenceType", "local"}},
+                   Dictionary{{"EpisodeReference", "/media/a.mp3"}},
+                   Dictionary{{"EpisodeName", "no location"}, {"EpisodeReferenceType", "remote"}},
+               }}});
+  const auto source = loaded(path);
+  EXPECT_EQ(source->posterLocation(), platform::Text(path + "/Posters/p.jpg"));
+  EXPECT_EQ(source->posterReferenceType(), "local");
+  const auto& episodes = *source->episodes();
+  EXPECT_EQ(episodes[0]->location(), platform::Text(path + "/a.mp3"));
+  EXPECT_EQ(episodes[0]->referenceType(), "local");
+  EXPECT_EQ(episodes[0]->posterLocation(), "Posters/1.jpg");
+  EXPECT_EQ(episodes[0]->posterReferenceType(), "local");
+  EXPECT_EQ(episodes[1]->location(), platform::Text(path + "/media/a.mp3"));
+  EXPECT_EQ(episodes[1]->referenceType(), "local");
+  EXPECT_EQ(episodes[2]->location(), std::nullopt);
+  EXPECT_EQ(episodes[2]->referenceType(), "remote");
+}
+
+TEST_F(QELBundlePodcastSourceTest, RemotePosterIsJoinedLikeAPath) {
+  const std::string path = bundle({{"PodcastPosterReference", "http://a.example/p.jpg"},
+                                   {"PodcastPosterReferenceType", "remote"}});
+  EXPECT_EQ(loaded(path)->posterLocation(), platform::Text(path + "/http:/a.example/p.jpg"));
+}
+
+TEST_F(QELBundlePodcastSourceTest, WithoutEpisodesTheListIsAbsent) {
+  EXPECT_EQ(loaded(bundle({{"PodcastName", "t"}}))->episodes(), nullptr);
+  EXPECT_TRUE(loaded(bundle({{"Episodes", PropertyListValue::Array{}}}))->episodes()->empty());
+}
+
+}  // namespace
