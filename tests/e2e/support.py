@@ -102,6 +102,15 @@ def _is_sanitized():
     return b"__asan_init" in Path(tool()).read_bytes()
 
 
+def has_gnu_parallel():
+    """Whether GNU parallel is installed, and not another program of that name."""
+    if not shutil.which("parallel"):
+        return False
+    finished = subprocess.run(["parallel", "--version"], stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+                              stderr=subprocess.DEVNULL, check=False)
+    return finished.stdout.startswith(b"GNU parallel")
+
+
 # Feeds. Nothing is inserted between the parts, so that every character of a feed is the test's own.
 
 NAMESPACES = ('xmlns:dc="http://purl.org/dc/elements/1.1/" '

@@ -5,14 +5,13 @@ Nobody looks at a hundred thousand files, so what the scripts of examples/fleet 
 
 import os
 import plistlib
-import shutil
 import signal
 import subprocess
 import time
 import unittest
 from pathlib import Path
 
-from support import ToolTestCase, environment, run, tool
+from support import ToolTestCase, environment, has_gnu_parallel, run, tool
 
 FLEET = Path(__file__).resolve().parents[2] / "examples" / "fleet"
 FEEDS = 60
@@ -29,12 +28,6 @@ case $2 in
   *) exec '{tool}' "$@" ;;
 esac
 """
-
-
-def has_gnu_parallel():
-    return shutil.which("parallel") is not None and subprocess.run(
-        ["parallel", "--version"], stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, stdin=subprocess.DEVNULL,
-        check=False).stdout.startswith(b"GNU parallel")
 
 
 class FleetTestCase(ToolTestCase):
