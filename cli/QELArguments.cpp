@@ -14,8 +14,7 @@ bool isCommand(std::string_view word) {
 
 }  // namespace
 
-QELArguments QELScanArguments(std::span<const char* const> arguments,
-                              std::optional<std::string>& unknownCommand) {
+QELArguments QELScanArguments(std::span<const char* const> arguments) {
   QELArguments scanned;
   std::size_t index = 0;
   const auto next = [&]() -> std::optional<std::string> {
@@ -40,12 +39,12 @@ QELArguments QELScanArguments(std::span<const char* const> arguments,
       }
     } else if (!scanned.command) {
       if (!isCommand(*argument)) {
-        unknownCommand = *argument;
+        scanned.unknownCommand = argument;
         return scanned;
       }
-      scanned.command = *argument;
+      scanned.command = argument;
     } else if (!scanned.source) {
-      scanned.source = *argument;
+      scanned.source = argument;
     }
   }
   return scanned;

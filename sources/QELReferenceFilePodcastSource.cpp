@@ -52,8 +52,7 @@ std::unique_ptr<QELReferenceFilePodcastSource> QELReferenceFilePodcastSource::in
   platform::ErrorSlot ignored;  // what is wrong with the file is not told apart here
   std::optional<std::string> bytes = platform::readWholeFile(path, ignored);
   if (!bytes) return nullptr;
-  auto value = platform::readPropertyList(*bytes, ignored);
-  bytes.reset();
+  auto value = platform::readPropertyList(std::move(*bytes), ignored);
   if (!value) return nullptr;
   return initWithDictionary(
       QELSharedDictionary(std::make_shared<const PropertyListValue>(std::move(*value))));
