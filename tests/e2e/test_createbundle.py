@@ -9,6 +9,7 @@ import os
 import plistlib
 import pty
 import re
+import shutil
 import subprocess
 import termios
 import unittest
@@ -422,6 +423,9 @@ class FailureTest(BundleTestCase):
     def test_an_empty_output_path(self):
         self.assertNotCreated("", "No such file or directory")
 
+    def test_a_name_that_is_too_long(self):
+        self.assertNotCreated("n" * 256, "File name too long")
+
     def test_a_dangling_link_in_the_bundles_place(self):
         self.path("link.podcast").symlink_to("nowhere")
         self.assertNotCreated("link.podcast", "File exists")
@@ -557,6 +561,18 @@ class OutputPathTest(BundleTestCase):
                                        env={"TMPDIR": str(temporary)})
                 self.assertSucceeds(result, notices("Fetching 0 episodes", "Done!"))
                 self.assertEqual(set(contents(temporary)), {"Info.plist", "Posters", "other"})
+
+    def test_files_may_be_read_by_whom_the_user_lets(self):
+        web = self.server()
+        for mask, mode in ((0o022, 0o644), (0o077, 0o600)):
+            with self.subTest(mode=oct(mode)):
+                shutil.rmtree(self.bundle, ignore_errors=True)
+                os.chmod(self.media("b.mp3"), 0o644)
+                self.assertWarns(self.create_episodes(web.serve("/a.mp3", b"media"), self.media("b.mp3"),
+                                                      preexec_fn=lambda mask=mask: os.umask(mask)))
+                self.assertEqual({name: (self.bundle / name).stat().st_mode & 0o777
+                                  for name in ("Info.plist", "a.mp3", "b.mp3")},
+                                 {"Info.plist": mode, "a.mp3": mode, "b.mp3": mode})
 
     def test_relative_locations_belong_to_the_working_directory(self):
         self.media("a.mp3")

@@ -248,17 +248,42 @@ class KillTest(InterruptionTestCase):
                 self.assertEqual(contents(self.bundle), complete)
         self.assertGreater(left_behind, 0, "no kill met a file half written")
 
-    def test_a_hidden_file_of_a_killed_run_is_cleared_away(self):
-        web = self.server()
-        url, gate = self.held(web, "/one.mp3", b"half of it")
+    def leave_hidden_file(self):
+        """Kills a run in the middle of an episode. The name of the file that it leaves in the bundle."""
+        url, gate = self.held(self.server(), "/one.mp3", b"half of it")
         process = self.begin({"Episodes": [{"EpisodeReference": url}]})
         gate.reached()
         eventually(lambda: hidden(self.bundle))
         process.kill()
         process.communicate(timeout=60)
-        self.assertEqual(len(hidden(self.bundle)), 1)
+        name, = hidden(self.bundle)
+        return name
+
+    def test_a_hidden_file_of_a_killed_run_is_cleared_away(self):
+        self.leave_hidden_file()
         self.assertRuns(self.create({}), "Fetching 0 episodes")
         self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters"})
+
+    def test_one_among_the_posters_is_cleared_away_too(self):
+        name = self.leave_hidden_file()
+        (self.bundle / name).rename(self.bundle / "Posters" / name)
+        self.assertRuns(self.create({}), "Fetching 0 episodes")
+        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters"})
+
+    def test_one_outside_the_bundle_stays(self):
+        name = self.leave_hidden_file()
+        self.path("folder").mkdir()
+        (self.bundle / name).rename(self.path("folder") / name)
+        (self.bundle / "Posters").rmdir()
+        (self.bundle / "Posters").symlink_to("../folder")
+        self.assertRuns(self.create({}), "Fetching 0 episodes")
+        self.assertEqual(hidden(self.path("folder")), [name])
+
+    def test_no_episode_gets_a_name_that_is_cleared_away(self):
+        location = self.media(self.leave_hidden_file())
+        self.assertWarns(self.create_episodes(location),
+                         'Could not generate sane path for episode "(null)"')
+        self.assertEqual(self.files(), {})
 
     def test_hidden_files_of_others_stay(self):
         self.bundle.mkdir()

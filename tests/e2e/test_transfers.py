@@ -5,6 +5,7 @@ the name of the broken one, which must survive.
 """
 
 import gzip
+import os
 import socket
 import unittest
 
@@ -32,6 +33,10 @@ BROKEN_ANSWERS = {
     "half the last chunk": FOUND + b"Transfer-Encoding: chunked\r\n\r\n3\r\nabc\r\n0\r\n",
     "an interim answer alone": b"HTTP/1.1 100 Continue\r\n\r\n",
     "a huge length": FOUND + b"Content-Length: 9223372036854775807\r\n\r\nabc",
+    "a length beyond all integers": FOUND + b"Content-Length: 18446744073709551619\r\n\r\nabc",
+    "a negative length": FOUND + b"Content-Length: -3\r\n\r\nabc",
+    "a length that is no number": FOUND + b"Content-Length: abc\r\n\r\nabc",
+    "an empty length": FOUND + b"Content-Length:\r\n\r\nabc",
 }
 
 
@@ -115,6 +120,13 @@ class BrokenAnswerTest(TransferTestCase):
         packed = gzip.compress(BODY)
         self.assertSkips(self.web.raw("/broken.mp3", FOUND + b"Content-Encoding: gzip\r\nContent-Length: %d\r\n\r\n"
                                       % len(packed) + packed[:-4]))
+
+    def test_a_header_that_never_ends(self):
+        def answer(exchange):
+            exchange.send(FOUND)
+            while True:  # until the tool hangs up
+                exchange.send(b"X-Field: " + b"x" * 8000 + b"\r\n")
+        self.assertSkips(self.web.route("/broken.mp3", answer), timeout=30)
 
     def test_a_refused_connection(self):
         with socket.socket() as listener:
@@ -209,6 +221,17 @@ class GoodAnswerTest(TransferTestCase):
 
     def test_an_empty_file_url(self):
         self.assertStores(self.write("broken.mp3", b"").as_uri(), b"")
+
+    def test_schemes_in_capitals(self):
+        self.assertStores(self.web.serve("/broken.mp3", BODY).replace("http", "HTTP"))
+        self.assertStores(self.write("broken.mp3", BODY).as_uri().replace("file", "File"))
+
+    def test_media_are_never_held_in_memory(self):
+        length = 200 << 20
+        path = self.write("broken.mp3", b"")
+        os.truncate(path, length)
+        self.assertWarns(self.fetch(path.as_uri(), memory_limit=150 << 20))
+        self.assertEqual((self.bundle / "broken.mp3").stat().st_size, length)
 
     def test_a_percent_encoded_url_is_asked_for_as_it_is(self):
         self.web.serve("/x%2Fy%20z/%C3%BC?a=%26&b", BODY)
