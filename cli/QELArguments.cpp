@@ -1,21 +1,21 @@
 #include "cli/QELArguments.h"
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <string_view>
 
 namespace {
 
-constexpr std::string_view kCommands[] = {"createbundle", "createfeed", "parsefeed"};
+constexpr std::array<std::string_view, 3> kCommands = {"createbundle", "createfeed", "parsefeed"};
 
 bool isCommand(std::string_view word) {
-  return std::find(std::begin(kCommands), std::end(kCommands), word) != std::end(kCommands);
+  return std::find(kCommands.begin(), kCommands.end(), word) != kCommands.end();
 }
 
 }  // namespace
 
-QELArguments QELScanArguments(std::span<const char* const> arguments,
-                              std::optional<std::string>& unknownCommand) {
+QELArguments QELScanArguments(std::span<const char* const> arguments) {
   QELArguments scanned;
   std::size_t index = 0;
   const auto next = [&]() -> std::optional<std::string> {
@@ -40,12 +40,12 @@ QELArguments QELScanArguments(std::span<const char* const> arguments,
       }
     } else if (!scanned.command) {
       if (!isCommand(*argument)) {
-        unknownCommand = *argument;
+        scanned.unknownCommand = argument;
         return scanned;
       }
-      scanned.command = *argument;
+      scanned.command = argument;
     } else if (!scanned.source) {
-      scanned.source = *argument;
+      scanned.source = argument;
     }
   }
   return scanned;

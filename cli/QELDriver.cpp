@@ -8,6 +8,7 @@
 #include <string_view>
 
 #include "cli/QELArguments.h"
+#include "cli/QELError.h"
 #include "cli/QELProgress.h"
 #include "cli/QELSourceResolution.h"
 #include "generators/QELBundlePodcastGenerator.h"
@@ -50,7 +51,7 @@ bool succeeds(Step step, ErrorSlot& error) {
   try {
     return step();
   } catch (const std::bad_alloc&) {
-    error = platform::ErrorRecord{"POSIX", 0, "Out of memory"};
+    error = QELError(2, "Out of memory");
     return false;
   }
 }
@@ -85,9 +86,12 @@ int createFeed(const QELArguments& arguments, QELPodcastSource& source) {
   if (!generate(generator, source, error)) return failToGenerate("feed", error);
   if (!generator.xmlData()) return fail("Could not generate feed: no data was produced.\n");
 
-  // The line break is written apart, behind whatever the target holds by then.
+  // The line break is appended apart, behind whatever the target holds by then. The first
+  // descriptor stays open meanwhile: the reader of a FIFO would take its end for the end of the
+  // feed and leave.
   const std::string target = targetPath(arguments);
-  platform::OutputFile(target, platform::OutputFile::Mode::kReplace).write(*generator.xmlData());
+  platform::OutputFile feed(target, platform::OutputFile::Mode::kReplace);
+  feed.write(*generator.xmlData());
   platform::OutputFile(target, platform::OutputFile::Mode::kAppend).write("\n");
   return kSuccess;
 }
@@ -135,9 +139,10 @@ int run(const QELArguments& arguments) {
 
 int QELRun(std::span<const char* const> arguments) {
   try {
-    std::optional<std::string> unknownCommand;
-    const QELArguments scanned = QELScanArguments(arguments, unknownCommand);
-    if (unknownCommand) return fail("Command `%s' not recognized.\n", {*unknownCommand});
+    const QELArguments scanned = QELScanArguments(arguments);
+    if (scanned.unknownCommand) {
+      return fail("Command `%s' not recognized.\n", {scanned.unknownCommand});
+    }
     return run(scanned);
   } catch (const std::bad_alloc&) {
     // Nothing is left to make a message of.

@@ -59,9 +59,10 @@ bool namesFile(std::string_view name) {
   return !name.empty() && name != "." && name != "..";
 }
 
-/// Whether a file can have the name, and "Info.plist" hold it.
+/// Whether a file can have the name, and "Info.plist" hold it. A name like that of a file in the
+/// making is none: the next run would take the file for one that was left behind.
 bool isSaneName(std::string_view name) {
-  return namesFile(name) && name.size() <= kLongestName &&
+  return namesFile(name) && name.size() <= kLongestName && !platform::isTemporaryFileName(name) &&
          name.find('/') == std::string_view::npos && platform::isXMLText(name);
 }
 
@@ -78,9 +79,10 @@ class BundleDirectory {
 
   bool create(ErrorSlot& error) const {
     if (!platform::createDirectories(path_, error)) return false;
+    platform::removeStaleTemporaryFiles(path_);
+    if (leavesBundle()) return true;
     ErrorSlot ignored;  // a poster that then cannot be saved is warned about
     platform::createDirectories(postersPath_, ignored);
-    platform::removeStaleTemporaryFiles(path_);
     platform::removeStaleTemporaryFiles(postersPath_);
     return true;
   }
@@ -91,9 +93,9 @@ class BundleDirectory {
     return platform::joinedPath(path_, name);
   }
 
-  /// Absent for a name that no file can have, and while a symbolic link leads out of the bundle.
+  /// Absent for a name that no file can have, and where "Posters" leads out of the bundle.
   std::optional<std::string> posterPath(std::string_view name) const {
-    if (!isSaneName(name) || platform::isSymbolicLink(postersPath_)) return std::nullopt;
+    if (!isSaneName(name) || leavesBundle()) return std::nullopt;
     return platform::joinedPath(postersPath_, name);
   }
 
@@ -107,6 +109,9 @@ class BundleDirectory {
   }
 
  private:
+  /// Nothing is written to, nor removed from, a "Posters" that is a symbolic link.
+  bool leavesBundle() const { return platform::isSymbolicLink(postersPath_); }
+
   std::string path_;
   std::string postersPath_;
 };

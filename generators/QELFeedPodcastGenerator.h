@@ -3,6 +3,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 
 #include "generators/QELPodcastGenerator.h"
 #include "model/QELEpisode.h"

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <memory>
+#include <utility>
 
 #include "generators/QELPodcastGenerator.h"
 #include "platform/PropertyListValue.h"

@@ -1,5 +1,6 @@
 #include "platform/FileManager.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -67,6 +68,8 @@ std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& err
   if (!file) {
     return std::nullopt;
   }
+  // The whole is read once and then kept by us: it need not stay in the system's cache as well.
+  ::posix_fadvise(file->descriptor(), 0, 0, POSIX_FADV_NOREUSE);
   std::string bytes;
   const int failure = file->size() > kWholeReadLimit
                           ? EFBIG

@@ -167,12 +167,22 @@ void NetworkTransfer::end(int resultCode) {
   ended_ = true;
   if (error_) return;
   const auto result = static_cast<CURLcode>(resultCode);
-  if ((result == CURLE_OK && !begun_) || ignoredSize_ > kIgnoredBodyLimit) {
+  // A failed status is the cause, however its page ended.
+  const bool hasFailedStatus = !begun_ && (result == CURLE_OK || status() >= 400);
+  if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
     error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
     error_ = {"transfer", result, shownText(detail.empty() ? curl_easy_strerror(result) : detail)};
   }
+}
+
+std::optional<std::string> NetworkTransfer::headerValue(const char* name) const {
+  curl_header* header = nullptr;
+  if (curl_easy_header(handle_.get(), name, 0, CURLH_HEADER, -1, &header) != CURLHE_OK) {
+    return std::nullopt;
+  }
+  return header->value;
 }
 
 bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
@@ -181,10 +191,13 @@ bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
   begun_ = true;
   curl_off_t length = -1;
   curl_easy_getinfo(handle_.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &length);
-  curl_header* encoding = nullptr;
-  const bool isEncoded = curl_easy_header(handle_.get(), "Content-Encoding", 0, CURLH_HEADER, -1,
-                                          &encoding) == CURLHE_OK;
-  return sink_.begin(length, isEncoded ? encoding->value : "", error_);
+  // The library takes a length that exceeds its integers for none at all, and then any body for
+  // whole.
+  if (length < 0 && headerValue("Content-Length") && !headerValue("Transfer-Encoding")) {
+    error_ = {"transfer", CURLE_PARTIAL_FILE, "The announced length cannot be true"};
+    return false;
+  }
+  return sink_.begin(length, headerValue("Content-Encoding").value_or(""), error_);
 }
 
 bool NetworkTransfer::didReceiveBody(std::string_view bytes) {

@@ -3,6 +3,7 @@
 #include <array>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -66,6 +67,8 @@ class NetworkTransfer {
   int configure(const URL& url, const char* acceptedEncoding);
   void end(int resultCode);
   int status() const;
+  /// Of the final response so far; absent when it has no such header.
+  std::optional<std::string> headerValue(const char* name) const;
   bool didReceiveHeaderLine(std::string_view line);
   bool didReceiveBody(std::string_view bytes);
   static std::size_t headerCallback(char* bytes, std::size_t size, std::size_t count, void* self);

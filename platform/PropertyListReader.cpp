@@ -3,6 +3,7 @@
 #include <new>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <utility>
 
 #include "platform/BinaryPropertyListReader.h"
@@ -22,14 +23,14 @@ ErrorRecord recordOf(PropertyListFault fault, std::string description) {
 
 }  // namespace
 
-std::optional<PropertyListValue> readPropertyList(std::string_view bytes, ErrorSlot& error) {
+std::optional<PropertyListValue> readPropertyList(std::string bytes, ErrorSlot& error) {
   if (bytes.empty()) {
     error = recordOf(PropertyListFault::kMalformed, "an empty property list");
     return std::nullopt;
   }
   try {
     if (bytes.starts_with(kBinaryMark)) return BinaryPropertyListReader(bytes).read(error);
-    return XMLPropertyListReader(bytes).read(error);
+    return XMLPropertyListReader(std::move(bytes)).read(error);
   } catch (const std::bad_alloc&) {
     error = recordOf(PropertyListFault::kOutOfMemory, "out of memory");
   } catch (const std::length_error&) {

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
 #include <string_view>
 
 #include "platform/ErrorRecord.h"
@@ -30,6 +31,6 @@ enum class PropertyListFault : std::int64_t {
 /// Unicode (lone surrogates, bytes over 127 in ASCII) become U+FFFD. Where a dictionary has a key
 /// twice, the last one counts. The binary form's null, fill and UID objects have no place in a
 /// property list and are refused; a set is read as an array.
-std::optional<PropertyListValue> readPropertyList(std::string_view bytes, ErrorSlot& error);
+std::optional<PropertyListValue> readPropertyList(std::string bytes, ErrorSlot& error);
 
 }  // namespace platform

@@ -31,8 +31,8 @@ void writeToStandardError(std::string_view text) {
 }
 
 OutputFile::OutputFile(const std::string& path, Mode mode) {
+  flushStandardOutput();  // the path may be another name of it
   if (path == kStandardOutputPath) {
-    flushStandardOutput();
     descriptor_ = STDOUT_FILENO;
     return;
   }

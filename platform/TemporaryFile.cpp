@@ -46,15 +46,6 @@ std::string hiddenName() {
   return name.append(kNameSuffix);
 }
 
-bool isHiddenName(std::string_view name) {
-  if (name.size() != kNamePrefix.size() + 2 * kRandomBytes + kNameSuffix.size() ||
-      !name.starts_with(kNamePrefix) || !name.ends_with(kNameSuffix)) {
-    return false;
-  }
-  return name.substr(kNamePrefix.size(), 2 * kRandomBytes).find_first_not_of(kHexDigits) ==
-         std::string_view::npos;
-}
-
 /// The lock says that the file's owner lives. Without waiting; false with EWOULDBLOCK when another
 /// open file holds it, with other codes where the file system knows no locks.
 bool lock(int descriptor) {
@@ -253,12 +244,21 @@ void TemporaryFile::discard() {
   path_.clear();
 }
 
+bool isTemporaryFileName(std::string_view name) {
+  if (name.size() != kNamePrefix.size() + 2 * kRandomBytes + kNameSuffix.size() ||
+      !name.starts_with(kNamePrefix) || !name.ends_with(kNameSuffix)) {
+    return false;
+  }
+  return name.substr(kNamePrefix.size(), 2 * kRandomBytes).find_first_not_of(kHexDigits) ==
+         std::string_view::npos;
+}
+
 void removeStaleTemporaryFiles(const std::string& directory) {
   std::error_code failure;
   std::filesystem::directory_iterator entry(directory.empty() ? "." : directory, failure);
   for (; !failure && entry != std::filesystem::directory_iterator(); entry.increment(failure)) {
     std::error_code unknown;
-    if (!isHiddenName(entry->path().filename().string()) ||
+    if (!isTemporaryFileName(entry->path().filename().string()) ||
         entry->symlink_status(unknown).type() != std::filesystem::file_type::regular) {
       continue;
     }

@@ -47,6 +47,9 @@ class TemporaryFile {
   TemporaryFile* next_ = nullptr;  // in the registry
 };
 
+/// Whether the name (without a directory) could be that of such a hidden file, whoever made it.
+bool isTemporaryFileName(std::string_view name);
+
 /// Removes from a directory the hidden files that a killed run left there. A file that a living
 /// process still writes is not touched, nor is any other; failures are not reported.
 void removeStaleTemporaryFiles(const std::string& directory);

@@ -24,9 +24,10 @@ constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 constexpr std::string_view kWhitespace = " \t\r\n";
 constexpr std::string_view kDeclarationStart = "<?xml";
 
-// The parser takes its input in ints and copies it into a buffer that it grows by doubling, and it
-// scans a tag that a piece cuts anew with the next one. Pieces of this size bound the buffer, and
-// are so few that the scanning stays linear.
+// The library takes its input in ints, copies it into a buffer that it grows by doubling, and scans
+// a tag that a piece cuts anew with the next one. Pieces of this size bound the buffer, and are so
+// few that the scanning stays linear. Most documents are one piece, which spares the library's
+// counting of lines, too.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
 
 struct ByteOrderMark {
@@ -45,22 +46,31 @@ struct ShownEncoding {
   std::size_t markLength = 0;
 };
 
-// "line 3, column 7" for what stands behind these characters.
-std::string positionBehind(std::string_view text) {
+// A place in a text, counted from 1.
+struct Position {
   std::size_t line = 1;
   std::size_t column = 1;
+
+  std::string text() const {
+    return "line " + std::to_string(line) + ", column " + std::to_string(column);
+  }
+};
+
+// The place behind these characters.
+Position positionBehind(std::string_view text) {
+  Position position;
   char previous = '\0';
   for (const char character : text) {
     const bool endsLine = character == '\n' || character == '\r';
     if (endsLine && !(character == '\n' && previous == '\r')) {
-      ++line;
-      column = 1;
+      ++position.line;
+      position.column = 1;
     } else if (!endsLine && (static_cast<unsigned char>(character) & 0xC0U) != 0x80U) {
-      ++column;
+      ++position.column;
     }
     previous = character;
   }
-  return "line " + std::to_string(line) + ", column " + std::to_string(column);
+  return position;
 }
 
 ErrorRecord recordOf(XML_Error code, std::string description) {
@@ -101,8 +111,8 @@ std::string_view declaredEncoding(std::string_view text) {
   }
 }
 
-// The encoding that the first bytes of a document show, and the length of their byte order mark.
-// No encoding when they show none: then the declaration can be read byte by byte.
+// The encoding that the first bytes of a document show, and the length of their byte order mark. No
+// encoding when they show none: then the declaration can be read byte by byte.
 ShownEncoding encodingShownBy(std::string_view bytes) {
   for (const ByteOrderMark& mark : kByteOrderMarks) {
     if (bytes.starts_with(mark.bytes)) return {mark.encoding, mark.bytes.size()};
@@ -128,33 +138,32 @@ std::optional<std::string> encodingMeantBy(std::string_view declared) {
   return name;
 }
 
-// A document as UTF-8 without a byte order mark: a view of the bytes themselves where they are that
-// already, of `converted` otherwise. Absent, with the error, when the encoding is not known.
-std::optional<std::string_view> textOf(std::string_view bytes, std::string& converted,
-                                       ErrorSlot& error) {
-  const ShownEncoding shown = encodingShownBy(bytes);
-  const std::string_view text = bytes.substr(shown.markLength);
+// Makes the document UTF-8; where its text then begins, behind a byte order mark. Absent, with the
+// error, when the encoding is not known.
+std::optional<std::size_t> makeUTF8(std::string& document, ErrorSlot& error) {
+  const ShownEncoding shown = encodingShownBy(document);
+  const std::string_view text = std::string_view(document).substr(shown.markLength);
   std::string_view label = shown.encoding;
   std::optional<std::string> encoding(label);
   std::size_t labelPosition = 0;
   if (label.empty()) {
     label = declaredEncoding(text);
-    if (label.empty()) return text;
+    if (label.empty()) return shown.markLength;
     labelPosition = static_cast<std::size_t>(label.data() - text.data());
     encoding = encodingMeantBy(label);
   }
-  if (encoding == "UTF-8") return text;
+  if (encoding == "UTF-8") return shown.markLength;
 
-  std::optional<std::string> result;
-  if (encoding) result = convertedToUTF8(text, *encoding);
-  if (!result) {
-    error =
-        recordOf(XML_ERROR_UNKNOWN_ENCODING, "unknown encoding \"" + std::string(label) + "\" at " +
-                                                 positionBehind(text.substr(0, labelPosition)));
+  std::optional<std::string> converted;
+  if (encoding) converted = convertedToUTF8(text, *encoding);
+  if (!converted) {
+    error = recordOf(XML_ERROR_UNKNOWN_ENCODING,
+                     "unknown encoding \"" + std::string(label) + "\" at " +
+                         positionBehind(text.substr(0, labelPosition)).text());
     return std::nullopt;
   }
-  converted = std::move(*result);
-  return converted;
+  document = std::move(*converted);
+  return 0;
 }
 
 XMLName nameOf(const XML_Char* name) {
@@ -175,9 +184,10 @@ std::optional<std::string_view> XMLAttributes::value(std::string_view name) cons
   return std::nullopt;
 }
 
-// One run of the library's parser over the text of a document.
+// One run of the library's parser over a document, which begins at `start` and is UTF-8.
 struct XMLParser::Run {
-  Run(XMLParser& parser, std::string_view documentText) : owner(parser), text(documentText) {
+  Run(XMLParser& parser, std::string utf8, std::size_t start)
+      : owner(parser), document(std::move(utf8)) {
     // The text is UTF-8 by now, whatever its declaration says.
     handle.reset(XML_ParserCreate("UTF-8"));
     if (!handle) throw std::bad_alloc();
@@ -185,6 +195,11 @@ struct XMLParser::Run {
     XML_SetElementHandler(handle.get(), startElement, endElement);
     XML_SetCharacterDataHandler(handle.get(), characters);
     owner.run_ = this;
+
+    next = std::min(document.find_first_not_of(kWhitespace, start), document.size());
+    origin = positionBehind(std::string_view(document).substr(start, next - start));
+    // Programs that put white space in front put it in front of a mark, too.
+    if (std::string_view(document).substr(next).starts_with(kUTF8Mark)) next += kUTF8Mark.size();
   }
   ~Run() { owner.run_ = nullptr; }
   Run(const Run&) = delete;
@@ -192,26 +207,32 @@ struct XMLParser::Run {
 
   // False when the library found a fault or an event ended the run.
   bool feed() {
-    start = std::min(text.find_first_not_of(kWhitespace), text.size());
     // A mark in front keeps the library from guessing at UTF-16.
-    const auto feedPiece = [this](std::string_view piece, bool isLast) {
-      return XML_Parse(handle.get(), piece.data(), static_cast<int>(piece.size()),
-                       static_cast<int>(isLast)) == XML_STATUS_OK;
-    };
-    bool succeeded = feedPiece(kUTF8Mark, false);
-    std::string_view rest = text.substr(start);
-    do {
-      const std::string_view piece = rest.substr(0, kPieceSize);
-      rest.remove_prefix(piece.size());
-      succeeded = succeeded && feedPiece(piece, rest.empty());
-    } while (succeeded && !rest.empty());
+    bool succeeded = XML_Parse(handle.get(), kUTF8Mark.data(), static_cast<int>(kUTF8Mark.size()),
+                               XML_FALSE) == XML_STATUS_OK;
+    bool isLast = false;
+    while (succeeded && !isLast) {
+      const std::size_t size = std::min(document.size() - next, kPieceSize);
+      void* buffer = XML_GetBuffer(handle.get(), static_cast<int>(size));
+      if (buffer == nullptr) return false;
+      document.copy(static_cast<char*>(buffer), size, next);
+      next += size;
+      isLast = next == document.size();
+      // The library has its own copy of the rest: what is read from it needs the room.
+      if (isLast) std::string().swap(document);
+      succeeded = XML_ParseBuffer(handle.get(), static_cast<int>(size), static_cast<int>(isLast)) ==
+                  XML_STATUS_OK;
+    }
     return succeeded;
   }
 
   std::string position() const {
-    const XML_Index index = XML_GetCurrentByteIndex(handle.get()) - std::ssize(kUTF8Mark);
-    return positionBehind(
-        text.substr(0, start + static_cast<std::size_t>(std::max<XML_Index>(index, 0))));
+    const std::size_t line = XML_GetCurrentLineNumber(handle.get());
+    const std::size_t column = XML_GetCurrentColumnNumber(handle.get());  // from 0
+    // On its first line the library counts the mark, and nothing of what was skipped before it.
+    return (line <= 1 ? Position{origin.line, origin.column + std::max<std::size_t>(column, 1) - 1}
+                      : Position{origin.line + line - 1, column + 1})
+        .text();
   }
 
   ErrorRecord fault() const {
@@ -252,8 +273,9 @@ struct XMLParser::Run {
   }
 
   XMLParser& owner;
-  std::string_view text;
-  std::size_t start = 0;  // where in the text the library's input begins
+  std::string document;  // emptied once the library has all of it
+  std::size_t next = 0;  // where in the document the next piece begins
+  Position origin;       // of the library's first character, behind white space that is skipped
   std::unique_ptr<std::remove_pointer_t<XML_Parser>, ParserFreer> handle;
   std::exception_ptr thrown;  // by an event
 };
@@ -261,11 +283,11 @@ struct XMLParser::Run {
 bool XMLParser::parse(ErrorSlot& error) {
   abortedWith_.reset();
   try {
-    std::string converted;
-    const std::optional<std::string_view> text = textOf(bytes_, converted, error);
-    if (!text) return false;
+    std::string document = std::move(bytes_);
+    const std::optional<std::size_t> start = makeUTF8(document, error);
+    if (!start) return false;
 
-    Run run(*this, *text);
+    Run run(*this, std::move(document), *start);
     const bool succeeded = run.feed();
     if (run.thrown) std::rethrow_exception(run.thrown);
     if (abortedWith_) {

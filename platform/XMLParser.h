@@ -41,7 +41,7 @@ class XMLParserEvents {
   virtual void foundCharacters(std::string_view text) = 0;
 };
 
-/// An event-driven parser of XML 1.0 over a buffer of bytes, in one pass.
+/// An event-driven parser of XML 1.0 over a document in memory, in one pass.
 ///
 /// The encoding is told by a byte order mark or the declaration and may be any that the conversion
 /// library knows; without either it is UTF-8. A document labelled ISO-8859-1 or US-ASCII is read as
@@ -53,14 +53,17 @@ class XMLParserEvents {
 /// declare it and is not standalone: then it gives no characters either.
 class XMLParser {
  public:
-  /// Neither the bytes nor the receiver are copied: both must outlive `parse`.
-  XMLParser(std::string_view bytes, XMLParserEvents& events) : bytes_(bytes), events_(events) {}
+  /// The receiver must outlive `parse`. Move the bytes in where nobody else needs them: the parser
+  /// gives them up as soon as it can, so that they do not lie beside all that is read from them.
+  XMLParser(std::string bytes, XMLParserEvents& events)
+      : bytes_(std::move(bytes)), events_(events) {}
 
-  /// Runs the whole parse on the calling thread. On a malformed document returns false with a
-  /// description that names the fault, the line and the column (both counted from 1, the column in
-  /// characters): "mismatched tag at line 3, column 7". Events that came before the fault have been
-  /// delivered. Records have the domain "XML" and expat's codes. Exhausted memory, in an event too,
-  /// is such an error, but may have no place; other exceptions of an event pass through.
+  /// Runs the whole parse on the calling thread; called once at most. On a malformed document
+  /// returns false with a description that names the fault, the line and the column (both counted
+  /// from 1, the column in characters): "mismatched tag at line 3, column 7". Events that came
+  /// before the fault have been delivered. Records have the domain "XML" and expat's codes.
+  /// Exhausted memory, in an event too, is such an error, but may have no place; other exceptions
+  /// of an event pass through.
   bool parse(ErrorSlot& error);
 
   /// Ends the parse from inside an event: no other event follows, and `parse` returns false with
@@ -74,7 +77,7 @@ class XMLParser {
  private:
   struct Run;
 
-  std::string_view bytes_;
+  std::string bytes_;
   XMLParserEvents& events_;
   ErrorSlot abortedWith_;
   const Run* run_ = nullptr;  // while parse() runs

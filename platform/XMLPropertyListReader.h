@@ -3,6 +3,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "platform/ErrorRecord.h"
 #include "platform/PropertyListBuilder.h"
@@ -15,8 +16,7 @@ namespace platform {
 /// Reads the XML form of a property list, for readPropertyList.
 class XMLPropertyListReader final : private XMLParserEvents {
  public:
-  /// The bytes are not copied: they must outlive the reader.
-  explicit XMLPropertyListReader(std::string_view bytes) : parser_(bytes, *this) {}
+  explicit XMLPropertyListReader(std::string bytes) : parser_(std::move(bytes), *this) {}
 
   /// Called once at most. Absent, with the slot filled, for bytes that are no such list; lets
   /// std::bad_alloc through.

@@ -54,9 +54,9 @@ std::optional<std::string_view> FeedParser::MarkerSearch::textBehindMarker(std::
   return text.substr(*found_);
 }
 
-std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::string_view> data) {
+std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::string> data) {
   if (!data) return nullptr;
-  return std::unique_ptr<FeedParser>(new FeedParser(*data));
+  return std::unique_ptr<FeedParser>(new FeedParser(std::move(*data)));
 }
 
 bool FeedParser::parseWithError(platform::ErrorSlot& error) {

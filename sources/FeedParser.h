@@ -5,6 +5,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "platform/ErrorRecord.h"
@@ -28,9 +29,8 @@
 /// Made for one feed, parsed once, read and dropped.
 class FeedParser : private platform::XMLParserEvents {
  public:
-  /// A parser over the bytes, which are not copied and must outlive the parse; null for absent
-  /// data.
-  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string_view> data);
+  /// A parser of the bytes, which it gives up as it reads them; null for absent data.
+  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string> data);
 
   /// Runs the whole parse. False for malformed XML, with the XML parser's own record, and for a
   /// document without an "rss" element, with code 3.
@@ -60,7 +60,7 @@ class FeedParser : private platform::XMLParserEvents {
     std::size_t searched_ = 0;
   };
 
-  explicit FeedParser(std::string_view data) : feedParser_(data, *this) {}
+  explicit FeedParser(std::string data) : feedParser_(std::move(data), *this) {}
 
   void didStartElement(const platform::XMLName& name,
                        const platform::XMLAttributes& attributes) override;

@@ -33,21 +33,19 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
 
   platform::ErrorSlot said;
   std::optional<std::string> bytes = platform::readResource(*feedURL_, said);
-  if (!bytes || said) {
+  if (!bytes || bytes->empty()) {
     fillSlot(error, std::move(said), "Could not load or read the specified feed URL");
     return false;
   }
-  const std::unique_ptr<FeedParser> parser = FeedParser::parserWithFeedData(*bytes);
+  const std::unique_ptr<FeedParser> parser = FeedParser::parserWithFeedData(std::move(bytes));
   if (!parser->parseWithError(said)) {
     fillSlot(error, std::move(said), "Could not parse the feed at the specified URL");
     return false;
   }
-  bytes.reset();  // as large as everything that was read from them
 
   const platform::Dictionary& attributes = parser->feedAttributes();
-  const auto text = [&attributes](std::string_view key) -> std::optional<platform::Text> {
-    const platform::PropertyListValue* value = platform::valueForKey(attributes, key);
-    return value ? value->asText() : std::nullopt;
+  const auto text = [&attributes](std::string_view key) {
+    return platform::textForKey(attributes, key);
   };
   setUuid(text("QELUUID"));
   setTitle(text("title"));

@@ -52,8 +52,7 @@ std::unique_ptr<QELReferenceFilePodcastSource> QELReferenceFilePodcastSource::in
   platform::ErrorSlot ignored;  // what is wrong with the file is not told apart here
   std::optional<std::string> bytes = platform::readWholeFile(path, ignored);
   if (!bytes) return nullptr;
-  auto value = platform::readPropertyList(*bytes, ignored);
-  bytes.reset();
+  auto value = platform::readPropertyList(std::move(*bytes), ignored);
   if (!value) return nullptr;
   return initWithDictionary(
       QELSharedDictionary(std::make_shared<const PropertyListValue>(std::move(*value))));
@@ -72,8 +71,7 @@ bool QELReferenceFilePodcastSource::loadSourceWithError(platform::ErrorSlot& err
   }
 
   for (const QELPodcastKey& field : QELPodcastKeys()) {
-    const PropertyListValue* value = platform::valueForKey(*refData_, field.key);
-    (this->*field.setValue)(value ? value->asText() : std::nullopt);
+    (this->*field.setValue)(platform::textForKey(*refData_, field.key));
   }
   const PropertyListValue* episodes = platform::valueForKey(*refData_, "Episodes");
   if (const PropertyListValue::Array* array = episodes ? episodes->asArray() : nullptr) {

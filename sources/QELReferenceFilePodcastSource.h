@@ -2,13 +2,13 @@
 
 #include <memory>
 #include <string>
+#include <utility>
 
 #include "model/QELPodcastSource.h"
 #include "platform/PropertyListValue.h"
 
 /// A podcast source that reads a reference file: a property list whose root is a reference
-/// dictionary
-/// ("PodcastName", "Episodes", ...).
+/// dictionary ("PodcastName", "Episodes", ...).
 class QELReferenceFilePodcastSource : public QELPodcastSource {
  public:
   /// A source for the reference file at the path; null when the file is missing, unreadable, no

@@ -6,25 +6,18 @@
 
 namespace {
 
-struct Scan {
-  QELArguments arguments;
-  std::optional<std::string> unknownCommand;
-};
-
-Scan scan(const std::vector<const char*>& words) {
-  Scan result;
-  result.arguments = QELScanArguments(words, result.unknownCommand);
-  return result;
+QELArguments scan(const std::vector<const char*>& words) {
+  return QELScanArguments(words);
 }
 
 TEST(QELArgumentsTest, NothingGivesNothing) {
-  const Scan result = scan({});
+  const QELArguments result = scan({});
   EXPECT_EQ(result.unknownCommand, std::nullopt);
-  EXPECT_EQ(result.arguments.command, std::nullopt);
-  EXPECT_EQ(result.arguments.source, std::nullopt);
-  EXPECT_EQ(result.arguments.outputPath, std::nullopt);
-  EXPECT_EQ(result.arguments.feedFormat, std::nullopt);
-  EXPECT_FALSE(result.arguments.readStandardInput);
+  EXPECT_EQ(result.command, std::nullopt);
+  EXPECT_EQ(result.source, std::nullopt);
+  EXPECT_EQ(result.outputPath, std::nullopt);
+  EXPECT_EQ(result.feedFormat, std::nullopt);
+  EXPECT_FALSE(result.readStandardInput);
 }
 
 TEST(QELArgumentsTest, WordsAndOptionsComeInAnyOrder) {
@@ -34,7 +27,7 @@ TEST(QELArgumentsTest, WordsAndOptionsComeInAnyOrder) {
       {"-f", "atom", "-d", "out", "-i", "createfeed", "s.plist"},
   };
   for (const auto& words : orders) {
-    const QELArguments arguments = scan(words).arguments;
+    const QELArguments arguments = scan(words);
     EXPECT_EQ(arguments.command, "createfeed");
     EXPECT_EQ(arguments.source, "s.plist");
     EXPECT_EQ(arguments.outputPath, "out");
@@ -44,54 +37,54 @@ TEST(QELArgumentsTest, WordsAndOptionsComeInAnyOrder) {
 }
 
 TEST(QELArgumentsTest, OnlyTheSecondCharacterOfAnOptionCounts) {
-  const QELArguments arguments = scan({"-dir", "out", "-format", "atom", "-ixyz"}).arguments;
+  const QELArguments arguments = scan({"-dir", "out", "-format", "atom", "-ixyz"});
   EXPECT_EQ(arguments.outputPath, "out");
   EXPECT_EQ(arguments.feedFormat, "atom");
   EXPECT_TRUE(arguments.readStandardInput);
 }
 
 TEST(QELArgumentsTest, UnknownOptionsAreIgnored) {
-  const QELArguments arguments = scan({"-", "--", "--help", "-x", "-D", "parsefeed"}).arguments;
+  const QELArguments arguments = scan({"-", "--", "--help", "-x", "-D", "parsefeed"});
   EXPECT_EQ(arguments.command, "parsefeed");
   EXPECT_EQ(arguments.source, std::nullopt);
   EXPECT_EQ(arguments.outputPath, std::nullopt);
 }
 
 TEST(QELArgumentsTest, ValuesAreTakenWhateverTheyLookLike) {
-  const QELArguments arguments = scan({"-d", "-f", "-f", "parsefeed", "createfeed"}).arguments;
+  const QELArguments arguments = scan({"-d", "-f", "-f", "parsefeed", "createfeed"});
   EXPECT_EQ(arguments.outputPath, "-f");
   EXPECT_EQ(arguments.feedFormat, "parsefeed");
   EXPECT_EQ(arguments.command, "createfeed");
 }
 
 TEST(QELArgumentsTest, LastOptionWins) {
-  const QELArguments arguments = scan({"-d", "a", "-f", "rss", "-d", "b", "-f", "atom"}).arguments;
+  const QELArguments arguments = scan({"-d", "a", "-f", "rss", "-d", "b", "-f", "atom"});
   EXPECT_EQ(arguments.outputPath, "b");
   EXPECT_EQ(arguments.feedFormat, "atom");
 }
 
 TEST(QELArgumentsTest, OptionWithNothingBehindItHasNoValue) {
-  EXPECT_EQ(scan({"parsefeed", "s", "-d"}).arguments.outputPath, std::nullopt);
-  EXPECT_EQ(scan({"parsefeed", "s", "-f"}).arguments.feedFormat, std::nullopt);
-  EXPECT_EQ(scan({"-d", "a", "-d"}).arguments.outputPath, std::nullopt);
+  EXPECT_EQ(scan({"parsefeed", "s", "-d"}).outputPath, std::nullopt);
+  EXPECT_EQ(scan({"parsefeed", "s", "-f"}).feedFormat, std::nullopt);
+  EXPECT_EQ(scan({"-d", "a", "-d"}).outputPath, std::nullopt);
 }
 
 TEST(QELArgumentsTest, FurtherWordsAreIgnored) {
-  const Scan result = scan({"parsefeed", "s.plist", "third", "createfeed"});
+  const QELArguments result = scan({"parsefeed", "s.plist", "third", "createfeed"});
   EXPECT_EQ(result.unknownCommand, std::nullopt);
-  EXPECT_EQ(result.arguments.command, "parsefeed");
-  EXPECT_EQ(result.arguments.source, "s.plist");
+  EXPECT_EQ(result.command, "parsefeed");
+  EXPECT_EQ(result.source, "s.plist");
 }
 
 TEST(QELArgumentsTest, EmptySourceIsPresent) {
-  EXPECT_EQ(scan({"parsefeed", ""}).arguments.source, "");
+  EXPECT_EQ(scan({"parsefeed", ""}).source, "");
 }
 
 TEST(QELArgumentsTest, UnknownCommandEndsTheScan) {
   for (const char* word : {"ParseFeed", "parsefeed ", "", "help", "createfeeds"}) {
-    const Scan result = scan({word, "-d", "out"});
+    const QELArguments result = scan({word, "-d", "out"});
     EXPECT_EQ(result.unknownCommand, word);
-    EXPECT_EQ(result.arguments.outputPath, std::nullopt) << word;
+    EXPECT_EQ(result.outputPath, std::nullopt) << word;
   }
 }
 

@@ -8,7 +8,6 @@ property-list and XML modules.
 import os
 import plistlib
 import re
-import resource
 import shutil
 import subprocess
 import tempfile
@@ -28,6 +27,9 @@ LOADING = b"[N] Loading/interpreting source...\n"
 
 # A sanitizer that finds a fault ends the tool with this status, which the tool itself never uses.
 SANITIZER_STATUS = 99
+
+# How a shell closes a descriptor.
+_CLOSING = {0: "<&-", 1: ">&-", 2: "2>&-"}
 
 # Nothing of the machine may decide a result, unless a test asks for it.
 _HIDDEN_VARIABLES = {"http_proxy", "https_proxy", "all_proxy", "no_proxy", "lang", "language"}
@@ -74,28 +76,23 @@ def checked(arguments, status, stdout=b"", stderr=b""):
     return Result(status, stdout, stderr)
 
 
-def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=(), **options):
+def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=(), prefix=(), **options):
     """Runs the tool to its end. A crash and a run longer than the timeout (seconds) are failures.
 
     memory_limit is the number of bytes that the tool may take, for input made to exhaust memory; closed
-    lists those of the descriptors 0 to 2 that the tool starts without.
+    lists those of the descriptors 0 to 2 that the tool starts without; prefix is a command that runs it.
     """
     env = dict(env or {})
-    address_space = None
+    shell = ['exec "$0" "$@"', *(_CLOSING[descriptor] for descriptor in closed)]
     if memory_limit is not None:
         if _is_sanitized():
             env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
         else:
-            address_space = memory_limit
-
-    def prepare():
-        if address_space is not None:
-            resource.setrlimit(resource.RLIMIT_AS, (address_space, address_space))
-        for descriptor in closed:
-            os.close(descriptor)
-
-    options = {"stdout": subprocess.PIPE, "stderr": subprocess.PIPE, "preexec_fn": prepare, **options}
-    finished = subprocess.run([tool(), *arguments], input=stdin, env=environment(env), timeout=timeout,
+            shell.insert(0, f"ulimit -v {memory_limit >> 10} &&")
+    if len(shell) > 1:  # a shell prepares the process: Python's own way is unsafe beside a server's threads
+        prefix = ("/bin/sh", "-c", " ".join(shell), *prefix)
+    options = {"stdout": subprocess.PIPE, "stderr": subprocess.PIPE, **options}
+    finished = subprocess.run([*prefix, tool(), *arguments], input=stdin, env=environment(env), timeout=timeout,
                               check=False, **options)
     return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
 

@@ -3,7 +3,7 @@
 import datetime
 import os
 import plistlib
-import threading
+import subprocess
 import unittest
 
 from support import LOADING, ToolTestCase, item
@@ -173,12 +173,11 @@ class OutputTest(ToolTestCase):
 
     def test_a_fifo_receives_the_file(self):
         os.mkfifo(self.path("fifo"))
-        received = []
-        reader = threading.Thread(target=lambda: received.append(self.path("fifo").read_bytes()), daemon=True)
-        reader.start()
-        self.assertSucceeds(self.run_tool("parsefeed", self.reference({"PodcastName": "n"}), "-d", "fifo"), LOADING)
-        reader.join(30)
-        self.assertEqual(plistlib.loads(received[0]), {"PodcastName": "n"})
+        reader = subprocess.Popen(["cat", self.path("fifo")], stdout=subprocess.PIPE)
+        self.addCleanup(lambda: (reader.kill(), reader.wait(), reader.stdout.close()))
+        result = self.run_tool("parsefeed", self.reference({"PodcastName": "n"}), "-d", "fifo", timeout=30)
+        self.assertSucceeds(result, LOADING)
+        self.assertEqual(plistlib.loads(reader.communicate(timeout=30)[0]), {"PodcastName": "n"})
 
     def test_an_output_that_cannot_be_written_is_not_noticed(self):
         source = self.reference()

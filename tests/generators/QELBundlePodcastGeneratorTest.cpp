@@ -221,8 +221,9 @@ TEST_F(QELBundlePodcastGeneratorTest, HostileNamesStayInsideTheBundle) {
       "file:///",  // no component at all
       "",          // the same for a path
       "/",
-      mediaURL("Info.plist"),  // the reference file itself
-      "http://a b/x.mp3",      // no URL
+      mediaURL("Info.plist"),                  // the reference file itself
+      mediaURL(".qel-0123456789abcdef.part"),  // as files in the making are called
+      "http://a b/x.mp3",                      // no URL
   };
   for (const std::string& location : skipped) addEpisode(Text(location), "Bad");
   // A "/" that is encoded is a part of the name and never leads anywhere: the file that the URL
@@ -237,7 +238,7 @@ TEST_F(QELBundlePodcastGeneratorTest, HostileNamesStayInsideTheBundle) {
   const Dictionary dictionary = generate();
   EXPECT_EQ(references(dictionary), (std::vector<std::string>{odd, longest}));
 
-  std::string expected = "[N] Fetching 12 episodes\n";
+  std::string expected = "[N] Fetching 13 episodes\n";
   for (std::size_t number = 1; number <= std::size(skipped); ++number) {
     const std::string n = std::to_string(number);
     expected += "[N] Fetching episode " + n +
@@ -372,6 +373,7 @@ TEST_F(QELBundlePodcastGeneratorTest, SymbolicLinksInTheBundleAreNotWrittenThrou
   fs::create_directories(outside);
   fs::create_directories(bundlePath());
   std::ofstream(outside / "file") << "outside";
+  std::ofstream(outside / ".qel-0123456789abcdef.part") << "outside";
   fs::create_symlink(outside / "file", bundlePath() / "a.mp3");
   fs::create_symlink(outside / "new", bundlePath() / "b.mp3");
   fs::create_directory_symlink(outside, bundlePath() / "Posters");
@@ -382,7 +384,7 @@ TEST_F(QELBundlePodcastGeneratorTest, SymbolicLinksInTheBundleAreNotWrittenThrou
   EXPECT_EQ(references(generate()), (std::vector<std::string>{"a.mp3"}));
   EXPECT_EQ(fs::file_size(outside / "file"), 7U);
   EXPECT_FALSE(fs::exists(outside / "new"));
-  EXPECT_EQ(std::distance(fs::directory_iterator(outside), fs::directory_iterator()), 1);
+  EXPECT_EQ(std::distance(fs::directory_iterator(outside), fs::directory_iterator()), 2);
   EXPECT_FALSE(fs::is_symlink(bundlePath() / "a.mp3"));
 }
 

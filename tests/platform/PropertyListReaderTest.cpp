@@ -21,7 +21,7 @@ using namespace std::string_literals;
 /// The value as one line, or the error's domain, code and description.
 std::string outcome(std::string_view bytes) {
   ErrorSlot error;
-  const auto value = readPropertyList(bytes, error);
+  const auto value = readPropertyList(std::string(bytes), error);
   EXPECT_NE(value.has_value(), error.has_value());
   if (value) return dumped(*value);
   if (!error) return "neither a value nor an error";
@@ -195,7 +195,7 @@ TEST(PropertyListReaderTest, RefusesMalformedXMLWithTheParsersRecord) {
         "<plist><string>&nbsp;</string></plist>", "<plist><string>\x01</string></plist>",
         "<plist><string>\xFF</string></plist>"}) {
     ErrorSlot error;
-    EXPECT_FALSE(readPropertyList(bytes, error)) << bytes;
+    EXPECT_FALSE(readPropertyList(std::string(bytes), error)) << bytes;
     ASSERT_TRUE(error) << bytes;
     EXPECT_EQ(error->domain, "XML") << bytes;
     EXPECT_NE(error->description.find(" at line 1, column "), std::string::npos)

@@ -32,7 +32,7 @@ std::string written(const Dictionary& dictionary) {
 
 PropertyListValue readBack(std::string_view bytes) {
   ErrorSlot error;
-  auto value = readPropertyList(bytes, error);
+  auto value = readPropertyList(std::string(bytes), error);
   EXPECT_TRUE(value) << error->description;
   return value ? std::move(*value) : PropertyListValue("nothing was read");
 }

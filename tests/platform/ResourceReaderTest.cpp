@@ -186,6 +186,17 @@ TEST_F(ResourceReaderTest, AnnouncedLengthBeyondTheLimitFailsAtOnce) {
             "transfer 63: The resource is larger than 2147483648 bytes");
 }
 
+TEST_F(ResourceReaderTest, AnnouncedLengthBeyondAllIntegersIsAFailure) {
+  EXPECT_EQ(
+      readAnswerAndClose("HTTP/1.1 200 OK\r\nContent-Length: 99999999999999999999\r\n\r\n<rss/>"),
+      "transfer 18: The announced length cannot be true");
+}
+
+TEST_F(ResourceReaderTest, FailedStatusIsTheCauseHoweverItsPageEnds) {
+  EXPECT_EQ(readAnswerAndClose("HTTP/1.1 404 Not Found\r\nContent-Length: 9\r\n\r\ncut"),
+            "HTTP 404: HTTP status 404");
+}
+
 TEST_F(ResourceReaderTest, BodyCutShortIsAFailure) {
   EXPECT_EQ(readAnswerAndClose("HTTP/1.1 200 OK\r\nContent-Length: 2000000000\r\n\r\n<rss/>"),
             "transfer 18: transfer closed with 1999999994 bytes remaining to read");
