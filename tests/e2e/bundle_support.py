@@ -1,5 +1,6 @@
 """What the tests of bundles share: making one, and looking at everything that is in a directory."""
 
+import hashlib
 import os
 import plistlib
 import re
@@ -26,6 +27,12 @@ def contents(directory):
                     value = file.read()
             found[os.path.relpath(path, directory)] = value
     return found
+
+
+def digests(found):
+    """The same with short digests of files for their bytes, so that a failure can be read."""
+    return {path: hashlib.sha256(content).hexdigest()[:16] if isinstance(content, bytes) else content
+            for path, content in found.items()}
 
 
 def hidden(directory):

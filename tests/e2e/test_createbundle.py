@@ -9,6 +9,7 @@ import os
 import plistlib
 import pty
 import re
+import select
 import shutil
 import subprocess
 import termios
@@ -144,8 +145,11 @@ class CounterTest(BundleTestCase):
         def pass_next(expected):
             next(waiting).open()
             output = b""
-            while len(output) < len(expected) and (read := process.stdout.read(len(expected) - len(output))):
-                output += read
+            while len(output) < len(expected) and select.select([process.stdout], [], [], 20)[0]:
+                piece = process.stdout.read(len(expected) - len(output))
+                if not piece:
+                    break
+                output += piece
             self.assertEqual(output, expected)
 
         return process, pass_next

@@ -6,6 +6,7 @@ the name of the broken one, which must survive.
 
 import gzip
 import os
+import shutil
 import socket
 import unittest
 
@@ -163,6 +164,7 @@ class BrokenAnswerTest(TransferTestCase):
     def test_a_poster_that_breaks_is_left_out(self):
         for name, answer in BROKEN_ANSWERS.items():
             with self.subTest(name):
+                shutil.rmtree(self.bundle, ignore_errors=True)
                 poster = self.web.raw("/poster.jpg", answer)
                 self.assertRuns(self.create({
                     "PodcastName": "Show", "PodcastPosterReference": poster, "PodcastPosterReferenceType": "remote",
