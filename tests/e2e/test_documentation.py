@@ -116,7 +116,10 @@ class DocumentationTest(ToolTestCase):
         self.site = self.server()
 
     def copy_of_examples(self, name):
-        """A served copy of examples/ whose feed names that server; returns the directory of its show."""
+        """A served copy of examples/ whose feed names that server; returns the directory of its show.
+
+        That also holds scripts/, as the directory of the project does.
+        """
         copy = self.path(name)
         shutil.copytree(ROOT / "examples", copy)
         feed = copy / "show" / "feed.xml"
@@ -124,6 +127,7 @@ class DocumentationTest(ToolTestCase):
         for file in copy.rglob("*"):
             if file.is_file():
                 self.site.serve("/" + quote(file.relative_to(copy).as_posix()), file.read_bytes())
+        (copy / "show" / "scripts").symlink_to(ROOT / "scripts")
         return copy / "show"
 
     def shell(self, script, directory):
