@@ -17,7 +17,7 @@ from urllib.parse import quote
 from support import ToolTestCase, environment, tool
 
 ROOT = Path(__file__).resolve().parents[2]
-MANUAL_PAGE = ROOT / "docs" / "qel.1.in"
+MANUAL_PAGE = ROOT / "docs" / "qel.1"
 PAGES = [ROOT / "README.md", *sorted((ROOT / "docs").glob("*.md"))]
 DOCUMENTS = [*PAGES, MANUAL_PAGE]
 
