@@ -1,4 +1,4 @@
-# Bash completion for qel. Needs nothing but bash 4 itself.
+# Bash completion for qel. Needs nothing but bash 4.3 itself.
 
 _qel() {
   # COMP_WORDS is also split where the shell would not, as at the colon of a URL. These are the words as
@@ -21,20 +21,26 @@ _qel() {
   local current=${words[-1]}
 
   # What the words before the cursor already say.
-  local command='' source='' option='' reads_input=false
+  local command='' source='' option='' options='-d -f -i'
   for word in "${words[@]:1:${#words[@]}-2}"; do
     if [[ -n $option ]]; then
       option=''
       continue
     fi
     case $word in
-      -d* | -f*) option=${word:0:2} ;;
-      -i*) reads_input=true ;;
+      -d* | -f*)
+        option=${word:0:2}
+        options=${options/$option/}
+        ;;
+      -i*)
+        source=-
+        options=${options/-i/}
+        ;;
       -*) ;;
       *)
         if [[ -z $command ]]; then
           command=$word
-        elif [[ -z $source ]]; then
+        else
           source=$word
         fi
         ;;
@@ -52,13 +58,12 @@ _qel() {
     fi
   elif [[ $option == -f ]]; then
     mapfile -t COMPREPLY < <(compgen -W 'rss atom' -- "$current")
-  elif [[ $current == -* ]]; then
-    local options='-d -i'
-    [[ -z $command || $command == createfeed ]] && options+=' -f'
-    mapfile -t COMPREPLY < <(compgen -W "$options" -- "$current")
-  elif [[ -z $command ]]; then
+  elif [[ -z $command && $current != -* ]]; then
     mapfile -t COMPREPLY < <(compgen -W 'createbundle createfeed parsefeed' -- "$current")
-  elif [[ -z $source ]] && ! $reads_input; then
+  elif [[ -n $source || $current == -* ]]; then
+    [[ $command == createbundle || $command == parsefeed ]] && options=${options/-f/}
+    mapfile -t COMPREPLY < <(compgen -W "$options" -- "$current")
+  else
     # A directory may be a bundle, or hold one.
     mapfile -t COMPREPLY < <(
       compgen -d -- "$current"
