@@ -1,15 +1,16 @@
 #include "cli/QELArguments.h"
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <string_view>
 
 namespace {
 
-constexpr std::string_view kCommands[] = {"createbundle", "createfeed", "parsefeed"};
+constexpr std::array<std::string_view, 3> kCommands = {"createbundle", "createfeed", "parsefeed"};
 
 bool isCommand(std::string_view word) {
-  return std::find(std::begin(kCommands), std::end(kCommands), word) != std::end(kCommands);
+  return std::find(kCommands.begin(), kCommands.end(), word) != kCommands.end();
 }
 
 }  // namespace

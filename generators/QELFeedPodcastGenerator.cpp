@@ -104,7 +104,7 @@ void populate(XMLElement element, const Item& item, bool stampNow) {
   }
   if constexpr (isPodcast<Item>) appendTextChild(element, "copyright", item.copyright());
   appendTextChild(element, "orvane:keywords", item.keywords());
-  if (const auto category = item.category()) {
+  if (const auto& category = item.category()) {
     element.appendChild("orvane:category").appendAttribute("text", *category);
   }
   appendTextChild(element, "description", descriptionOf(item));

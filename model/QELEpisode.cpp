@@ -11,11 +11,7 @@ namespace {
 using platform::Dictionary;
 using platform::PointInTime;
 using platform::Text;
-
-std::optional<Text> textForKey(const Dictionary& dictionary, std::string_view key) {
-  const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);
-  return value ? value->asText() : std::nullopt;
-}
+using platform::textForKey;
 
 std::optional<PointInTime> dateForKey(const Dictionary& dictionary, std::string_view key) {
   const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);

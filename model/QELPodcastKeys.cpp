@@ -1,10 +1,14 @@
 #include "model/QELPodcastKeys.h"
 
+#include <array>
+#include <cstddef>
+#include <string>
+
 namespace {
 
 using Source = QELPodcastSource;
 
-constexpr QELPodcastKey kKeys[] = {
+constexpr auto kKeys = std::to_array<QELPodcastKey>({
     {"PodcastUUID", &Source::uuid, &Source::setUuid},
     {"PodcastName", &Source::title, &Source::setTitle},
     {"PodcastAuthor", &Source::author, &Source::setAuthor},
@@ -17,7 +21,7 @@ constexpr QELPodcastKey kKeys[] = {
     {"PodcastReferenceType", &Source::referenceType, &Source::setReferenceType},
     {"PodcastPosterReference", &Source::posterLocation, &Source::setPosterLocation},
     {"PodcastPosterReferenceType", &Source::posterReferenceType, &Source::setPosterReferenceType},
-};
+});
 constexpr std::size_t kDescriptiveKeyCount = 8;
 
 }  // namespace

@@ -2,6 +2,7 @@
 
 #include <unicode/gregocal.h>
 #include <unicode/locid.h>
+#include <unicode/simpletz.h>
 #include <unicode/smpdtfmt.h>
 #include <unicode/unistr.h>
 
@@ -12,10 +13,11 @@
 #include <utility>
 
 #include "platform/TimeZone.h"
-#include "platform/TimeZoneImplementation.h"
 
 namespace platform {
 namespace {
+
+constexpr std::int64_t kMillisecondsPerSecond = 1000;
 
 std::string_view localeVariable() {
   for (const char* name : {"LC_ALL", "LC_TIME", "LANG"}) {
@@ -53,7 +55,6 @@ class DateFormatter::Implementation {
       : format_(icu::UnicodeString::fromUTF8(icu::StringPiece(pattern)), locale(localeVariable()),
                 status_) {
     if (U_FAILURE(status_) != 0) return;
-    format_.setTimeZone(TimeZone::local().implementation()->zone());
     // The calendars of some locales are not Gregorian, or count their years otherwise; those that
     // are follow the rules of GregorianCalendar before the year 1582 too.
     std::unique_ptr<icu::Calendar> calendar(format_.getCalendar()->clone());
@@ -66,14 +67,20 @@ class DateFormatter::Implementation {
   std::string format(PointInTime date) const {
     std::string result;
     if (U_FAILURE(status_) != 0) return result;
+    const std::unique_ptr<icu::Calendar> calendar(format_.getCalendar()->clone());
+    calendar->adoptTimeZone(new icu::SimpleTimeZone(
+        static_cast<std::int32_t>(zone_.offsetAt(date) * kMillisecondsPerSecond), {}));
+    UErrorCode status = U_ZERO_ERROR;
+    calendar->setTime(static_cast<UDate>(date.time_since_epoch().count()), status);
     icu::UnicodeString text;
-    format_.format(static_cast<UDate>(date.time_since_epoch().count()), text);
-    return text.toUTF8String(result);
+    icu::FieldPosition position;
+    return format_.format(*calendar, text, position).toUTF8String(result);
   }
 
  private:
   UErrorCode status_ = U_ZERO_ERROR;
   icu::SimpleDateFormat format_;
+  TimeZone zone_ = TimeZone::local();
 };
 
 DateFormatter::DateFormatter(std::string_view pattern)

@@ -2,14 +2,14 @@
 
 #include <chrono>
 
+#include "platform/CivilDay.h"
+
 namespace platform {
 namespace {
 
 using Milliseconds = std::chrono::milliseconds;
 
 constexpr std::int64_t kMonthsPerYear = 12;
-constexpr std::int64_t kDaysPerEra = 146097;  // 400 years, after which the leap years repeat
-constexpr std::int64_t kYearsPerEra = 400;
 
 /// The farthest from 1970 that ICU's zones and formatters count.
 constexpr Milliseconds kFarthest{183'882'168'921'600'000};
@@ -20,19 +20,6 @@ constexpr std::int64_t kFarthestYear = 1'000'000'000'000;
 bool multiplyAndAdd(std::int64_t& number, std::int64_t factor, std::int64_t summand) {
   return !__builtin_mul_overflow(number, factor, &number) &&
          !__builtin_add_overflow(number, summand, &number);
-}
-
-std::int64_t floorQuotient(std::int64_t dividend, std::int64_t divisor) {
-  return dividend / divisor - (dividend % divisor < 0 ? 1 : 0);
-}
-
-/// The days from 1970-01-01 to the first of the month; `month` is from 1 to 12.
-std::int64_t daysUntilMonth(std::int64_t year, std::int64_t month) {
-  const std::int64_t era = floorQuotient(year, kYearsPerEra);
-  const std::chrono::year_month_day first{
-      std::chrono::year(static_cast<int>(year - era * kYearsPerEra)),
-      std::chrono::month(static_cast<unsigned>(month)), std::chrono::day(1)};
-  return era * kDaysPerEra + std::chrono::sys_days(first).time_since_epoch().count();
 }
 
 }  // namespace
@@ -47,7 +34,8 @@ std::optional<PointInTime> GregorianCalendar::dateFromComponents(
   const std::int64_t year = floorQuotient(months, kMonthsPerYear);
   if (year < -kFarthestYear || year > kFarthestYear) return std::nullopt;
 
-  std::int64_t count = daysUntilMonth(year, months - year * kMonthsPerYear + 1);
+  std::int64_t count =
+      daysFromCivil({.year = year, .month = months - year * kMonthsPerYear + 1, .day = 1});
   if (!multiplyAndAdd(count, 1, components.day.value_or(1)) || !multiplyAndAdd(count, 1, -1) ||
       !multiplyAndAdd(count, 24, components.hour.value_or(0)) ||
       !multiplyAndAdd(count, 60, components.minute.value_or(0)) ||

@@ -7,51 +7,15 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "platform/CivilDay.h"
+
 namespace platform {
 
 namespace {
 
-// The calendar repeats itself every 400 years. Years are counted from March here, so that the leap
-// day is the last day of its year. std::chrono's calendar ends with the year 32767.
-constexpr std::int64_t kDaysOfEra = 146097;
-constexpr std::int64_t kYearsOfEra = 400;
-constexpr std::int64_t kEpoch = 719468;  // days from 0000-03-01 to 1970-01-01
 constexpr std::int64_t kSecondsOfDay = 86400;
 
-struct CivilDay {
-  std::int64_t year;
-  std::int64_t month;
-  std::int64_t day;
-};
-
-constexpr std::int64_t flooredQuotient(std::int64_t dividend, std::int64_t divisor) {
-  return dividend / divisor - (dividend % divisor < 0 ? 1 : 0);
-}
-
-constexpr std::int64_t daysFromCivil(CivilDay civil) {
-  const std::int64_t marchYear = civil.month > 2 ? civil.year : civil.year - 1;
-  const std::int64_t era = flooredQuotient(marchYear, kYearsOfEra);
-  const std::int64_t yearOfEra = marchYear - era * kYearsOfEra;
-  const std::int64_t monthFromMarch = (civil.month + 9) % 12;
-  const std::int64_t dayOfYear = (153 * monthFromMarch + 2) / 5 + civil.day - 1;
-  const std::int64_t dayOfEra = yearOfEra * 365 + yearOfEra / 4 - yearOfEra / 100 + dayOfYear;
-  return era * kDaysOfEra + dayOfEra - kEpoch;
-}
-
-constexpr CivilDay civilFromDays(std::int64_t days) {
-  const std::int64_t era = flooredQuotient(days + kEpoch, kDaysOfEra);
-  const std::int64_t dayOfEra = days + kEpoch - era * kDaysOfEra;
-  const std::int64_t yearOfEra =
-      (dayOfEra - dayOfEra / 1460 + dayOfEra / 36524 - dayOfEra / 146096) / 365;
-  const std::int64_t dayOfYear = dayOfEra - (365 * yearOfEra + yearOfEra / 4 - yearOfEra / 100);
-  const std::int64_t monthFromMarch = (5 * dayOfYear + 2) / 153;
-  const std::int64_t month = (monthFromMarch + 2) % 12 + 1;
-  return {.year = era * kYearsOfEra + yearOfEra + (month <= 2 ? 1 : 0),
-          .month = month,
-          .day = dayOfYear - (153 * monthFromMarch + 2) / 5 + 1};
-}
-
-constexpr std::int64_t daysOfMonth(std::int64_t year, std::int64_t month) {
+std::int64_t daysOfMonth(std::int64_t year, std::int64_t month) {
   const CivilDay next = month == 12 ? CivilDay{year + 1, 1, 1} : CivilDay{year, month + 1, 1};
   return daysFromCivil(next) - daysFromCivil({year, month, 1});
 }
@@ -84,7 +48,7 @@ bool takeCharacter(std::string_view& text, char character) {
 void appendPropertyListDate(std::string& output, PointInTime date) {
   const std::int64_t seconds =
       std::chrono::floor<std::chrono::seconds>(date).time_since_epoch().count();
-  const std::int64_t days = flooredQuotient(seconds, kSecondsOfDay);
+  const std::int64_t days = floorQuotient(seconds, kSecondsOfDay);
   const std::int64_t secondOfDay = seconds - days * kSecondsOfDay;
   const CivilDay civil = civilFromDays(days);
 

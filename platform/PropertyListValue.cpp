@@ -101,4 +101,9 @@ const PropertyListValue* valueForKey(const Dictionary& dictionary, std::string_v
   return found == dictionary.end() ? nullptr : &found->second;
 }
 
+std::optional<Text> textForKey(const Dictionary& dictionary, std::string_view key) {
+  const PropertyListValue* value = valueForKey(dictionary, key);
+  return value ? value->asText() : std::nullopt;
+}
+
 }  // namespace platform

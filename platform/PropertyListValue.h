@@ -68,4 +68,7 @@ using Dictionary = PropertyListValue::Dictionary;
 /// The value under the key, or null when the dictionary has no such key.
 const PropertyListValue* valueForKey(const Dictionary& dictionary, std::string_view key);
 
+/// The value under the key as a text (see PropertyListValue::asText); absent without the key, too.
+std::optional<Text> textForKey(const Dictionary& dictionary, std::string_view key);
+
 }  // namespace platform

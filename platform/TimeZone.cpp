@@ -1,37 +1,81 @@
 #include "platform/TimeZone.h"
 
-#include <unicode/simpletz.h>
+#include <unicode/timezone.h>
 #include <unicode/unistr.h>
 
 #include <cstdlib>
 #include <ctime>
 #include <mutex>
 
-#include "platform/TimeZoneImplementation.h"
-
 namespace platform {
+
+class TimeZone::Rules {
+ public:
+  virtual ~Rules() = default;
+  virtual std::int64_t offsetAt(PointInTime date) const = 0;
+  virtual std::int64_t offsetAtLocalTime(LocalTime time) const = 0;
+};
+
 namespace {
 
-constexpr std::int64_t kMillisecondsPerSecond = 1000;
+/// The rules of a zone of the database.
+class DatabaseRules final : public TimeZone::Rules {
+ public:
+  explicit DatabaseRules(std::unique_ptr<const icu::TimeZone> zone) : zone_(std::move(zone)) {}
 
-icu::UnicodeString unicodeString(std::string_view text) {
-  return icu::UnicodeString::fromUTF8(icu::StringPiece(text));
-}
+  std::int64_t offsetAt(PointInTime date) const override {
+    return offset(date.time_since_epoch(), false);
+  }
+  std::int64_t offsetAtLocalTime(TimeZone::LocalTime time) const override {
+    return offset(time.time_since_epoch(), true);
+  }
 
-std::int64_t offsetOf(const icu::TimeZone& zone, std::int64_t milliseconds, bool isLocalTime) {
-  UErrorCode status = U_ZERO_ERROR;
-  std::int32_t standard = 0;
-  std::int32_t daylight = 0;
-  zone.getOffset(static_cast<UDate>(milliseconds), static_cast<UBool>(isLocalTime), standard,
-                 daylight, status);
-  return (std::int64_t{standard} + daylight) / kMillisecondsPerSecond;
-}
+ private:
+  std::int64_t offset(PointInTime::duration time, bool isLocalTime) const {
+    constexpr std::int64_t kMillisecondsPerSecond = 1000;
+    UErrorCode status = U_ZERO_ERROR;
+    std::int32_t standard = 0;
+    std::int32_t daylight = 0;
+    zone_->getOffset(static_cast<UDate>(time.count()), static_cast<UBool>(isLocalTime), standard,
+                     daylight, status);
+    return (std::int64_t{standard} + daylight) / kMillisecondsPerSecond;
+  }
 
-/// The zone of the database; null when there is none.
-std::unique_ptr<const icu::TimeZone> databaseZone(std::string_view name) {
+  std::unique_ptr<const icu::TimeZone> zone_;
+};
+
+/// The rules that the C library made of TZ or of the system's settings when it last read them.
+class CLibraryRules final : public TimeZone::Rules {
+ public:
+  std::int64_t offsetAt(PointInTime date) const override {
+    return offset(std::chrono::floor<std::chrono::seconds>(date.time_since_epoch()));
+  }
+
+  std::int64_t offsetAtLocalTime(TimeZone::LocalTime time) const override {
+    // Clocks are never more than this ahead of GMT or behind it, nor changed twice within it.
+    constexpr std::chrono::hours kFarthestOffset{25};
+    const auto seconds = std::chrono::floor<std::chrono::seconds>(time.time_since_epoch());
+    const std::int64_t before = offset(seconds - kFarthestOffset);
+    const std::int64_t after = offset(seconds + kFarthestOffset);
+    // In a gap, the offset after it leads to a time before it; in an overlap, to the later time.
+    return offset(seconds - std::chrono::seconds(after)) == after ? after : before;
+  }
+
+ private:
+  static std::int64_t offset(std::chrono::seconds sinceEpoch) {
+    const time_t time = sinceEpoch.count();
+    struct tm fields {};
+    return localtime_r(&time, &fields) != nullptr ? fields.tm_gmtoff : 0;
+  }
+};
+
+using SharedRules = std::shared_ptr<const TimeZone::Rules>;
+
+/// The rules of the zone of the database; null when there is none.
+SharedRules databaseRules(std::string_view name) {
   if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
   // ICU makes a zone of any name: of "GMT+5" an offset, of an unknown one the zone Etc/Unknown.
-  const icu::UnicodeString id = unicodeString(name);
+  const icu::UnicodeString id = icu::UnicodeString::fromUTF8(icu::StringPiece(name));
   icu::UnicodeString canonicalID;
   UBool isInDatabase = 0;
   UErrorCode status = U_ZERO_ERROR;
@@ -39,7 +83,8 @@ std::unique_ptr<const icu::TimeZone> databaseZone(std::string_view name) {
   if (U_FAILURE(status) != 0 || isInDatabase == 0 || canonicalID == UCAL_UNKNOWN_ZONE_ID) {
     return nullptr;
   }
-  return std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id));
+  return std::make_shared<const DatabaseRules>(
+      std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id)));
 }
 
 /// A text of TZ that may name a zone of the database: ":name" or a path into the database.
@@ -50,14 +95,13 @@ std::string_view zoneName(std::string_view variable) {
   return found == std::string_view::npos ? variable : variable.substr(found + kDatabase.size());
 }
 
-/// The zone that the C library makes of TZ, with its present offset for all times.
-std::unique_ptr<const icu::TimeZone> zoneOfCLibrary() {
+/// The rules that TZ means, which is absent when it is not set.
+SharedRules localRules(const std::optional<std::string>& variable) {
+  // ICU's own database has the names also where none is installed for the C library.
+  SharedRules rules = variable ? databaseRules(zoneName(*variable)) : nullptr;
+  if (rules) return rules;
   tzset();
-  const time_t now = time(nullptr);
-  struct tm local {};
-  const std::int64_t offset = localtime_r(&now, &local) != nullptr ? local.tm_gmtoff : 0;
-  return std::make_unique<const icu::SimpleTimeZone>(
-      static_cast<std::int32_t>(offset * kMillisecondsPerSecond), unicodeString("Local"));
+  return std::make_shared<const CLibraryRules>();
 }
 
 /// The zones in use by name, and the table of abbreviations.
@@ -84,11 +128,9 @@ std::optional<TimeZone> TimeZone::named(std::string_view name) {
   Registry& zones = registry();
   const std::lock_guard lock(zones.mutex);
   if (const auto known = zones.named.find(name); known != zones.named.end()) return known->second;
-  std::unique_ptr<const icu::TimeZone> zone = databaseZone(name);
-  if (!zone) return std::nullopt;
-  return zones.named
-      .emplace(name, TimeZone(std::make_shared<const Implementation>(std::move(zone))))
-      .first->second;
+  SharedRules rules = databaseRules(name);
+  if (!rules) return std::nullopt;
+  return zones.named.emplace(name, TimeZone(std::move(rules))).first->second;
 }
 
 TimeZone TimeZone::local() {
@@ -98,16 +140,8 @@ TimeZone TimeZone::local() {
   const bool isCurrent = value != nullptr ? zones.localVariable == std::string_view(value)
                                           : !zones.localVariable.has_value();
   if (!zones.local || !isCurrent) {
-    std::unique_ptr<const icu::TimeZone> zone;
-    if (value == nullptr) {
-      zones.localVariable.reset();
-      zone.reset(icu::TimeZone::detectHostTimeZone());
-    } else {
-      zones.localVariable = value;
-      zone = databaseZone(zoneName(value));
-    }
-    if (!zone) zone = zoneOfCLibrary();
-    zones.local = TimeZone(std::make_shared<const Implementation>(std::move(zone)));
+    zones.localVariable = value != nullptr ? std::optional<std::string>(value) : std::nullopt;
+    zones.local = TimeZone(localRules(zones.localVariable));
   }
   return *zones.local;
 }
@@ -131,14 +165,11 @@ std::optional<TimeZone> TimeZone::withAbbreviation(std::string_view abbreviation
 }
 
 std::int64_t TimeZone::offsetAt(PointInTime date) const {
-  if (!implementation_) return fixedOffset_;
-  return offsetOf(implementation_->zone(), date.time_since_epoch().count(), false);
+  return rules_ ? rules_->offsetAt(date) : fixedOffset_;
 }
 
-std::int64_t TimeZone::offsetAtLocalTime(
-    std::chrono::local_time<PointInTime::duration> time) const {
-  if (!implementation_) return fixedOffset_;
-  return offsetOf(implementation_->zone(), time.time_since_epoch().count(), true);
+std::int64_t TimeZone::offsetAtLocalTime(LocalTime time) const {
+  return rules_ ? rules_->offsetAtLocalTime(time) : fixedOffset_;
 }
 
 }  // namespace platform

@@ -44,9 +44,8 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   }
 
   const platform::Dictionary& attributes = parser->feedAttributes();
-  const auto text = [&attributes](std::string_view key) -> std::optional<platform::Text> {
-    const platform::PropertyListValue* value = platform::valueForKey(attributes, key);
-    return value ? value->asText() : std::nullopt;
+  const auto text = [&attributes](std::string_view key) {
+    return platform::textForKey(attributes, key);
   };
   setUuid(text("QELUUID"));
   setTitle(text("title"));

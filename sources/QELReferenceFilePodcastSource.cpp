@@ -71,8 +71,7 @@ bool QELReferenceFilePodcastSource::loadSourceWithError(platform::ErrorSlot& err
   }
 
   for (const QELPodcastKey& field : QELPodcastKeys()) {
-    const PropertyListValue* value = platform::valueForKey(*refData_, field.key);
-    (this->*field.setValue)(value ? value->asText() : std::nullopt);
+    (this->*field.setValue)(platform::textForKey(*refData_, field.key));
   }
   const PropertyListValue* episodes = platform::valueForKey(*refData_, "Episodes");
   if (const PropertyListValue::Array* array = episodes ? episodes->asArray() : nullptr) {

@@ -13,15 +13,17 @@
 namespace {
 
 using platform::PointInTime;
+using std::chrono::day;
 using std::chrono::days;
 using std::chrono::hours;
 using std::chrono::minutes;
+using std::chrono::month;
 using std::chrono::seconds;
 using std::chrono::sys_days;
 using std::chrono::year;
 
 PointInTime at(int y, unsigned m, unsigned d, int hour = 0, int minute = 0, int second = 0) {
-  return sys_days(year(y) / m / d) + hours(hour) + minutes(minute) + seconds(second);
+  return sys_days(year(y) / month(m) / day(d)) + hours(hour) + minutes(minute) + seconds(second);
 }
 
 class RFC822ParsingTest : public testing::Test {

@@ -10,6 +10,7 @@ import unittest
 from support import ToolTestCase, element, item, rss
 
 LOS_ANGELES = "America/Los_Angeles"
+CENTRAL_EUROPE = "CET-1CEST,M3.5.0,M10.5.0/3"
 
 
 def at(year, month=1, day=1, hour=0, minute=0, second=0):
@@ -199,6 +200,18 @@ class ZoneTest(ReadingTestCase):
         for zone, hour in (("UTC", 12), ("Asia/Tokyo", 3), (LOS_ANGELES, 19)):
             self.assertDates([(text, at(2007, 6, 5, hour)) for text in texts], zone)
 
+    def test_local_time_by_a_rule_instead_of_a_name(self):
+        self.assertDates([
+            ("05 Jun 2007 12:00 XYZ", at(2007, 6, 5, 10)),
+            ("05 Dec 2007 12:00 XYZ", at(2007, 12, 5, 11)),
+            ("25 Mar 2007 01:59:59 XYZ", at(2007, 3, 25, 0, 59, 59)),
+            ("25 Mar 2007 02:30 XYZ", at(2007, 3, 25, 1, 30)),
+            ("25 Mar 2007 03:00 XYZ", at(2007, 3, 25, 1)),
+            ("28 Oct 2007 01:59:59 XYZ", at(2007, 10, 27, 23, 59, 59)),
+            ("28 Oct 2007 02:30 XYZ", at(2007, 10, 28, 1, 30)),
+            ("28 Oct 2007 03:00 XYZ", at(2007, 10, 28, 2)),
+        ], CENTRAL_EUROPE)
+
     def test_a_rejected_date_leaves_the_earlier_one(self):
         episode = self.episode_of("<pubDate>05 Jun 2007 10:00 GMT</pubDate><pubDate>yesterday</pubDate>")
         self.assertEqual(episode, {"EpisodeDate": at(2007, 6, 5, 10)})
@@ -249,6 +262,14 @@ class WritingTest(ToolTestCase):
     def test_dates_in_a_zone_of_half_hours(self):
         self.assertEqual(self.written([row[0] for row in self.DATES], TZ="Asia/Kolkata"),
                          [row[3] for row in self.DATES])
+
+    def test_dates_in_a_zone_that_is_a_rule(self):
+        self.assertEqual(self.written([at(2007, 6, 5, 14, 30), at(2007, 12, 5, 4, 5, 6)], TZ=CENTRAL_EUROPE),
+                         ["Tue, 05 Jun 2007 16:30:00 GMT+02:00", "Wed, 05 Dec 2007 05:05:06 GMT+01:00"])
+
+    def test_years_follow_the_locale(self):
+        thai, = self.written([at(2007, 6, 5, 14, 30)], LC_ALL="th_TH", TZ="UTC")
+        self.assertRegex(thai, r"\b05 \S+ 2550 14:30:00 GMT\Z")
 
     def test_names_follow_the_locale(self):
         french, = self.written([at(2007, 6, 5, 14, 30)], LC_ALL="fr_FR.UTF-8")

@@ -1,4 +1,4 @@
-"""What the manual shows is true: commands work as typed, outputs, file names and warnings are the tool's.
+"""What the manual shows is true: commands work as typed, outputs, names and messages are the tool's.
 
 A manual that is wrong is worse than none, and nobody notices when it becomes so. CONTRIBUTING.md says how
 a document marks what is run.
@@ -17,7 +17,9 @@ from urllib.parse import quote
 from support import ToolTestCase, environment, has_gnu_parallel, tool
 
 ROOT = Path(__file__).resolve().parents[2]
-DOCUMENTS = [ROOT / "README.md", *sorted((ROOT / "docs").glob("*.md"))]
+MANUAL_PAGE = ROOT / "docs" / "qel.1"
+PAGES = [ROOT / "README.md", *sorted((ROOT / "docs").glob("*.md"))]
+DOCUMENTS = [*PAGES, MANUAL_PAGE]
 FLEET = ROOT / "docs" / "fleet.md"
 
 # The addresses that stand for a server of examples/: the manual's, and the one in the example feed.
@@ -30,13 +32,17 @@ PROMPT = "$ "
 
 class Block(NamedTuple):
     line: int  # of the document, where the block begins
-    comment: str  # the HTML comment right before it, or ""
+    comment: str  # the comment right before it, or ""
     language: str
     lines: list
 
 
 def blocks(document):
-    """The fenced blocks of a document, in their order."""
+    """The blocks of a document, in their order: fenced ones, or the literal displays of a manual page."""
+    return displays(document) if document == MANUAL_PAGE else fenced_blocks(document)
+
+
+def fenced_blocks(document):
     comment, block = "", None
     for number, line in enumerate(document.read_text(encoding="utf-8").splitlines(), 1):
         if block is not None:
@@ -49,6 +55,33 @@ def blocks(document):
             block = Block(number, comment, line[3:], [])
         found = re.fullmatch(r"<!-- (.*) -->", line)
         comment = found[1] if found else ""
+
+
+# How a manual page writes the characters that a formatter would otherwise make prettier.
+ROFF = {"\\-": "-", "\\(aq": "'", "\\(ga": "`", "\\(dq": '"', "\\e": "\\", "\\&": ""}
+
+
+def as_shown(line):
+    """What a formatter shows for a line of a manual page without macros."""
+    unknown = re.sub("|".join(map(re.escape, ROFF)), "", line)
+    if "\\" in unknown:
+        raise ValueError(f"an escape that is not in the table: {line}")
+    return re.sub("|".join(map(re.escape, ROFF)), lambda escape: ROFF[escape[0]], line)
+
+
+def displays(manual_page):
+    """The literal displays of a manual page. One that shows prompts is a console, any other one a file."""
+    comment, block = "", None
+    for number, line in enumerate(manual_page.read_text(encoding="utf-8").splitlines(), 1):
+        if line.startswith(".Ed"):
+            lines = [as_shown(shown) for shown in block.lines]
+            yield block._replace(language="console" if lines[0].startswith(PROMPT) else "", lines=lines)
+            block = None
+        elif block is not None:
+            block.lines.append(line)
+        elif line.startswith(".Bd -literal"):
+            block = Block(number, comment, "", [])
+        comment = line.removeprefix('.\\" ') if line.startswith('.\\" ') else ""
 
 
 def tables(document, *header):
@@ -84,7 +117,10 @@ class DocumentationTest(ToolTestCase):
         self.site = self.server()
 
     def copy_of_examples(self, name):
-        """A served copy of examples/ whose feed names that server; returns its folder of that name, else its show."""
+        """A served copy of examples/ whose feed names that server; returns its folder of that name, else its show.
+
+        The show also holds scripts/, as the directory of the project does.
+        """
         copy = self.path(name)
         shutil.copytree(ROOT / "examples", copy)
         feed = copy / "show" / "feed.xml"
@@ -92,6 +128,7 @@ class DocumentationTest(ToolTestCase):
         for file in copy.rglob("*"):
             if file.is_file():
                 self.site.serve("/" + quote(file.relative_to(copy).as_posix()), file.read_bytes())
+        (copy / "show" / "scripts").symlink_to(ROOT / "scripts")
         return copy / name if (copy / name).exists() else copy / "show"
 
     def shell(self, script, directory):
@@ -127,7 +164,7 @@ class DocumentationTest(ToolTestCase):
         for block in blocks(document):
             with self.subTest(document=document.name, line=block.line):
                 if block.comment.startswith("file: "):
-                    content = "".join(line + "\n" for line in block.lines)
+                    content = SERVER.sub(self.site.url(""), "".join(line + "\n" for line in block.lines))
                     (directory / block.comment.removeprefix("file: ")).write_text(content, encoding="utf-8")
                 elif block.language == "console":
                     self.check_console(block.lines, directory)
@@ -140,7 +177,7 @@ class DocumentationTest(ToolTestCase):
     def test_commands_work_as_typed(self):
         counts = {document.name: self.check_commands(document) for document in DOCUMENTS if document != FLEET}
         # A document without such a block would pass unread.
-        for name in ("README.md", "bundle.md", "feeds.md", "reference-file.md"):
+        for name in ("README.md", "bundle.md", "feeds.md", "reference-file.md", MANUAL_PAGE.name):
             self.assertGreater(counts[name], 0, name)
 
     @unittest.skipUnless(has_gnu_parallel(), "GNU parallel is not installed")
@@ -149,7 +186,7 @@ class DocumentationTest(ToolTestCase):
 
     def test_links_lead_somewhere(self):
         link = re.compile(r"\]\((?!https?:)([^)#]*)#?([^)]*)\)")
-        for document in [*DOCUMENTS, ROOT / "CONTRIBUTING.md"]:
+        for document in [*PAGES, ROOT / "CONTRIBUTING.md"]:
             for path, heading in link.findall(document.read_text(encoding="utf-8")):
                 with self.subTest(document=document.name, link=f"{path}#{heading}"):
                     target = (document.parent / path).resolve() if path else document
@@ -163,6 +200,65 @@ def headings(document):
     for line in document.read_text(encoding="utf-8").splitlines():
         if line.startswith("#"):
             yield re.sub(r"[^\w -]", "", line.lstrip("# ").lower()).replace(" ", "-")
+
+
+class ManualPageTest(unittest.TestCase):
+    # Where a message is made: the driver's failures, errors and progress.
+    MAKER = re.compile(r"\b(?:fail|fillSlot|QELError|QELProgress)\([^;]*;")
+    # The texts in there that are more than a mark, such as "W", or a part of another, such as "podcast".
+    MESSAGE = re.compile(r'"((?:[A-Z-]|\\")(?:[^"\\]|\\.)+)"')
+    PLACE = re.compile(r"%(?:@|s|lu|0\.1f)")
+
+    def messages(self):
+        """The messages of the sources, as patterns; what others say may stand before one."""
+        found = set()
+        for folder in ("cli", "model", "sources", "generators"):
+            for source in (ROOT / folder).glob("*.cpp"):
+                for maker in self.MAKER.findall(source.read_text(encoding="utf-8")):
+                    found |= set(self.MESSAGE.findall(maker))
+        self.assertGreater(len(found), 30)
+        texts = (message.removesuffix("\\n").replace('\\"', '"').replace("%%", "%") for message in found)
+        return ["(?:.+: )?" + ".+".join(map(re.escape, self.PLACE.split(text))) for text in texts]
+
+    def entries(self):
+        """The entries of the lists of messages."""
+        entries, depth = [], 0
+        for line in MANUAL_PAGE.read_text(encoding="utf-8").splitlines():
+            if line.startswith(".Bl -diag"):
+                depth += 1
+            elif line.startswith(".El") and depth:
+                depth -= 1
+            elif line.startswith(".It ") and depth:
+                entries.append(as_shown(line.removeprefix(".It ")))
+        return entries
+
+    def test_every_message_of_the_sources_has_its_entry(self):
+        entries = self.entries()
+        for message in self.messages():
+            with self.subTest(message):
+                self.assertTrue(any(re.fullmatch(message, entry) for entry in entries))
+
+    def test_every_entry_is_a_message_of_the_sources(self):
+        messages = self.messages()
+        for entry in self.entries():
+            with self.subTest(entry):
+                self.assertTrue(any(re.fullmatch(message, entry) for message in messages))
+
+    def test_every_key_of_a_reference_file_is_named(self):
+        text = MANUAL_PAGE.read_text(encoding="utf-8")
+        rows = [row for *header, in (("key", "type", "meaning"), ("key", "type", "meaning", "when it is missing"))
+                for table in tables(ROOT / "docs" / "reference-file.md", *header) for row in table]
+        self.assertEqual(len(rows), 30)
+        for key in (row[0].strip("`") for row in rows):
+            self.assertRegex(text, rf"\b{key}\b")
+
+    @unittest.skipUnless(shutil.which("mandoc"), "mandoc is not installed; scripts/setup --checks installs it")
+    def test_the_page_is_sound_mdoc(self):
+        text = MANUAL_PAGE.read_text(encoding="utf-8").replace("@PROJECT_VERSION@", "1.2.3")
+        self.assertNotIn("@", text)
+        lint = subprocess.run(["mandoc", "-T", "lint"], input=text, capture_output=True, text=True, timeout=60,
+                              check=False)
+        self.assertEqual((lint.returncode, lint.stdout + lint.stderr), (0, ""))
 
 
 class BundleTablesTest(ToolTestCase):

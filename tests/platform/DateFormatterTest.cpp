@@ -36,12 +36,24 @@ TEST(DateFormatterTest, WritesTheOffsetOfTheZone) {
       {"Europe/Berlin", "Tue, 05 Jun 2007 23:30:00 GMT+02:00"},
       {"Asia/Kolkata", "Wed, 06 Jun 2007 03:00:00 GMT+05:30"},
       {"EST5", "Tue, 05 Jun 2007 16:30:00 GMT-05:00"},
+      {"CET-1CEST,M3.5.0,M10.5.0/3", "Tue, 05 Jun 2007 23:30:00 GMT+02:00"},
       {"Nowhere/City", "Tue, 05 Jun 2007 21:30:00 GMT"},
       {"", "Tue, 05 Jun 2007 21:30:00 GMT"},
   };
   for (const auto& row : rows) {
     const Settings settings("C", nullptr, nullptr, row.zone);
     EXPECT_EQ(DateFormatter(kPattern).format(kDate), row.text) << row.zone;
+  }
+}
+
+TEST(DateFormatterTest, OffsetIsThatOfTheDate) {
+  const PointInTime winter = kDate + std::chrono::days(183);
+  for (const char* zone : {"Europe/Berlin", "CET-1CEST,M3.5.0,M10.5.0/3"}) {
+    const Settings settings("C", nullptr, nullptr, zone);
+    const DateFormatter formatter(kPattern);
+    EXPECT_EQ(formatter.format(kDate), "Tue, 05 Jun 2007 23:30:00 GMT+02:00") << zone;
+    EXPECT_EQ(formatter.format(winter), "Wed, 05 Dec 2007 22:30:00 GMT+01:00") << zone;
+    EXPECT_EQ(DateFormatter("Z zzzz VVVV").format(winter), "+0100 GMT+01:00 GMT+01:00") << zone;
   }
 }
 

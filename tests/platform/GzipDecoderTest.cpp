@@ -24,7 +24,7 @@ std::string decoded(std::string_view stream, std::size_t pieceSize = 1 << 20) {
 }
 
 TEST(GzipDecoderTest, DecodesWhateverThePieces) {
-  for (const std::size_t pieceSize : {1, 2, 7, 37, 38, 1000}) {
+  for (const std::size_t pieceSize : {1U, 2U, 7U, 37U, 38U, 1000U}) {
     EXPECT_EQ(decoded(kGzipStream, pieceSize), kGzipText) << pieceSize;
   }
 }
@@ -32,7 +32,7 @@ TEST(GzipDecoderTest, DecodesWhateverThePieces) {
 TEST(GzipDecoderTest, DecodesSeveralMembers) {
   const std::string text(kGzipText);
   const std::string twice = std::string(kGzipStream) + std::string(kGzipStream);
-  for (const std::size_t pieceSize : {1, 38, 39, 1000}) {
+  for (const std::size_t pieceSize : {1U, 38U, 39U, 1000U}) {
     EXPECT_EQ(decoded(twice, pieceSize), text + text) << pieceSize;
   }
 }

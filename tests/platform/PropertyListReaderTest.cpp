@@ -413,7 +413,7 @@ TEST(PropertyListReaderTest, ReadsEveryKindOfBinaryObject) {
 }
 
 TEST(PropertyListReaderTest, ReadsBinaryContainers) {
-  for (const std::size_t width : {1, 2, 3, 8}) {
+  for (const std::size_t width : {1U, 2U, 3U, 8U}) {
     BinaryPropertyList list(width);
     const auto name = list.addText("EpisodeName");
     const auto order = list.addText("EpisodeOrder");

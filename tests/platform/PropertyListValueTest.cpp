@@ -133,5 +133,13 @@ TEST(PropertyListValueTest, ValueForKeyFindsExactKeysOnly) {
   EXPECT_EQ(valueForKey({}, "PodcastName"), nullptr);
 }
 
+TEST(PropertyListValueTest, FindsTheTextForAKey) {
+  const Dictionary dictionary = {{"text", "Orbit"}, {"number", std::int64_t{3}}, {"flag", true}};
+  EXPECT_EQ(textForKey(dictionary, "text"), "Orbit");
+  EXPECT_EQ(textForKey(dictionary, "number"), "3");
+  EXPECT_EQ(textForKey(dictionary, "flag"), std::nullopt);
+  EXPECT_EQ(textForKey(dictionary, "missing"), std::nullopt);
+}
+
 }  // namespace
 }  // namespace platform

@@ -142,7 +142,7 @@ TEST_F(ResourceReaderTest, LeavesABodyThatIsOnlyGzipInItself) {
 
 TEST_F(ResourceReaderTest, CompressedBodyCutShortIsAFailure) {
   const std::string cutShort = "transfer 61: The compressed body is cut short";
-  for (const std::size_t length : {0, 5, 20, 37}) {
+  for (const std::size_t length : {0U, 5U, 20U, 37U}) {
     const std::string_view cut = kGzipStream.substr(0, length);
     EXPECT_EQ(readAnswer(HTTPTestServer::response(cut, kGzipHeader)), cutShort) << length;
   }

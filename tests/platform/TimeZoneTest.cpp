@@ -2,12 +2,14 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <limits>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "tests/support/EnvironmentGuard.h"
+#include "tests/support/TemporaryDirectory.h"
 
 namespace {
 
@@ -21,6 +23,7 @@ using std::chrono::sys_days;
 using std::chrono::year;
 
 constexpr std::int64_t kHour = 3600;
+constexpr const char* kCentralEurope = "CET-1CEST,M3.5.0,M10.5.0/3";
 const PointInTime kSummer = sys_days(year(2007) / 6 / 5) + hours(12);
 const PointInTime kWinter = sys_days(year(2007) / 12 / 5) + hours(12);
 
@@ -61,7 +64,6 @@ TEST(TimeZoneTest, NamedZonesFollowTheirRules) {
     ASSERT_TRUE(zone) << row.name;
     EXPECT_EQ(zone->offsetAt(kSummer), row.summer) << row.name;
     EXPECT_EQ(zone->offsetAt(kWinter), row.winter) << row.name;
-    EXPECT_EQ(TimeZone::named(row.name)->implementation(), zone->implementation()) << row.name;
   }
 }
 
@@ -102,11 +104,13 @@ TEST(TimeZoneTest, LocalTimesInAGapAndAnOverlap) {
 }
 
 TEST(TimeZoneTest, OffsetsOfTheFarthestTimesAreSane) {
-  const TimeZone zone = *TimeZone::named("America/Los_Angeles");
-  for (const PointInTime date : {PointInTime::min(), PointInTime::max()}) {
-    EXPECT_LE(std::abs(zone.offsetAt(date)), 24 * kHour);
-    const std::chrono::local_time<PointInTime::duration> time(date.time_since_epoch());
-    EXPECT_LE(std::abs(zone.offsetAtLocalTime(time)), 24 * kHour);
+  const EnvironmentGuard guard("TZ", kCentralEurope);
+  for (const TimeZone& zone : {*TimeZone::named("America/Los_Angeles"), TimeZone::local()}) {
+    for (const PointInTime date : {PointInTime::min(), PointInTime::max()}) {
+      EXPECT_LE(std::abs(zone.offsetAt(date)), 24 * kHour);
+      const TimeZone::LocalTime time(date.time_since_epoch());
+      EXPECT_LE(std::abs(zone.offsetAtLocalTime(time)), 24 * kHour);
+    }
   }
 }
 
@@ -126,6 +130,14 @@ TEST(TimeZoneTest, LocalZoneFollowsTZ) {
       {"EST5", -5 * kHour, -5 * kHour},
       {"GMT+5", -5 * kHour, -5 * kHour},
       {"<+0330>-3:30", 12600, 12600},
+      {kCentralEurope, 2 * kHour, kHour},
+      {"CET-1CEST", 2 * kHour, kHour},
+      {"EST5EDT,M3.2.0,M11.1.0", -4 * kHour, -5 * kHour},
+      {"<+0330>-3:30<+0430>,J79/24,J263/24", 16200, 12600},
+      {"NZST-12NZDT,M9.5.0,M4.1.0/3", 12 * kHour, 13 * kHour},
+      {"IST-1GMT0,M10.5.0,M3.5.0/1", kHour, 0},
+      {"<-03>3<-02>,M3.5.0/-2,M10.5.0/-1", -2 * kHour, -3 * kHour},
+      {"XXX-24:59:59", 89999, 89999},
       {"", 0, 0},
       {":", 0, 0},
       {"Nowhere/City", 0, 0},
@@ -135,17 +147,80 @@ TEST(TimeZoneTest, LocalZoneFollowsTZ) {
     const EnvironmentGuard guard("TZ", row.variable);
     EXPECT_EQ(TimeZone::local().offsetAt(kSummer), row.summer) << row.variable;
     EXPECT_EQ(TimeZone::local().offsetAt(kWinter), row.winter) << row.variable;
-    EXPECT_EQ(TimeZone::local().implementation(), TimeZone::local().implementation());
+  }
+}
+
+TEST(TimeZoneTest, LocalZoneMayBeAnyZoneFile) {
+  const std::filesystem::path database = "/usr/share/zoneinfo";
+  if (!exists(database / "Europe/Berlin")) GTEST_SKIP() << "no database is installed";
+  const TemporaryDirectory directory;
+  const std::string copy = directory / "zone";
+  copy_file(database / "Europe/Berlin", copy);
+  const struct {
+    std::string variable;
+    std::int64_t summer, winter;
+    const char* file;
+  } rows[] = {
+      {copy, 2 * kHour, kHour, ""},
+      {":" + copy, 2 * kHour, kHour, ""},
+      {"posix/Europe/Berlin", 2 * kHour, kHour, "posix/Europe/Berlin"},
+      {":posix/Europe/Berlin", 2 * kHour, kHour, "posix/Europe/Berlin"},
+      {database / "posix/Europe/Berlin", 2 * kHour, kHour, "posix/Europe/Berlin"},
+      {"right/Europe/Berlin", 2 * kHour, kHour, "right/Europe/Berlin"},
+      {"posixrules", -4 * kHour, -5 * kHour, "posixrules"},
+  };
+  for (const auto& row : rows) {
+    if (!exists(database / row.file)) continue;
+    const EnvironmentGuard guard("TZ", row.variable.c_str());
+    EXPECT_EQ(TimeZone::local().offsetAt(kSummer), row.summer) << row.variable;
+    EXPECT_EQ(TimeZone::local().offsetAt(kWinter), row.winter) << row.variable;
   }
 }
 
 TEST(TimeZoneTest, LocalZoneWithoutTZIsThatOfTheMachine) {
-  const EnvironmentGuard guard("TZ", nullptr);
-  tzset();
-  const time_t summer = std::chrono::system_clock::to_time_t(kSummer);
-  struct tm fields {};
-  ASSERT_NE(localtime_r(&summer, &fields), nullptr);
-  EXPECT_EQ(TimeZone::local().offsetAt(kSummer), fields.tm_gmtoff);
+  for (const char* variable : {static_cast<const char*>(nullptr), ":/etc/localtime"}) {
+    const EnvironmentGuard guard("TZ", variable);
+    for (const PointInTime date : {kSummer, kWinter}) {
+      const time_t time = std::chrono::system_clock::to_time_t(date);
+      struct tm fields {};
+      tzset();
+      ASSERT_NE(localtime_r(&time, &fields), nullptr);
+      EXPECT_EQ(TimeZone::local().offsetAt(date), fields.tm_gmtoff);
+    }
+  }
+}
+
+TEST(TimeZoneTest, RulesOfTZAreThoseOfTheDatabase) {
+  // The rules that the database has for the year 2010, every quarter of an hour of it.
+  const struct {
+    const char* variable;
+    const char* name;
+  } rows[] = {
+      {"PST8PDT,M3.2.0,M11.1.0", "America/Los_Angeles"},
+      {kCentralEurope, "Europe/Berlin"},
+      {"IST-1GMT0,M10.5.0,M3.5.0/1", "Europe/Dublin"},
+      {"NZST-12NZDT,M9.5.0,M4.1.0/3", "Pacific/Auckland"},
+      {"<+1030>-10:30<+11>-11,M10.1.0,M4.1.0", "Australia/Lord_Howe"},
+      {"<-03>3<-02>,M3.5.0/-2,M10.5.0/-1", "America/Godthab"},
+      {"<+14>-14", "Pacific/Kiritimati"},
+  };
+  for (const auto& row : rows) {
+    const EnvironmentGuard guard("TZ", row.variable);
+    const TimeZone local = TimeZone::local();
+    const TimeZone named = *TimeZone::named(row.name);
+    for (PointInTime date = sys_days(year(2010) / 1 / 1); date < sys_days(year(2011) / 1 / 1);
+         date += minutes(15)) {
+      for (const PointInTime::duration early :
+           {PointInTime::duration(0), PointInTime::duration(1)}) {
+        const PointInTime instant = date - early;
+        const TimeZone::LocalTime time(instant.time_since_epoch());
+        ASSERT_EQ(local.offsetAt(instant), named.offsetAt(instant))
+            << row.variable << ", ms " << instant.time_since_epoch().count();
+        ASSERT_EQ(local.offsetAtLocalTime(time), named.offsetAtLocalTime(time))
+            << row.variable << ", local ms " << time.time_since_epoch().count();
+      }
+    }
+  }
 }
 
 TEST(TimeZoneTest, AbbreviationsComeFromTheTable) {
@@ -165,6 +240,7 @@ TEST(TimeZoneTest, AbbreviationsComeFromTheTable) {
 }
 
 TEST(TimeZoneTest, ThreadsShareZones) {
+  const EnvironmentGuard guard("TZ", kCentralEurope);
   std::vector<std::thread> threads;
   for (int thread = 0; thread < 4; ++thread) {
     threads.emplace_back([] {
@@ -172,7 +248,7 @@ TEST(TimeZoneTest, ThreadsShareZones) {
         TimeZone::setAbbreviationTable({{"PST", "America/Los_Angeles"}});
         EXPECT_EQ(TimeZone::withAbbreviation("PST")->offsetAt(kSummer), -7 * kHour);
         EXPECT_EQ(TimeZone::named("Asia/Kolkata")->offsetAt(kSummer), 19800);
-        EXPECT_TRUE(TimeZone::local().implementation());
+        EXPECT_EQ(TimeZone::local().offsetAt(kSummer), 2 * kHour);
       }
     });
   }
