@@ -306,8 +306,8 @@ TEST(QELEpisodeTest, ThreadsSeeWholeDatesAndNumbers) {
   race(
       [&](std::size_t round) {
         episode->setDate(dates[round % 2]);
-        episode->setOrvaneOrder(round % 2 ? INT64_MIN : 1);
-        episode->setContentLength(round % 2 ? UINT64_MAX : 1);
+        episode->setOrvaneOrder(round % 2 == 0 ? 1 : INT64_MIN);
+        episode->setContentLength(round % 2 == 0 ? 1 : UINT64_MAX);
       },
       [&] {
         const auto date = episode->date();
