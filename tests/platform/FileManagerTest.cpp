@@ -24,7 +24,6 @@ namespace platform {
 namespace {
 
 using testing::ElementsAre;
-using testing::IsEmpty;
 
 /// Every byte value, in an order that a misplaced piece would break.
 std::string largeContent(std::size_t size) {

@@ -188,7 +188,7 @@ TEST(GregorianCalendarTest, CurrentYearIsThatOfItsZone) {
         std::chrono::year_month_day(std::chrono::floor<std::chrono::days>(time)).year());
   };
   GregorianCalendar calendar;
-  for (const std::int64_t offset : {std::int64_t{0}, std::int64_t{366 * 86400}}) {
+  for (const std::int64_t offset : {std::int64_t{0}, std::int64_t{366} * 86400}) {
     calendar.setTimeZone(TimeZone::withOffset(offset));
     const auto before = yearOf(std::chrono::system_clock::now() + seconds(offset));
     const std::int64_t year = calendar.currentYear();

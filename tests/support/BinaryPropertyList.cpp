@@ -39,7 +39,7 @@ std::string BinaryPropertyList::bytes(std::uint64_t root) const {
          bigEndian(tableOffset, 8);
 }
 
-std::string BinaryPropertyList::counted(unsigned kind, std::size_t count) const {
+std::string BinaryPropertyList::counted(unsigned kind, std::size_t count) {
   if (count < 0xF) return bigEndian(kind << 4 | count, 1);
   return bigEndian(kind << 4 | 0xF, 1) + "\x13" + bigEndian(count, 8);
 }

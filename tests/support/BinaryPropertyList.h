@@ -24,7 +24,7 @@ class BinaryPropertyList {
   std::string bytes(std::uint64_t root) const;
 
  private:
-  std::string counted(unsigned kind, std::size_t count) const;
+  static std::string counted(unsigned kind, std::size_t count);
   std::string references(const std::vector<std::uint64_t>& numbers) const;
 
   std::size_t referenceWidth_;

@@ -11,7 +11,7 @@
 #include <stdexcept>
 #include <utility>
 
-bool HTTPTestServer::Connection::send(std::string_view bytes) {
+bool HTTPTestServer::Connection::send(std::string_view bytes) const {
   while (!bytes.empty()) {
     const ssize_t sent = ::send(socket_, bytes.data(), bytes.size(), MSG_NOSIGNAL);
     if (sent <= 0) return false;

@@ -27,7 +27,7 @@ class HTTPTestServer {
     /// The request as it came, up to and with the empty line.
     const std::string& request() const { return request_; }
     /// False once the client is gone.
-    bool send(std::string_view bytes);
+    bool send(std::string_view bytes) const;
     /// Closes the connection in an orderly way when the route returns; otherwise it stays open.
     void close() { closing_ = true; }
     /// The same by a reset, once the client has had time to read what was sent.
