@@ -64,6 +64,11 @@ def environment(changes=None):
     return values
 
 
+def soaking():
+    """Whether this is a long run (QEL_SOAK=1), in which a test tries all cases, not only a choice of them."""
+    return os.environ.get("QEL_SOAK") == "1"
+
+
 def start(*arguments, env=None, **options):
     """Starts the tool with Popen's options and returns the process."""
     return subprocess.Popen([tool(), *arguments], env=environment(env), **options)
