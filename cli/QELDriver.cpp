@@ -6,6 +6,8 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 #include "cli/QELArguments.h"
 #include "cli/QELError.h"
@@ -56,6 +58,14 @@ bool succeeds(Step step, ErrorSlot& error) {
   }
 }
 
+/// Keeps what a run has made until the process ends. That gives all memory back at once; to destroy
+/// a long podcast record by record would take a tenth of the run.
+template <typename Object>
+Object& kept(std::unique_ptr<Object> object) {
+  static auto& objects = *new std::vector<std::unique_ptr<Object>>;
+  return *objects.emplace_back(std::move(object));
+}
+
 bool generate(QELPodcastGenerator& generator, QELPodcastSource& source, ErrorSlot& error) {
   return succeeds([&] { return generator.generateFromSource(source, error); }, error);
 }
@@ -65,7 +75,7 @@ std::string targetPath(const QELArguments& arguments) {
 }
 
 int createBundle(const QELArguments& arguments, QELPodcastSource& source) {
-  QELBundlePodcastGenerator generator;
+  auto& generator = kept(std::make_unique<QELBundlePodcastGenerator>());
   // The path is the bundle itself, exactly as it was given, whatever its extension.
   generator.setOutputPath(arguments.outputPath.value_or(platform::temporaryDirectory()));
   ErrorSlot error;
@@ -80,7 +90,7 @@ int createFeed(const QELArguments& arguments, QELPodcastSource& source) {
     return fail("\"%s\" is not a recognized feed format.\n", {format});
   }
 
-  QELFeedPodcastGenerator generator;
+  auto& generator = kept(std::make_unique<QELFeedPodcastGenerator>());
   generator.setFormat(format);
   ErrorSlot error;
   if (!generate(generator, source, error)) return failToGenerate("feed", error);
@@ -97,7 +107,7 @@ int createFeed(const QELArguments& arguments, QELPodcastSource& source) {
 }
 
 int parseFeed(const QELArguments& arguments, QELPodcastSource& source) {
-  QELReferenceFilePodcastGenerator generator;
+  auto& generator = kept(std::make_unique<QELReferenceFilePodcastGenerator>());
   ErrorSlot error;
   if (!generate(generator, source, error)) return failToGenerate("reference file", error);
   if (!generator.referenceData()) {
@@ -116,22 +126,23 @@ int run(const QELArguments& arguments) {
   if (!QELValidateSource(arguments.source, arguments.readStandardInput)) {
     return fail("\"%s\" is not a valid podcast source.\n", {arguments.source});
   }
-  const std::unique_ptr<QELPodcastSource> source = arguments.readStandardInput
-                                                       ? initWithStandardInput()
-                                                       : initWithSourceString(*arguments.source);
-  if (!source) {
+  std::unique_ptr<QELPodcastSource> made = arguments.readStandardInput
+                                               ? initWithStandardInput()
+                                               : initWithSourceString(*arguments.source);
+  if (!made) {
     return fail("Could not initialize podcast source with string \"%s\".\n", {arguments.source});
   }
+  QELPodcastSource& source = kept(std::move(made));
 
   QELProgress("N", "Loading/interpreting source...");
   ErrorSlot error;
-  if (!succeeds([&] { return source->loadSourceWithError(error); }, error)) {
+  if (!succeeds([&] { return source.loadSourceWithError(error); }, error)) {
     return fail("Could not load source: %s", {descriptionOf(error)});
   }
 
-  if (arguments.command == "createbundle") return createBundle(arguments, *source);
-  if (arguments.command == "createfeed") return createFeed(arguments, *source);
-  if (arguments.command == "parsefeed") return parseFeed(arguments, *source);
+  if (arguments.command == "createbundle") return createBundle(arguments, source);
+  if (arguments.command == "createfeed") return createFeed(arguments, source);
+  if (arguments.command == "parsefeed") return parseFeed(arguments, source);
   return fail("No recognizable command was provided.\n");
 }
 
