@@ -110,7 +110,7 @@ bool BinaryPropertyListReader::readKey(std::uint64_t number) {
   const auto key = text(number, *object);
   if (!key) return failAtObject(number, "is a key but no text");
   if (!spend(key->size())) return false;
-  builder_.setKey(key->string());
+  builder_.setKey(*key);
   return true;
 }
 

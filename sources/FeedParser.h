@@ -10,6 +10,7 @@
 
 #include "platform/ErrorRecord.h"
 #include "platform/PropertyListValue.h"
+#include "platform/Text.h"
 #include "platform/XMLParser.h"
 
 /// Turns the bytes of a podcast feed into two plain results: the feed attributes (one dictionary
@@ -75,7 +76,7 @@ class FeedParser : private platform::XMLParserEvents {
   bool readsRSS() const { return feedType_ == "rss"; }
   /// The open item, or the channel between items.
   platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
-  void takeText(platform::Dictionary& target, const char* key);
+  void takeText(platform::Dictionary& target, const platform::Text& key);
   void emptyBuffer();
 
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items
