@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <utility>
 
 #include "cli/QELError.h"
 #include "dates/RFC822Parsing.h"
@@ -77,6 +78,7 @@ void FeedParser::didStartElement(const platform::XMLName& name,
   if (!readsRSS()) return;
 
   if (name.local == "item") {
+    endItem();
     currentEpisode_ = &episodes_.emplace_back();
   } else if (name.local == "enclosure") {
     readEnclosure(attributes);
@@ -102,7 +104,7 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
 
   const std::string_view local = name.local;
   if (local == "item") {
-    currentEpisode_ = nullptr;
+    endItem();
   } else if (local == "title") {
     takeText(target(), "title"_text);
   } else if (local == "author" || local == "creator") {
@@ -129,6 +131,12 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (name.qualified == "qel:order") {
     takeText(target(), "order"_text);
   }
+}
+
+void FeedParser::endItem() {
+  if (!std::exchange(currentEpisode_, nullptr) || !itemReceiver_) return;
+  itemReceiver_(episodes_.back());
+  episodes_.pop_back();
 }
 
 void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -33,6 +34,12 @@ class FeedParser : private platform::XMLParserEvents {
   /// A parser of the bytes, which it gives up as it reads them; null for absent data.
   static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string> data);
 
+  /// Hands each item's dictionary over, in document order, once nothing is added to it any more,
+  /// instead of keeping it. For feeds of tens of thousands of items, whose records are made at
+  /// once.
+  using ItemReceiver = std::function<void(const platform::Dictionary&)>;
+  void setItemReceiver(ItemReceiver receiver) { itemReceiver_ = std::move(receiver); }
+
   /// Runs the whole parse. False for malformed XML, with the XML parser's own record, and for a
   /// document without an "rss" element, with code 3.
   bool parseWithError(platform::ErrorSlot& error);
@@ -42,7 +49,7 @@ class FeedParser : private platform::XMLParserEvents {
   void setFeedType(std::optional<std::string> type) { feedType_ = std::move(type); }
 
   const platform::Dictionary& feedAttributes() const { return feedAttributes_; }
-  /// In document order.
+  /// In document order; none when a receiver got them.
   const std::vector<platform::Dictionary>& episodes() const { return episodes_; }
 
  private:
@@ -68,6 +75,7 @@ class FeedParser : private platform::XMLParserEvents {
   void didEndElement(const platform::XMLName& name) override;
   void foundCharacters(std::string_view text) override { cdataBuffer_.append(text); }
 
+  void endItem();
   void readEnclosure(const platform::XMLAttributes& attributes);
   void readAdvisoryLabel(platform::Dictionary& target);
   void readDate(platform::Dictionary& target);
@@ -81,6 +89,7 @@ class FeedParser : private platform::XMLParserEvents {
 
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items
   std::vector<platform::Dictionary> episodes_;
+  ItemReceiver itemReceiver_;
   bool parsingImage_ = false;
   platform::Dictionary feedAttributes_;
   std::string cdataBuffer_;
