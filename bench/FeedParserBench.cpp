@@ -17,7 +17,7 @@ void parseFeed(benchmark::State& state) {
     if (!parser->parseWithError(error)) state.SkipWithError("the feed was refused");
     benchmark::DoNotOptimize(parser->episodes().data());
   }
-  state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * feed.size()));
+  state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(feed.size()));
   state.SetItemsProcessed(state.iterations() * state.range(0));
 }
 BENCHMARK(parseFeed)->Arg(10)->Arg(1'000)->Arg(10'000)->Unit(benchmark::kMillisecond);

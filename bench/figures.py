@@ -22,7 +22,8 @@ def verdict(row, judged=True):
         return "not judged"
     if row["ratio"] <= row["limit"]:
         return "met"
-    return f"missed by {100 * (row['ratio'] / row['limit'] - 1):.0f} %"
+    excess = 100 * (row["ratio"] / row["limit"] - 1)
+    return f"missed by {excess:.0f} %" if excess >= 1 else "missed by less than 1 %"
 
 
 def shown_time(seconds):
@@ -73,3 +74,11 @@ def document_table(figures):
                  verdict(row, figures["judged"]))
         lines.append(f"| {' | '.join(cells)} |")
     return lines
+
+
+def measured_with(figures):
+    """A sentence on the machine and the rivals."""
+    machine = figures["machine"]
+    versions = ", ".join(f"{name} {version}" for name, version in figures["rivals"].items() if version)
+    return (f"Measured on a {machine['system']} machine with {machine['cores']} cores and "
+            f"{machine['memory'] / 2**30:.0f} GiB of memory, against {versions}.")

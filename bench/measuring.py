@@ -54,6 +54,13 @@ def run(contestant):
     return Run(float(seconds), float(processor_seconds), int(peak))
 
 
+def is_whole(contestant):
+    try:
+        return contestant.check(contestant.output)
+    except OSError:  # nothing is there
+        return False
+
+
 def remove(path):
     if path.is_dir():
         shutil.rmtree(path)
@@ -66,7 +73,7 @@ def contest(contestants, rounds):
     present = [contestant for contestant in contestants if contestant.command]
     for contestant in present:  # not counted: fills the page cache for all, and shows that each does its work
         run(contestant)
-        if not contestant.check(contestant.output):
+        if not is_whole(contestant):
             raise Failure(f"{contestant.name}: its output is not whole")
     runs = {contestant.name: [] for contestant in present}
     for number in range(rounds):
@@ -92,4 +99,4 @@ def summary(runs):
 
 def smallest_peak():
     """The least peak (in bytes) that can be told: a program counts the memory of the one that started it."""
-    return run(Contestant("an empty program", [shutil.which("true")])).peak
+    return run(Contestant("an empty program", ["/bin/sh", "-c", ":"])).peak
