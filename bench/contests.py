@@ -1,7 +1,7 @@
 """The contests: which programs do which work, and what each row of the table compares.
 
-What a program makes is written into a file on the same disk on both sides, or nowhere on both sides. Two sorts of
-rivals have nothing to write, the ones that only parse; the tool then writes its result all the same.
+Both sides write what they make into new files on the same disk. A rival that only parses has nothing to write;
+the tool then writes its result all the same, where the row does not say otherwise.
 """
 
 import contextlib
@@ -16,7 +16,7 @@ from typing import Optional
 
 import inputs
 import media_server
-from measuring import Contestant, contest
+from measuring import Contestant, contest, run
 
 STYLESHEET = Path(__file__).parent / "to-reference.xsl"
 FEEDPARSER = "import feedparser, sys; sys.exit(len(feedparser.parse(sys.argv[1]).entries) == 0)"
@@ -130,8 +130,7 @@ class Contests:
     def reference_of(self, items):
         """The reference file of a feed. The tool makes it, so it is made anew each time."""
         path = self.scratch / f"reference-{items}.plist"
-        subprocess.run([self.tool, "parsefeed", self.feed_of(items).as_uri(), "-d", path],
-                       stdout=subprocess.DEVNULL, check=True)
+        run(self.qel("parsefeed", "parsefeed", self.feed_of(items).as_uri(), path))
         return path
 
     def media_of(self, count, size):
