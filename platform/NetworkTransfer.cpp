@@ -1,13 +1,13 @@
 #include "platform/NetworkTransfer.h"
 
-#include <curl/curl.h>
-
 #include <algorithm>
 #include <climits>
 #include <cstddef>
 #include <exception>
 #include <utility>
 #include <vector>
+
+#include "platform/TransferLibrary.h"
 
 namespace platform {
 namespace {
@@ -42,6 +42,11 @@ std::string shownText(std::string_view text) {
   return shown;
 }
 
+/// Only called for a transfer, which is not begun without the library.
+const TransferLibrary& library() {
+  return *TransferLibrary::functions();
+}
+
 ErrorRecord outOfMemory() {
   return transferError(TransferErrorCode::kOutOfMemory, "Out of memory");
 }
@@ -63,30 +68,30 @@ class NetworkTransfer::Connections {
   CURLcode add(NetworkTransfer& transfer) {
     if (!handle_) return CURLE_FAILED_INIT;
     running_.push_back(&transfer);
-    const CURLMcode code = curl_multi_add_handle(handle_.get(), transfer.handle_.get());
+    const CURLMcode code = library().multiAddHandle(handle_.get(), transfer.handle_.get());
     return code == CURLM_OK ? CURLE_OK : CURLE_OUT_OF_MEMORY;
   }
 
   void remove(NetworkTransfer& transfer) {
-    curl_multi_remove_handle(handle_.get(), transfer.handle_.get());
+    library().multiRemoveHandle(handle_.get(), transfer.handle_.get());
     running_.erase(std::remove(running_.begin(), running_.end(), &transfer), running_.end());
   }
 
   bool run() {
     if (running_.empty()) return false;
     int count = 0;
-    CURLMcode code = curl_multi_poll(handle_.get(), nullptr, 0, INT_MAX, nullptr);
-    if (code == CURLM_OK) code = curl_multi_perform(handle_.get(), &count);
+    CURLMcode code = library().multiPoll(handle_.get(), nullptr, 0, INT_MAX, nullptr);
+    if (code == CURLM_OK) code = library().multiPerform(handle_.get(), &count);
     if (code != CURLM_OK) {
       const CURLcode result = code == CURLM_OUT_OF_MEMORY ? CURLE_OUT_OF_MEMORY : CURLE_FAILED_INIT;
       while (!running_.empty()) running_.back()->end(result);
       return true;
     }
-    while (const CURLMsg* message = curl_multi_info_read(handle_.get(), &count)) {
+    while (const CURLMsg* message = library().multiInfoRead(handle_.get(), &count)) {
       if (message->msg != CURLMSG_DONE) continue;
       const CURLcode result = message->data.result;
       void* transfer = nullptr;
-      curl_easy_getinfo(message->easy_handle, CURLINFO_PRIVATE, &transfer);
+      library().easyGetinfo(message->easy_handle, CURLINFO_PRIVATE, &transfer);
       static_cast<NetworkTransfer*>(transfer)->end(result);
     }
     return true;
@@ -94,13 +99,13 @@ class NetworkTransfer::Connections {
 
  private:
   struct Closer {
-    void operator()(CURLM* handle) const { curl_multi_cleanup(handle); }
+    void operator()(CURLM* handle) const { library().multiCleanup(handle); }
   };
 
   // What the library sets up once costs milliseconds, which only a run with transfers pays.
   static CURLM* newHandle() {
-    static const CURLcode libraryState = curl_global_init(CURL_GLOBAL_DEFAULT);
-    return libraryState == CURLE_OK ? curl_multi_init() : nullptr;
+    static const CURLcode libraryState = library().globalInit(CURL_GLOBAL_DEFAULT);
+    return libraryState == CURLE_OK ? library().multiInit() : nullptr;
   }
 
   std::unique_ptr<CURLM, Closer> handle_{newHandle()};
@@ -108,7 +113,7 @@ class NetworkTransfer::Connections {
 };
 
 void NetworkTransfer::HandleCloser::operator()(void* handle) const {
-  curl_easy_cleanup(handle);
+  library().easyCleanup(handle);
 }
 
 NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink)
@@ -116,6 +121,11 @@ NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, S
   if (url.scheme() != "http" && url.scheme() != "https") {
     error_ = transferError(TransferErrorCode::kUnsupportedScheme,
                            "URLs of the scheme \"" + url.scheme() + "\" are not supported");
+    ended_ = true;
+    return;
+  }
+  if (TransferLibrary::error()) {
+    error_ = TransferLibrary::error();
     ended_ = true;
     return;
   }
@@ -130,12 +140,12 @@ NetworkTransfer::~NetworkTransfer() {
 }
 
 int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
-  handle_.reset(curl_easy_init());
+  handle_.reset(library().easyInit());
   if (!handle_) return CURLE_OUT_OF_MEMORY;
 
   CURLcode result = CURLE_OK;
   const auto set = [this, &result](CURLoption option, auto value) {
-    if (result == CURLE_OK) result = curl_easy_setopt(handle_.get(), option, value);
+    if (result == CURLE_OK) result = library().easySetopt(handle_.get(), option, value);
   };
   static_assert(sizeof(errorText_) >= CURL_ERROR_SIZE);
   set(CURLOPT_PRIVATE, static_cast<void*>(this));
@@ -171,7 +181,7 @@ int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
 
 int NetworkTransfer::status() const {
   long status = 0;
-  curl_easy_getinfo(handle_.get(), CURLINFO_RESPONSE_CODE, &status);
+  library().easyGetinfo(handle_.get(), CURLINFO_RESPONSE_CODE, &status);
   return static_cast<int>(status);
 }
 
@@ -192,19 +202,20 @@ void NetworkTransfer::end(int resultCode) {
               "A line of the answer's header is too long, or memory has run out"};
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
-    error_ = {"transfer", result, shownText(detail.empty() ? curl_easy_strerror(result) : detail)};
+    error_ = {"transfer", result,
+              shownText(detail.empty() ? library().easyStrerror(result) : detail)};
   }
 }
 
 bool NetworkTransfer::isInHeader() const {
   curl_off_t firstByteTime = 0;
-  curl_easy_getinfo(handle_.get(), CURLINFO_STARTTRANSFER_TIME_T, &firstByteTime);
+  library().easyGetinfo(handle_.get(), CURLINFO_STARTTRANSFER_TIME_T, &firstByteTime);
   return firstByteTime > 0 && !begun_;
 }
 
 std::optional<std::string> NetworkTransfer::headerValue(const char* name) const {
   curl_header* header = nullptr;
-  if (curl_easy_header(handle_.get(), name, 0, CURLH_HEADER, -1, &header) != CURLHE_OK) {
+  if (library().easyHeader(handle_.get(), name, 0, CURLH_HEADER, -1, &header) != CURLHE_OK) {
     return std::nullopt;
   }
   return header->value;
