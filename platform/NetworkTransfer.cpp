@@ -21,7 +21,7 @@ constexpr long kNoConnectTimeout = INT_MAX / 1000;
 constexpr std::uint64_t kIgnoredBodyLimit = std::uint64_t{64} * 1024;
 /// The library reads the page of a redirect by itself, and would do so for ever. Some servers send
 /// the whole page that they meant to move away from.
-constexpr std::uint64_t kRedirectPageLimit = std::uint64_t{16} * 1024 * 1024;
+constexpr std::int64_t kRedirectPageLimit = std::int64_t{16} * 1024 * 1024;
 /// Of all answers of a transfer together; honest ones have a few KiB.
 constexpr std::uint64_t kHeaderLimit = std::uint64_t{1} * 1024 * 1024;
 
@@ -170,8 +170,8 @@ int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
   set(CURLOPT_WRITEDATA, static_cast<void*>(this));
   const curl_xferinfo_callback progressCallback = [](void* self, curl_off_t, curl_off_t bodySize,
                                                      curl_off_t, curl_off_t) {
-    const auto size = static_cast<std::uint64_t>(bodySize);
-    return static_cast<NetworkTransfer*>(self)->mayGoOn(size) ? 0 : 1;
+    const bool isIgnored = !static_cast<NetworkTransfer*>(self)->begun_;
+    return isIgnored && bodySize > kRedirectPageLimit ? 1 : 0;
   };
   set(CURLOPT_XFERINFOFUNCTION, progressCallback);
   set(CURLOPT_XFERINFODATA, static_cast<void*>(this));
@@ -196,6 +196,8 @@ void NetworkTransfer::end(int resultCode) {
     error_ = {"transfer", CURLE_PARTIAL_FILE, "The header of the answer is cut short"};
   } else if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
     error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
+  } else if (result == CURLE_ABORTED_BY_CALLBACK) {
+    error_ = transferError(TransferErrorCode::kTooLarge, "The page of a redirect never ends");
   } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
     // The library says the same of a line beyond its limit.
     error_ = {"transfer", result,
@@ -251,12 +253,6 @@ bool NetworkTransfer::didReceiveBody(std::string_view bytes) {
   if (begun_) return sink_.take(bytes, error_);
   ignoredSize_ += bytes.size();
   return ignoredSize_ <= kIgnoredBodyLimit;
-}
-
-bool NetworkTransfer::mayGoOn(std::uint64_t bodySize) {
-  if (begun_ || bodySize <= kRedirectPageLimit) return true;
-  error_ = transferError(TransferErrorCode::kTooLarge, "The page of a redirect never ends");
-  return false;
 }
 
 std::size_t NetworkTransfer::headerCallback(char* bytes, std::size_t size, std::size_t count,

@@ -76,7 +76,6 @@ class NetworkTransfer {
   bool didReceiveHeaderLine(std::string_view line);
   bool didReceiveHeader();
   bool didReceiveBody(std::string_view bytes);
-  bool mayGoOn(std::uint64_t bodySize);
   static std::size_t headerCallback(char* bytes, std::size_t size, std::size_t count, void* self);
   static std::size_t bodyCallback(char* bytes, std::size_t size, std::size_t count, void* self);
 

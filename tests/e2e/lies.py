@@ -99,11 +99,11 @@ def endless(before, piece):
     return serve
 
 
-def slow(before, after, pause):
-    """Sends `before` at once, and the bytes of `after` in ten parts with a pause (seconds) before each."""
+def slow(before, after, pause, parts=10):
+    """Sends `before` at once, and the bytes of `after` in parts with a pause (seconds) before each."""
     def serve(exchange):
         exchange.send(before)
-        part = len(after) // 10 + 1
+        part = len(after) // parts + 1
         for start in range(0, len(after), part):
             time.sleep(pause)
             exchange.send(after[start:start + part])
@@ -347,7 +347,8 @@ LIES = {
     "Connections": (
         Lie("a body that drips", slow(answer(length(SIZE), body=b""), BODY, 0.005)),
         Lie("a header that drips", slow(b"", answer(length(SIZE)), 0.005)),
-        Lie("a stall in the body", slow(answer(length(SIZE), body=BODY[:9]), BODY[9:10], 0.3), missing(SIZE - 10)),
+        Lie("a stall in the body", slow(answer(length(SIZE), body=BODY[:9]), BODY[9:], 0.5, parts=1)),
+        Lie("a stall in the header", slow(FOUND, answer(length(SIZE))[len(FOUND):], 0.5, parts=1)),
         Lie("reset before the answer", reset(b""), RESET),
         Lie("reset in the header", reset(FOUND + b"Content-"), RESET),
         Lie("reset in the body", reset(answer(length(SIZE + 1))), RESET),

@@ -107,6 +107,23 @@ def is_sanitized():
     return b"__asan_init" in Path(tool()).read_bytes()
 
 
+def unprivileged(directory):
+    """The prefix that runs the tool as a user who may not do everything, with the directory, as it is now, handed
+    over to that user. Empty where this is such a user already; where there is no other, the test is skipped."""
+    if os.geteuid() != 0:
+        return ()
+    nobody = 65534
+    prefix = ("setpriv", f"--reuid={nobody}", f"--regid={nobody}", "--clear-groups")
+    tried = shutil.which("setpriv") and subprocess.run(
+        [*prefix, tool(), "unknown"], stdin=subprocess.DEVNULL, capture_output=True, check=False).returncode == 1
+    if not tried:
+        raise unittest.SkipTest("nothing is forbidden to this user, and no other may run the tool")
+    for folder, folders, files in os.walk(directory):
+        for name in (".", *folders, *files):
+            os.lchown(os.path.join(folder, name), nobody, nobody)
+    return prefix
+
+
 def has_gnu_parallel():
     """Whether GNU parallel is installed, and not another program of that name."""
     if not shutil.which("parallel"):

@@ -74,13 +74,6 @@ class BrokenAnswerTest(TransferTestCase):
     def test_a_missing_file_url(self):
         self.assertSkips(self.path("missing/broken.mp3").as_uri())
 
-    def test_a_file_url_of_a_directory_or_device(self):
-        self.path("broken.mp3").mkdir()
-        self.assertSkips(self.path("broken.mp3").as_uri())
-        self.path("broken.mp3").rmdir()
-        self.path("broken.mp3").symlink_to("/dev/zero")
-        self.assertSkips(self.path("broken.mp3").as_uri(), timeout=30)
-
 
 class GoodAnswerTest(TransferTestCase):
     def test_bytes_of_every_value(self):
