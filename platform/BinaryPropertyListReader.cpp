@@ -276,6 +276,9 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
                                                                         : "UTF-8";
     auto converted = convertedToUTF8(encoded, encoding);
     if (!converted) return std::nullopt;
+    if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size()))
+      return std::nullopt;
+    converted->shrink_to_fit();
     text = Text(std::move(*converted));
   }
   return text;
