@@ -9,7 +9,7 @@ import signal
 import unittest
 
 from bundle_support import BundleTestCase, contents, notices
-from support import LOADING
+from support import LOADING, counting_from_start
 
 LIMIT = 8192
 LARGE = b"0123456789abcdef" * 1024
@@ -23,7 +23,7 @@ def limited():
 
 class FullDiskTest(BundleTestCase):
     def create(self, podcast, *arguments, **options):
-        return super().create(podcast, *arguments, preexec_fn=limited, **options)
+        return super().create(podcast, *arguments, env=counting_from_start(), preexec_fn=limited, **options)
 
     def assertSkips(self, location):
         """The run leaves out the episode, and nothing of it; those around it are there."""
@@ -100,7 +100,8 @@ class FullDiskTest(BundleTestCase):
             limited()
             signal.signal(signal.SIGXFSZ, signal.SIG_DFL)  # Python ignores it
         source = self.reference({"Episodes": [{"EpisodeReference": self.media("a.mp3", LARGE)}]})
-        self.assertWarns(super().create(source, preexec_fn=prepare), 'Could not save or download episode "(null)"')
+        self.assertWarns(super().create(source, env=counting_from_start(), preexec_fn=prepare),
+                         'Could not save or download episode "(null)"')
 
 
 class RefusingDirectoryTest(BundleTestCase):
