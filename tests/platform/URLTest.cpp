@@ -70,6 +70,7 @@ TEST(URLTest, Accepts) {
 
 TEST(URLTest, Rejects) {
   const std::vector<std::string> rows = {
+      "http://\u00FC." + std::string(300, 'a') + ".example/",
       "",
       ":",
       "://h/",
