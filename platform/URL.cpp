@@ -1,6 +1,5 @@
 #include "platform/URL.h"
 
-#include <curl/curl.h>
 #include <unicode/uidna.h>
 #include <unicode/utf8.h>
 
@@ -9,6 +8,8 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+
+#include "platform/TransferLibrary.h"
 
 namespace platform {
 namespace {
@@ -194,9 +195,12 @@ std::string nonASCIIEncoded(std::string_view text) {
 }
 
 bool isAcceptedByTransferLibrary(const std::string& encodedText) {
-  const std::unique_ptr<CURLU, decltype(&curl_url_cleanup)> handle(curl_url(), &curl_url_cleanup);
+  const TransferLibrary* const library = TransferLibrary::functions();
+  if (library == nullptr) return true;  // the transfer will tell what is wrong
+  const std::unique_ptr<CURLU, decltype(library->urlCleanup)> handle(library->url(),
+                                                                     library->urlCleanup);
   return handle != nullptr &&
-         curl_url_set(handle.get(), CURLUPART_URL, encodedText.c_str(), 0) == CURLUE_OK;
+         library->urlSet(handle.get(), CURLUPART_URL, encodedText.c_str(), 0) == CURLUE_OK;
 }
 
 }  // namespace
