@@ -73,6 +73,7 @@ class Bundle {
     if (!name) return;
     const std::string base = ledger_.reserve(QELBaseName(*name));
     requireThat(bases_.insert(base).second, "a base name is given out once");
+    requireThat(base.find('/') == std::string::npos, "a base name holds no slash");
     const std::string extension(platform::pathExtension(*name));
     requireThat(extension.find('/') == std::string::npos, "an extension holds no slash");
     const std::string fileName = QELNameWithExtension(base, extension);
