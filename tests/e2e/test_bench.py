@@ -36,7 +36,7 @@ def timed(limit, ours, theirs, work="work"):
 MISSING = {"work": "absent work", "against": "`xmllint`", "limit": 1.5, "missing": "xmllint"}
 SAMPLE = {
     "judged": True,
-    "machine": {"cores": 2, "memory": 8 << 30, "system": "Linux x86_64"},
+    "machine": {"cores": 2, "memory": 8 << 30, "virtual": True, "system": "Linux x86_64"},
     "rivals": {"curl": "7.88.1", "xmllint": None},
     "smallest peak": 8_000_000,
     "rows": [
@@ -166,7 +166,8 @@ class ReportTest(ToolTestCase):
         document = (root / "docs/performance.md").read_text(encoding="utf-8")
         self.assertTrue(document.startswith("# Speed\n") and document.endswith("\n\nend\n"), document)
         self.assertIn("| slow work | `rival` | 3.00 | 2 | missed by 50 % |\n", document)
-        self.assertIn("2 cores and 8 GiB of memory, against curl 7.88.1.", document)
+        self.assertIn("Measured on a virtual machine with 2 cores and 8 GiB of memory (Linux x86_64), against curl "
+                      "7.88.1.\n", document)
         self.assertNotIn("old", document)
         ElementTree.parse(root / "docs/performance.svg")
 
