@@ -10,6 +10,7 @@ import unittest
 import urllib.request
 import xml.etree.ElementTree as ElementTree
 from pathlib import Path
+from unittest import mock
 
 from support import ToolTestCase, environment, tool
 
@@ -21,6 +22,7 @@ sys.path.insert(0, str(BENCH))
 import chart  # noqa: E402
 import figures  # noqa: E402
 import inputs  # noqa: E402
+import measuring  # noqa: E402
 import media_server  # noqa: E402
 
 SVG = "{http://www.w3.org/2000/svg}"
@@ -227,6 +229,11 @@ class BenchTest(ToolTestCase):
         self.assertEqual((finished.returncode, finished.stdout), (1, ""))
         self.assertIn("bench: parsefeed: ", finished.stderr)
         self.assertIn(" ended with 1\n", finished.stderr)
+
+    def test_a_program_that_does_not_end_is_ended(self):
+        with mock.patch.object(measuring, "LONGEST_RUN", 1), self.assertRaises(measuring.Failure) as caught:
+            measuring.run(measuring.Contestant("endless", ["/bin/sh", "-c", "sleep 60"]))
+        self.assertRegex(str(caught.exception), "^endless: /bin/sh did not end within 1 seconds$")
 
     def test_a_contest_that_does_not_exist_is_refused(self):
         finished = self.bench("fed")
