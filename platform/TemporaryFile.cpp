@@ -49,7 +49,11 @@ std::string hiddenName() {
 /// The lock says that the file's owner lives. Without waiting; false with EWOULDBLOCK when another
 /// open file holds it, with other codes where the file system knows no locks.
 bool lock(int descriptor) {
-  return ::flock(descriptor, LOCK_EX | LOCK_NB) == 0;
+  int result = -1;
+  do {
+    result = ::flock(descriptor, LOCK_EX | LOCK_NB);
+  } while (result != 0 && errno == EINTR);
+  return result == 0;
 }
 
 bool isNamed(int descriptor, const std::string& path) {

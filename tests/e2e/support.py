@@ -90,7 +90,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     env = dict(env or {})
     shell = ['exec "$0" "$@"', *(_CLOSING[descriptor] for descriptor in closed)]
     if memory_limit is not None:
-        if _is_sanitized():
+        if is_sanitized():
             env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
         else:
             shell.insert(0, f"ulimit -v {memory_limit >> 10} &&")
@@ -102,9 +102,26 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
 
 
-def _is_sanitized():
+def is_sanitized():
     """Whether the executable has its own idea of the address space, which a limit would break."""
     return b"__asan_init" in Path(tool()).read_bytes()
+
+
+def unprivileged(directory):
+    """The prefix that runs the tool as a user who may not do everything, with the directory, as it is now, handed
+    over to that user. Empty where this is such a user already; where there is no other, the test is skipped."""
+    if os.geteuid() != 0:
+        return ()
+    nobody = 65534
+    prefix = ("setpriv", f"--reuid={nobody}", f"--regid={nobody}", "--clear-groups")
+    tried = shutil.which("setpriv") and subprocess.run(
+        [*prefix, tool(), "unknown"], stdin=subprocess.DEVNULL, capture_output=True, check=False).returncode == 1
+    if not tried:
+        raise unittest.SkipTest("nothing is forbidden to this user, and no other may run the tool")
+    for folder, folders, files in os.walk(directory):
+        for name in (".", *folders, *files):
+            os.lchown(os.path.join(folder, name), nobody, nobody)
+    return prefix
 
 
 def has_gnu_parallel():

@@ -141,6 +141,42 @@ TEST_F(StandardStreamsTest, StandardOutputIsWrittenWhenFlushed) {
             0);
 }
 
+TEST_F(StandardStreamsTest, PrintedTextWaitsForANonBlockingOutput) {
+  const std::string text = longText();
+  Connection pipe = makePipe();
+  makeNonBlocking(pipe.writeEnd);
+  std::string bytes;
+  std::thread reader([&] {
+    ::usleep(20000);
+    bytes = allFrom(pipe.readEnd);
+  });
+  EXPECT_EQ(exitStatusWithOutput(pipe.writeEnd,
+                                 [&] {
+                                   writeToStandardOutput(text);
+                                   flushStandardOutput();
+                                   return true;
+                                 }),
+            0);
+  pipe.writeEnd.close();
+  reader.join();
+  EXPECT_TRUE(bytes == text) << bytes.size() << " bytes";
+}
+
+TEST_F(StandardStreamsTest, PrintedTextThatIsRefusedIsGone) {
+  const std::string path = directory_.addFile("out", "");
+  EXPECT_EQ(exitStatusWithOutput(FileDescriptor::open("/dev/full", O_WRONLY),
+                                 [&] {
+                                   writeToStandardOutput("refused");
+                                   flushStandardOutput();
+                                   ::dup2(FileDescriptor::open(path, O_WRONLY).get(),
+                                          STDOUT_FILENO);
+                                   writeToStandardOutput("taken");
+                                   flushStandardOutput();
+                                   return contentOf(path) == "taken";
+                                 }),
+            0);
+}
+
 TEST_F(StandardStreamsTest, OutputFileReplacesOrAppends) {
   const std::string path = directory_.addFile("out", "a longer old content");
   {
