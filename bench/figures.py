@@ -80,5 +80,6 @@ def measured_with(figures):
     """A sentence on the machine and the rivals."""
     machine = figures["machine"]
     versions = ", ".join(f"{name} {version}" for name, version in figures["rivals"].items() if version)
-    return (f"Measured on a {machine['system']} machine with {machine['cores']} cores and "
-            f"{machine['memory'] / 2**30:.0f} GiB of memory, against {versions}.")
+    kind = "virtual machine" if machine["virtual"] else "machine"
+    return (f"Measured on a {kind} with {machine['cores']} cores and {machine['memory'] / 2**30:.0f} GiB of memory "
+            f"({machine['system']}), against {versions}.")

@@ -6,6 +6,7 @@ figures of one contest may be compared.
 
 import os
 import shutil
+import signal
 import statistics
 import subprocess
 import sys
@@ -17,6 +18,8 @@ STOPWATCH = Path(__file__).parent / "stopwatch.py"
 # A proxy would stand between the server and the rivals.
 ENVIRONMENT = {**{name: value for name, value in os.environ.items() if not name.lower().endswith("_proxy")},
                "TZ": "UTC", "LC_ALL": "C"}
+
+LONGEST_RUN = 600  # seconds
 
 
 class Failure(Exception):
@@ -48,9 +51,16 @@ def run(contestant):
         remove(output)
         if contestant.needs_directory:
             output.mkdir()
-    finished = subprocess.run([sys.executable, "-I", "-S", STOPWATCH, *contestant.command], env=ENVIRONMENT,
-                              stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, check=True)
-    seconds, processor_seconds, peak, status = finished.stdout.split()
+    stopwatch = subprocess.Popen([sys.executable, "-I", "-S", STOPWATCH, *contestant.command], env=ENVIRONMENT,
+                                 stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, start_new_session=True)
+    try:
+        seconds, processor_seconds, peak, status = stopwatch.communicate(timeout=LONGEST_RUN)[0].split()
+    except subprocess.TimeoutExpired:
+        raise Failure(f"{contestant.name}: {contestant.command[0]} did not end within {LONGEST_RUN} seconds") from None
+    finally:
+        if stopwatch.poll() is None:
+            os.killpg(stopwatch.pid, signal.SIGKILL)  # the program, too
+            stopwatch.wait()
     if int(status) != 0:
         raise Failure(f"{contestant.name}: {contestant.command[0]} ended with {int(status)}")
     return Run(float(seconds), float(processor_seconds), int(peak))

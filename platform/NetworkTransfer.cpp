@@ -7,6 +7,7 @@
 #include <utility>
 #include <vector>
 
+#include "platform/PerThread.h"
 #include "platform/TransferLibrary.h"
 
 namespace platform {
@@ -60,13 +61,10 @@ ErrorRecord transferError(TransferErrorCode code, std::string description) {
 /// The connections of one thread, and its transfers that are running.
 class NetworkTransfer::Connections {
  public:
-  static Connections& ofThisThread() {
-    thread_local Connections connections;
-    return connections;
-  }
+  static Connections& ofThisThread() { return PerThread<Connections>::value(); }
 
   CURLcode add(NetworkTransfer& transfer) {
-    if (!handle_) return CURLE_FAILED_INIT;
+    if (!handle_) return libraryState() == CURLE_OK ? CURLE_OUT_OF_MEMORY : libraryState();
     running_.push_back(&transfer);
     const CURLMcode code = library().multiAddHandle(handle_.get(), transfer.handle_.get());
     return code == CURLM_OK ? CURLE_OK : CURLE_OUT_OF_MEMORY;
@@ -103,10 +101,12 @@ class NetworkTransfer::Connections {
   };
 
   // What the library sets up once costs milliseconds, which only a run with transfers pays.
-  static CURLM* newHandle() {
-    static const CURLcode libraryState = library().globalInit(CURL_GLOBAL_DEFAULT);
-    return libraryState == CURLE_OK ? library().multiInit() : nullptr;
+  static CURLcode libraryState() {
+    static const CURLcode state = library().globalInit(CURL_GLOBAL_DEFAULT);
+    return state;
   }
+
+  static CURLM* newHandle() { return libraryState() == CURLE_OK ? library().multiInit() : nullptr; }
 
   std::unique_ptr<CURLM, Closer> handle_{newHandle()};
   std::vector<NetworkTransfer*> running_;

@@ -49,7 +49,11 @@ std::string hiddenName() {
 /// The lock says that the file's owner lives. Without waiting; false with EWOULDBLOCK when another
 /// open file holds it, with other codes where the file system knows no locks.
 bool lock(int descriptor) {
-  return ::flock(descriptor, LOCK_EX | LOCK_NB) == 0;
+  int result = -1;
+  do {
+    result = ::flock(descriptor, LOCK_EX | LOCK_NB);
+  } while (result != 0 && errno == EINTR);
+  return result == 0;
 }
 
 bool isNamed(int descriptor, const std::string& path) {
@@ -117,7 +121,8 @@ class TemporaryFile::Registry {
     }
     for (const int signal : kEndingSignals) {
       struct sigaction current {};
-      if (::sigaction(signal, nullptr, &current) == 0 && current.sa_handler == SIG_DFL) {
+      ::sigaction(signal, nullptr, &current);
+      if (current.sa_handler == SIG_DFL) {
         ::sigaction(signal, &action, nullptr);
       }
     }
@@ -125,14 +130,14 @@ class TemporaryFile::Registry {
 
   static void add(TemporaryFile& file, const Hold&) { file.next_ = std::exchange(first_, &file); }
 
+  /// The file has been added and not been removed since.
   static void remove(TemporaryFile& file) {
     const Hold hold;
-    for (TemporaryFile** link = &first_; *link != nullptr; link = &(*link)->next_) {
-      if (*link == &file) {
-        *link = std::exchange(file.next_, nullptr);
-        return;
-      }
+    TemporaryFile** link = &first_;
+    while (*link != &file) {
+      link = &(*link)->next_;
     }
+    *link = std::exchange(file.next_, nullptr);
   }
 
  private:

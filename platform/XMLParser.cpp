@@ -24,11 +24,13 @@ constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 constexpr std::string_view kWhitespace = " \t\r\n";
 constexpr std::string_view kDeclarationStart = "<?xml";
 
-// The library takes its input in ints, copies it into a buffer that it grows by doubling, and scans
-// a tag that a piece cuts anew with the next one. Pieces of this size bound the buffer, and are so
-// few that the scanning stays linear. Most documents are one piece, which spares the library's
-// counting of lines, too.
+// The library takes its input in ints and copies it into a buffer that it grows by doubling, which
+// pieces of this size bound. A tag that a piece cuts is scanned anew with the next one, which is
+// therefore as large as what waits, so that the scanning stays linear. Most documents are one
+// piece, which spares the library's counting of lines, too.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
+// The library can double its buffer as long as what waits and the next piece stay below 1 GiB.
+constexpr std::size_t kWaitingLimit = (std::size_t{1} << 30) - kPieceSize;
 
 // What declarations can add to a document. The library recurses once for each entity inside an
 // entity, compares each attribute that is declared with all of its element's, and goes through
@@ -233,11 +235,12 @@ struct XMLParser::Run {
                                XML_FALSE) == XML_STATUS_OK;
     bool isLast = false;
     while (succeeded && !isLast) {
-      const std::size_t size = std::min(document.size() - next, kPieceSize);
+      const std::size_t size = std::min(document.size() - next, nextPieceSize());
       void* buffer = XML_GetBuffer(handle.get(), static_cast<int>(size));
       if (buffer == nullptr) return false;
       document.copy(static_cast<char*>(buffer), size, next);
       next += size;
+      given += size;
       isLast = next == document.size();
       // The library has its own copy of the rest: what is read from it needs the room.
       if (isLast) std::string().swap(document);
@@ -245,6 +248,14 @@ struct XMLParser::Run {
                   XML_STATUS_OK;
     }
     return succeeded;
+  }
+
+  std::size_t nextPieceSize() const {
+    const XML_Index understood = XML_GetCurrentByteIndex(handle.get());
+    if (understood < 0) return kPieceSize;
+    const std::size_t waiting = given - std::min(given, static_cast<std::size_t>(understood));
+    const std::size_t room = kWaitingLimit - std::min(kWaitingLimit, waiting);
+    return std::max(kPieceSize, std::min(waiting, room));
   }
 
   std::string position() const {
@@ -347,9 +358,10 @@ struct XMLParser::Run {
   }
 
   XMLParser& owner;
-  std::string document;  // emptied once the library has all of it
-  std::size_t next = 0;  // where in the document the next piece begins
-  Position origin;       // of the library's first character, behind white space that is skipped
+  std::string document;                  // emptied once the library has all of it
+  std::size_t next = 0;                  // where in the document the next piece begins
+  std::size_t given = kUTF8Mark.size();  // the bytes that the library has
+  Position origin;  // of the library's first character, behind white space that is skipped
   std::unique_ptr<std::remove_pointer_t<XML_Parser>, ParserFreer> handle;
   std::exception_ptr thrown;     // by an event
   bool hasDeclarations = false;  // of entities or of attributes

@@ -10,6 +10,7 @@ import unittest
 import urllib.request
 import xml.etree.ElementTree as ElementTree
 from pathlib import Path
+from unittest import mock
 
 from support import ToolTestCase, environment, tool
 
@@ -21,6 +22,7 @@ sys.path.insert(0, str(BENCH))
 import chart  # noqa: E402
 import figures  # noqa: E402
 import inputs  # noqa: E402
+import measuring  # noqa: E402
 import media_server  # noqa: E402
 
 SVG = "{http://www.w3.org/2000/svg}"
@@ -36,7 +38,7 @@ def timed(limit, ours, theirs, work="work"):
 MISSING = {"work": "absent work", "against": "`xmllint`", "limit": 1.5, "missing": "xmllint"}
 SAMPLE = {
     "judged": True,
-    "machine": {"cores": 2, "memory": 8 << 30, "system": "Linux x86_64"},
+    "machine": {"cores": 2, "memory": 8 << 30, "virtual": True, "system": "Linux x86_64"},
     "rivals": {"curl": "7.88.1", "xmllint": None},
     "smallest peak": 8_000_000,
     "rows": [
@@ -166,7 +168,8 @@ class ReportTest(ToolTestCase):
         document = (root / "docs/performance.md").read_text(encoding="utf-8")
         self.assertTrue(document.startswith("# Speed\n") and document.endswith("\n\nend\n"), document)
         self.assertIn("| slow work | `rival` | 3.00 | 2 | missed by 50 % |\n", document)
-        self.assertIn("2 cores and 8 GiB of memory, against curl 7.88.1.", document)
+        self.assertIn("Measured on a virtual machine with 2 cores and 8 GiB of memory (Linux x86_64), against curl "
+                      "7.88.1.\n", document)
         self.assertNotIn("old", document)
         ElementTree.parse(root / "docs/performance.svg")
 
@@ -226,6 +229,11 @@ class BenchTest(ToolTestCase):
         self.assertEqual((finished.returncode, finished.stdout), (1, ""))
         self.assertIn("bench: parsefeed: ", finished.stderr)
         self.assertIn(" ended with 1\n", finished.stderr)
+
+    def test_a_program_that_does_not_end_is_ended(self):
+        with mock.patch.object(measuring, "LONGEST_RUN", 1), self.assertRaises(measuring.Failure) as caught:
+            measuring.run(measuring.Contestant("endless", ["/bin/sh", "-c", "sleep 60"]))
+        self.assertRegex(str(caught.exception), "^endless: /bin/sh did not end within 1 seconds$")
 
     def test_a_contest_that_does_not_exist_is_refused(self):
         finished = self.bench("fed")
