@@ -186,8 +186,8 @@ class RandomMomentTest(InterruptionTestCase):
                     self.assertIn(process.returncode, (0, -number))
                     judge(number if process.returncode else None)
                     ended += process.returncode != 0
-        print(f"{self._testMethodName}, {arguments[0]} of {os.path.basename(arguments[1])}: {self.TURNS * len(self.SIGNALS)} signals, of which "
-              f"{ended} ended it", flush=True)
+        print(f"{self._testMethodName}, {arguments[0]} of {os.path.basename(arguments[1])}: "
+              f"{self.TURNS * len(self.SIGNALS)} signals, of which {ended} ended it", flush=True)
 
     def assertFileIsWritten(self, command, source):
         expected = self.run_tool(command, source).stdout
