@@ -84,7 +84,9 @@ bool BinaryPropertyListReader::readTrailer() {
     return malformed("a binary property list with a malformed trailer");
   tableOffset_ = tableOffset;
 
-  if (!spend(objectCount_ * sizeof(Text))) return false;
+  // There are no more objects than bytes, so this is always there.
+  static_assert(sizeof(Text) <= kMemoryPerByte);
+  memoryLeft_ -= objectCount_ * sizeof(Text);
   texts_.resize(objectCount_);
   isOpen_.resize(objectCount_);
   return readObject(root);
@@ -286,7 +288,8 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
 
 bool BinaryPropertyListReader::holds(const Object& object, std::uint64_t count,
                                      std::size_t width) const {
-  return object.content <= tableOffset_ && count <= (tableOffset_ - object.content) / width;
+  // The content of an object begins at the end of the objects at most.
+  return count <= (tableOffset_ - object.content) / width;
 }
 
 std::uint64_t BinaryPropertyListReader::unsignedAt(std::size_t offset, std::size_t width) const {

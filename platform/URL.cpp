@@ -177,7 +177,13 @@ std::optional<std::string> hostInASCII(std::string_view host) {
                              ascii.data(), static_cast<std::int32_t>(ascii.size()), &info, &status);
   requireICUMemory();
   if (U_FAILURE(status) != 0 || info.errors != 0) return std::nullopt;
-  return std::string(ascii.data(), static_cast<std::size_t>(length));
+  // Some characters become ASCII ones: a full-width "/" would end the host where the text goes on.
+  const std::string_view name(ascii.data(), static_cast<std::size_t>(length));
+  const bool isWholeHost =
+      hasAcceptableCharacters(name) && name.find_first_of(":/?#[]@") == std::string_view::npos &&
+      std::count(name.begin(), name.end(), '%') == std::count(host.begin(), host.end(), '%');
+  if (!isWholeHost) return std::nullopt;
+  return std::string(name);
 }
 
 std::string nonASCIIEncoded(std::string_view text) {

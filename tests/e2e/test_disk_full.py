@@ -8,6 +8,7 @@ import signal
 import unittest
 
 from bundle_support import BundleTestCase, contents, notices
+from support import counting_from_start
 
 LIMIT = 8192
 LARGE = b"0123456789abcdef" * 1024
@@ -21,7 +22,7 @@ def limited():
 
 class FullDiskTest(BundleTestCase):
     def create(self, podcast, *arguments, **options):
-        return super().create(podcast, *arguments, preexec_fn=limited, **options)
+        return super().create(podcast, *arguments, env=counting_from_start(), preexec_fn=limited, **options)
 
     def assertSkips(self, location):
         """The run leaves out the episode, and nothing of it; those around it are there."""
@@ -98,7 +99,8 @@ class FullDiskTest(BundleTestCase):
             limited()
             signal.signal(signal.SIGXFSZ, signal.SIG_DFL)  # Python ignores it
         source = self.reference({"Episodes": [{"EpisodeReference": self.media("a.mp3", LARGE)}]})
-        self.assertWarns(super().create(source, preexec_fn=prepare), 'Could not save or download episode "(null)"')
+        self.assertWarns(super().create(source, env=counting_from_start(), preexec_fn=prepare),
+                         'Could not save or download episode "(null)"')
 
 
 if __name__ == "__main__":
