@@ -321,10 +321,6 @@ class BundleFaultTest(Sweep):
         added = contents(self.root).items() - self.before.items()
         return self.assertLessEqual(added, {("sub", None)}, run)
 
-    def leftovers(self):
-        """The leftovers of an earlier run that are still there."""
-        return {path for path in (LEFTOVER, f"Posters/{LEFTOVER}") if (self.bundle / path).exists()}
-
     def prepare(self, locate, source=None):
         """A server of runs for a source, the show's reference file by default; a run without faults is judged."""
         if source is None:
