@@ -84,7 +84,7 @@ unsigned long AllocationFaults::end() {
 }
 
 // The C library's own functions under their second names: looking up the first ones would allocate.
-// NOLINTBEGIN(bugprone-reserved-identifier,readability-identifier-naming)
+// NOLINTBEGIN(bugprone-reserved-identifier,readability-*)
 extern "C" {
 void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
@@ -120,4 +120,4 @@ __attribute__((visibility("default"))) int posix_memalign(void** block, std::siz
   return 0;
 }
 }
-// NOLINTEND(bugprone-reserved-identifier,readability-identifier-naming)
+// NOLINTEND(bugprone-reserved-identifier,readability-*)
