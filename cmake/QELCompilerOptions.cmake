@@ -16,3 +16,9 @@ if(QEL_SANITIZE)
   target_compile_options(qel_options INTERFACE $<$<CXX_COMPILER_ID:GNU>:-Wno-maybe-uninitialized>)
   target_link_options(qel_options INTERFACE -fsanitize=${QEL_SANITIZE})
 endif()
+
+# Coverage for the fuzzer; its own main is linked into the fuzz targets alone.
+if(QEL_BUILD_FUZZERS)
+  target_compile_options(qel_options INTERFACE -fsanitize=fuzzer-no-link)
+  target_link_options(qel_options INTERFACE -fsanitize=fuzzer-no-link)
+endif()

@@ -4,6 +4,7 @@
 #include <unicode/locid.h>
 #include <unicode/simpletz.h>
 #include <unicode/smpdtfmt.h>
+#include <unicode/uloc.h>
 #include <unicode/unistr.h>
 
 #include <algorithm>
@@ -28,6 +29,16 @@ std::string_view localeVariable() {
   return {};
 }
 
+/// By the names of the locales that there is data for: to have ICU make them all would take longer
+/// than to write hundreds of dates.
+bool isKnownLanguage(std::string_view language) {
+  for (std::int32_t index = uloc_countAvailable(); index > 0; --index) {
+    const std::string_view name = uloc_getAvailable(index - 1);
+    if (name.substr(0, name.find('_')) == language) return true;
+  }
+  return false;
+}
+
 /// The locale that POSIX names language_TERRITORY.codeset@modifier.
 icu::Locale locale(std::string_view name) {
   const std::string_view modifier = name.substr(std::min(name.find('@'), name.size()));
@@ -40,12 +51,7 @@ icu::Locale locale(std::string_view name) {
 
   // What ICU makes of a language that it has no data for depends on still other settings.
   const icu::Locale named(id.c_str());
-  std::int32_t count = 0;
-  const icu::Locale* available = icu::Locale::getAvailableLocales(count);
-  const bool isKnown = std::any_of(available, available + count, [&](const icu::Locale& known) {
-    return std::string_view(known.getLanguage()) == named.getLanguage();
-  });
-  return isKnown ? named : icu::Locale("en_US_POSIX");
+  return isKnownLanguage(named.getLanguage()) ? named : icu::Locale("en_US_POSIX");
 }
 
 }  // namespace

@@ -3,7 +3,6 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <csignal>
 #include <initializer_list>
 
@@ -14,7 +13,7 @@ void prepareProcess() {
   std::signal(SIGXFSZ, SIG_IGN);
   for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     // Those below it are open, so that the lowest free one, which open gives, is this one.
-    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) {
+    if (::fcntl(descriptor, F_GETFD) < 0) {
       ::open("/dev/null", O_RDWR);
     }
   }

@@ -125,7 +125,8 @@ class TemporaryFile::Registry {
     }
     for (const int signal : kEndingSignals) {
       struct sigaction current {};
-      if (::sigaction(signal, nullptr, &current) == 0 && current.sa_handler == SIG_DFL) {
+      ::sigaction(signal, nullptr, &current);
+      if (current.sa_handler == SIG_DFL) {
         ::sigaction(signal, &action, nullptr);
       }
     }
@@ -133,14 +134,14 @@ class TemporaryFile::Registry {
 
   static void add(TemporaryFile& file, const Hold&) { file.next_ = std::exchange(first_, &file); }
 
+  /// The file has been added and not been removed since.
   static void remove(TemporaryFile& file) {
     const Hold hold;
-    for (TemporaryFile** link = &first_; *link != nullptr; link = &(*link)->next_) {
-      if (*link == &file) {
-        *link = std::exchange(file.next_, nullptr);
-        return;
-      }
+    TemporaryFile** link = &first_;
+    while (*link != &file) {
+      link = &(*link)->next_;
     }
+    *link = std::exchange(file.next_, nullptr);
   }
 
  private:

@@ -83,7 +83,7 @@ std::optional<std::string> canonicalEncodingName(std::string_view encoding) {
   return usingICU([&]() -> std::optional<std::string> {
     UErrorCode status = U_ZERO_ERROR;
     const char* const name = ucnv_getAlias(std::string(encoding).c_str(), 0, &status);
-    if (U_FAILURE(status) != 0 || name == nullptr) return std::nullopt;
+    if (name == nullptr) return std::nullopt;
     return name;
   });
 }

@@ -68,7 +68,8 @@ class CLibraryRules final : public TimeZone::Rules {
   static std::int64_t offset(std::chrono::seconds sinceEpoch) {
     const time_t time = sinceEpoch.count();
     struct tm fields {};
-    return localtime_r(&time, &fields) != nullptr ? fields.tm_gmtoff : 0;
+    localtime_r(&time, &fields);  // the years of every PointInTime are within those of struct tm
+    return fields.tm_gmtoff;
   }
 };
 
@@ -81,9 +82,7 @@ SharedRules newDatabaseRules(std::string_view name) {
   UBool isInDatabase = 0;
   UErrorCode status = U_ZERO_ERROR;
   icu::TimeZone::getCanonicalID(id, canonicalID, isInDatabase, status);
-  if (U_FAILURE(status) != 0 || isInDatabase == 0 || canonicalID == UCAL_UNKNOWN_ZONE_ID) {
-    return nullptr;
-  }
+  if (U_FAILURE(status) != 0 || isInDatabase == 0) return nullptr;
   return std::make_shared<const DatabaseRules>(
       std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id)));
 }

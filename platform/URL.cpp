@@ -1,6 +1,5 @@
 #include "platform/URL.h"
 
-#include <curl/curl.h>
 #include <unicode/uidna.h>
 #include <unicode/utf8.h>
 
@@ -12,6 +11,7 @@
 #include <new>
 
 #include "platform/ICUMemory.h"
+#include "platform/TransferLibrary.h"
 
 namespace platform {
 namespace {
@@ -177,7 +177,13 @@ std::optional<std::string> hostInASCII(std::string_view host) {
                              ascii.data(), static_cast<std::int32_t>(ascii.size()), &info, &status);
   requireICUMemory();
   if (U_FAILURE(status) != 0 || info.errors != 0) return std::nullopt;
-  return std::string(ascii.data(), static_cast<std::size_t>(length));
+  // Some characters become ASCII ones: a full-width "/" would end the host where the text goes on.
+  const std::string_view name(ascii.data(), static_cast<std::size_t>(length));
+  const bool isWholeHost =
+      hasAcceptableCharacters(name) && name.find_first_of(":/?#[]@") == std::string_view::npos &&
+      std::count(name.begin(), name.end(), '%') == std::count(host.begin(), host.end(), '%');
+  if (!isWholeHost) return std::nullopt;
+  return std::string(name);
 }
 
 std::string nonASCIIEncoded(std::string_view text) {
@@ -194,9 +200,12 @@ std::string nonASCIIEncoded(std::string_view text) {
 }
 
 bool isAcceptedByTransferLibrary(const std::string& encodedText) {
-  const std::unique_ptr<CURLU, decltype(&curl_url_cleanup)> handle(curl_url(), &curl_url_cleanup);
+  const TransferLibrary* const library = TransferLibrary::functions();
+  if (library == nullptr) return true;  // the transfer will tell what is wrong
+  const std::unique_ptr<CURLU, decltype(library->urlCleanup)> handle(library->url(),
+                                                                     library->urlCleanup);
   if (handle == nullptr) throw std::bad_alloc();
-  const CURLUcode result = curl_url_set(handle.get(), CURLUPART_URL, encodedText.c_str(), 0);
+  const CURLUcode result = library->urlSet(handle.get(), CURLUPART_URL, encodedText.c_str(), 0);
   if (result == CURLUE_OUT_OF_MEMORY) throw std::bad_alloc();
   return result == CURLUE_OK;
 }

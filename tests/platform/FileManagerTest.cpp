@@ -12,11 +12,13 @@
 #include <array>
 #include <cerrno>
 #include <filesystem>
+#include <functional>
 #include <utility>
 #include <vector>
 
 #include "platform/FileDescriptor.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/InterposedCalls.h"
 #include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -237,6 +239,44 @@ TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
               0);
     EXPECT_EQ(contentOf(copy), content);
   }
+}
+
+TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
+  const std::string source = directory_.addFile("source", "content");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              if (!refuseSystemCall(SYS_read, EIO)) {
+                return 1;
+              }
+              return copyFile(source, directory_ / "copy") ? 2 : 0;
+            }),
+            0);
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
+}
+
+TEST_F(FileManagerTest, WholeReadTellsWhyItFailed) {
+  const std::string path = directory_.addFile("file", "content");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              if (!refuseSystemCall(SYS_read, EIO)) {
+                return 1;
+              }
+              ErrorSlot error;
+              if (readWholeFile(path, error)) {
+                return 2;
+              }
+              return error == ErrorRecord{"POSIX", EIO, "Input/output error"} ? 0 : 3;
+            }),
+            0);
+}
+
+TEST_F(FileManagerTest, DirectoryThatAnotherProcessMakesFirstIsAccepted) {
+  const Interposed quicker(&InterposedCalls::mkdir,
+                           std::function([](const char* path, mode_t mode) {
+                             ::syscall(SYS_mkdir, path, mode);
+                             return static_cast<int>(::syscall(SYS_mkdir, path, mode));
+                           }));
+  EXPECT_TRUE(createDirectories(directory_ / "a/b/c", error_));
+  EXPECT_EQ(error_, std::nullopt);
+  EXPECT_TRUE(std::filesystem::is_directory(directory_ / "a/b/c"));
 }
 
 TEST_F(FileManagerTest, CopyRefusesAnExistingDestination) {

@@ -5,9 +5,11 @@
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <csignal>
 #include <cstdio>
 #include <functional>
@@ -15,6 +17,7 @@
 
 #include "platform/FileDescriptor.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace platform {
@@ -110,6 +113,20 @@ TEST_F(StandardStreamsTest, UnreadableStandardInputIsEmpty) {
               }
               ::close(STDIN_FILENO);
               return readStandardInput().empty() ? 0 : 2;
+            }),
+            0);
+}
+
+TEST_F(StandardStreamsTest, StandardInputThatCannotBeWaitedForIsItsEnd) {
+  const Connection pipe = makePipe();
+  makeNonBlocking(pipe.readEnd);
+  ASSERT_TRUE(writeAll(pipe.writeEnd.get(), "first"));
+  EXPECT_EQ(exitStatusOfChild([&] {
+              ::dup2(pipe.readEnd.get(), STDIN_FILENO);
+              if (!refuseSystemCall(SYS_poll, ENOMEM)) {
+                return 1;
+              }
+              return readStandardInput() == "first" ? 0 : 2;
             }),
             0);
 }
