@@ -179,6 +179,7 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
     error = posixError(destination.empty() ? ENOENT : EINVAL);
     return false;
   }
+  destination_ = destination;  // before there is a file: memory may run out here
   Registry::handleSignals();
   int failure = EEXIST;
   for (int attempt = 0; attempt < kCreationAttempts && failure == EEXIST; ++attempt) {
@@ -204,7 +205,6 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
     }
     descriptor_ = std::move(file);
     path_ = std::move(path);
-    destination_ = destination;
     Registry::add(*this, hold);
     return true;
   }

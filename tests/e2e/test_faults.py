@@ -44,7 +44,7 @@ def table(*parts):
 # What is not told apart: the C library's care for the standard streams. What is lost of the progress lines or
 # of an output is lost without a word, as everywhere.
 STREAMS = """
-    fcntl ioctl    <std*>            done
+    ioctl          <std*>            done
     write          <stdout>          unsaid
 """
 
