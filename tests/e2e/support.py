@@ -90,7 +90,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     env = dict(env or {})
     shell = ['exec "$0" "$@"', *(_CLOSING[descriptor] for descriptor in closed)]
     if memory_limit is not None:
-        if _is_sanitized():
+        if is_sanitized():
             env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
         else:
             shell.insert(0, f"ulimit -v {memory_limit >> 10} &&")
@@ -102,7 +102,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
 
 
-def _is_sanitized():
+def is_sanitized():
     """Whether the executable has its own idea of the address space, which a limit would break."""
     return b"__asan_init" in Path(tool()).read_bytes()
 
