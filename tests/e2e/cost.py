@@ -347,15 +347,14 @@ def start_cost():
 
 
 def growth_of(family, start, is_large=False):
-    runs = 1 if is_large else 3
     smallest = _LARGE if is_large else _SMALLEST
 
-    def measured(size):
+    def measured(size, runs=1 if is_large else 3):
         size, costs = family.costs(size, runs)
         seconds = max(min(cost.seconds for cost in costs) - start.seconds, 0.001)
         return size, seconds, max(costs[-1].memory - start.memory, 0)
 
-    while measured(smallest)[1] < _SHORTEST and smallest < _LARGEST:
+    while measured(smallest, runs=1)[1] < _SHORTEST and smallest < _LARGEST:
         smallest *= 2
     rows = [measured(smallest << doubling) for doubling in range(4)]
     return Growth(rows[-1][0], [seconds for _, seconds, _ in rows], rows[-1][2])
