@@ -67,15 +67,18 @@ def environment(changes=None):
 
 @functools.cache
 def counting_from_start():
-    """Changes to the environment of a run that cannot write a file at its end as it likes: past a limit, say.
+    """Changes to the environment of a run that cannot write a file at its end: past a limit, as another user.
 
     Where coverage is measured, such a run counts into a file that is there from its start; nothing else changes.
     """
     name = os.environ.get("LLVM_PROFILE_FILE")
     if not name:
         return {}
-    changes = {"LLVM_PROFILE_FILE": str(Path(name).parent / f"{os.getpid()}-%c%m.profraw")}
+    folder = Path(name).parent
+    changes = {"LLVM_PROFILE_FILE": str(folder / f"{os.getpid()}-%c%m.profraw")}
     run(env=changes)  # makes the file, whole
+    for file in folder.glob(f"{os.getpid()}-*"):
+        file.chmod(0o666)
     return changes
 
 
@@ -128,7 +131,8 @@ def unprivileged(directory):
     if os.geteuid() != 0:
         return ()
     nobody = 65534
-    prefix = ("setpriv", f"--reuid={nobody}", f"--regid={nobody}", "--clear-groups")
+    counting = (f"{name}={value}" for name, value in counting_from_start().items())
+    prefix = ("env", *counting, "setpriv", f"--reuid={nobody}", f"--regid={nobody}", "--clear-groups")
     tried = shutil.which("setpriv") and subprocess.run(
         [*prefix, tool(), "unknown"], stdin=subprocess.DEVNULL, capture_output=True, check=False).returncode == 1
     if not tried:

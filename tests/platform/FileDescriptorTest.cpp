@@ -112,12 +112,30 @@ TEST(FileDescriptorTest, ReadingGoesOnAfterASignal) {
   EXPECT_EQ(std::string(buffer.data(), 2), "ab");
 }
 
-TEST(FileDescriptorTest, WaitingToWriteGoesOnAfterASignal) {
-  const Pipe pipe;
-  ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, O_NONBLOCK), 0);
+/// Fills the pipe, whose writing end is then blocking or not.
+void fill(const Pipe& pipe, bool isBlocking) {
+  const int flags = ::fcntl(pipe.writeEnd.get(), F_GETFL);
+  ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, flags | O_NONBLOCK), 0);
   const std::array<char, 4096> page{};
   while (::write(pipe.writeEnd.get(), page.data(), page.size()) > 0) {
   }
+  if (isBlocking) ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, flags), 0);
+}
+
+TEST(FileDescriptorTest, WritingGoesOnAfterASignal) {
+  const Pipe pipe;
+  fill(pipe, true);
+  handlersDescriptor = pipe.readEnd.get();
+  const Interruption interruption([](int) {
+    std::array<char, 8192> drained;
+    if (::read(handlersDescriptor, drained.data(), drained.size()) <= 0) ::_exit(1);
+  });
+  EXPECT_TRUE(writeAll(pipe.writeEnd.get(), std::string(4096, 'x')));
+}
+
+TEST(FileDescriptorTest, WaitingToWriteGoesOnAfterASignal) {
+  const Pipe pipe;
+  fill(pipe, false);
   handlersDescriptor = pipe.readEnd.get();
   const Interruption interruption([](int) {
     std::array<char, 8192> drained;

@@ -241,6 +241,27 @@ TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
   }
 }
 
+TEST_F(FileManagerTest, CopyGoesOnAfterASignal) {
+  int calls = 0;
+  const Interposed signals(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    errno = ++calls == 1 ? EINTR : EXDEV;
+    return ssize_t{-1};
+  }));
+  EXPECT_TRUE(copyFile(directory_.addFile("source", "content"), directory_ / "copy"));
+  EXPECT_EQ(calls, 2);
+  EXPECT_EQ(contentOf(directory_ / "copy"), "content");
+}
+
+TEST_F(FileManagerTest, CopyLeavesAloneWhatAppearsMeanwhile) {
+  const Interposed others(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    directory_.addFile("copy", "of another process");
+    return ssize_t{0};
+  }));
+  EXPECT_FALSE(copyFile(directory_.addFile("source", "content"), directory_ / "copy"));
+  EXPECT_EQ(contentOf(directory_ / "copy"), "of another process");
+  EXPECT_THAT(directory_.names(), ElementsAre("copy", "source"));
+}
+
 TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
   const std::string source = directory_.addFile("source", "content");
   EXPECT_EQ(exitStatusOfChild([&] {
@@ -271,8 +292,8 @@ TEST_F(FileManagerTest, WholeReadTellsWhyItFailed) {
 TEST_F(FileManagerTest, DirectoryThatAnotherProcessMakesFirstIsAccepted) {
   const Interposed quicker(&InterposedCalls::mkdir,
                            std::function([](const char* path, mode_t mode) {
-                             ::syscall(SYS_mkdir, path, mode);
-                             return static_cast<int>(::syscall(SYS_mkdir, path, mode));
+                             ::mkdirat(AT_FDCWD, path, mode);
+                             return ::mkdirat(AT_FDCWD, path, mode);
                            }));
   EXPECT_TRUE(createDirectories(directory_ / "a/b/c", error_));
   EXPECT_EQ(error_, std::nullopt);

@@ -1,7 +1,6 @@
 #include "tests/support/InterposedCalls.h"
 
-#include <sys/file.h>
-#include <sys/stat.h>
+#include <fcntl.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -13,10 +12,23 @@ InterposedCalls& interposedCalls() {
 // The linker takes these for those of the C library.
 extern "C" {
 
+ssize_t copy_file_range(int source, off_t* sourceOffset, int target, off_t* targetOffset,
+                        std::size_t length, unsigned flags) {
+  const auto& answer = interposedCalls().copy_file_range;
+  return answer ? answer(length)
+                : ::syscall(SYS_copy_file_range, source, sourceOffset, target, targetOffset, length,
+                            flags);
+}
+
 int flock(int descriptor, int operation) noexcept {
   const auto& answer = interposedCalls().flock;
   return answer ? answer(descriptor, operation)
                 : static_cast<int>(::syscall(SYS_flock, descriptor, operation));
+}
+
+int fstat(int descriptor, struct stat* status) noexcept {
+  const auto& answer = interposedCalls().fstat;
+  return answer ? answer(descriptor, status) : ::fstatat(descriptor, "", status, AT_EMPTY_PATH);
 }
 
 int getentropy(void* buffer, std::size_t length) {
@@ -27,7 +39,12 @@ int getentropy(void* buffer, std::size_t length) {
 
 int mkdir(const char* path, mode_t mode) noexcept {
   const auto& answer = interposedCalls().mkdir;
-  return answer ? answer(path, mode) : static_cast<int>(::syscall(SYS_mkdir, path, mode));
+  return answer ? answer(path, mode) : ::mkdirat(AT_FDCWD, path, mode);
+}
+
+int stat(const char* path, struct stat* status) noexcept {
+  const auto& answer = interposedCalls().stat;
+  return answer ? answer(path, status) : ::fstatat(AT_FDCWD, path, status, 0);
 }
 
 }  // extern "C"

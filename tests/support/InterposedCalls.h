@@ -1,5 +1,6 @@
 #pragma once
 
+#include <sys/stat.h>
 #include <sys/types.h>
 
 #include <cstddef>
@@ -11,9 +12,12 @@
 ///
 /// A function that is set answers as the call does, errno included. To be called by one thread.
 struct InterposedCalls {
+  std::function<ssize_t(std::size_t length)> copy_file_range;
   std::function<int(int descriptor, int operation)> flock;
   std::function<int(void* buffer, std::size_t length)> getentropy;
+  std::function<int(int descriptor, struct stat* status)> fstat;
   std::function<int(const char* path, mode_t mode)> mkdir;
+  std::function<int(const char* path, struct stat* status)> stat;
 };
 
 /// Those that are in force. A test that sets one empties it again.
