@@ -77,6 +77,11 @@ PropertyListDictionary::const_iterator PropertyListDictionary::end() const {
 }
 
 PropertyListDictionary::const_iterator PropertyListDictionary::find(std::string_view key) const {
+  // Among few entries most are told apart by the length of their keys, which is quicker than order.
+  constexpr std::size_t kFew = 16;
+  if (size() <= kFew) {
+    return std::find_if(begin(), end(), [key](const Entry& entry) { return entry.first == key; });
+  }
   const auto found = place(entries_, key);
   const bool isThere = found != entries_.end() && found->first == key;
   return isThere ? begin() + (found - entries_.begin()) : end();

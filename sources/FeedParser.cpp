@@ -30,6 +30,9 @@ const TextBearingElements& textBearingElements() {
   return elements;
 }
 
+/// Of the keys in the dictionary of an item, see the class.
+constexpr std::size_t kMostItemKeys = 14;
+
 /// The length of a uuid in its 8-4-4-4-12 form (RFC 4122), in characters.
 constexpr std::size_t kUuidLength = 36;
 
@@ -80,6 +83,7 @@ void FeedParser::didStartElement(const platform::XMLName& name,
   if (name.local == "item") {
     endItem();
     currentEpisode_ = &episodes_.emplace_back();
+    currentEpisode_->reserve(kMostItemKeys);
   } else if (name.local == "enclosure") {
     readEnclosure(attributes);
   } else if (name.local == "image") {
