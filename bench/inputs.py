@@ -114,7 +114,7 @@ def feed_items(count):
             uuid="-".join((uuid[:8], uuid[8:12], uuid[12:16], uuid[16:20], uuid[20:])),
             date=(newest - datetime.timedelta(hours=7 * (count - number))).strftime("%a, %d %b %Y %H:%M:%S ")
             + ZONES[number % len(ZONES)],
-            description=wrap(prose.paragraphs(source.randint(150, 715))),
+            description=wrap(prose.paragraphs(source.randint(150, 695))),
             notes=wrap(prose.paragraphs(source.randint(80, 460))),
             summary=prose.sentences(source.randint(60, 250)),
             keywords=",".join(source.choices(prose.words, k=4)),

@@ -6,6 +6,8 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 #include "cli/QELError.h"
 #include "cli/QELProgress.h"
@@ -55,6 +57,14 @@ bool succeeds(Step step, ErrorSlot& error) {
   }
 }
 
+/// Keeps what a run has made until the process ends. That gives all memory back at once; to destroy
+/// a long podcast record by record would take a tenth of the run.
+template <typename Object>
+Object& kept(std::unique_ptr<Object> object) {
+  static auto& objects = *new std::vector<std::unique_ptr<Object>>;
+  return *objects.emplace_back(std::move(object));
+}
+
 bool generate(QELPodcastGenerator& generator, QELPodcastSource& source, ErrorSlot& error) {
   return succeeds([&] { return generator.generateFromSource(source, error); }, error);
 }
@@ -69,14 +79,15 @@ int run(const QELArguments& arguments) {
   if (!QELValidateSource(arguments.source, arguments.readStandardInput)) {
     return fail("\"%s\" is not a valid podcast source.\n", {arguments.source});
   }
-  const std::unique_ptr<QELPodcastSource> source = arguments.readStandardInput
-                                                       ? initWithStandardInput()
-                                                       : initWithSourceString(*arguments.source);
-  if (!source) {
+  std::unique_ptr<QELPodcastSource> made = arguments.readStandardInput
+                                               ? initWithStandardInput()
+                                               : initWithSourceString(*arguments.source);
+  if (!made) {
     return fail("Could not initialize podcast source with string \"%s\".\n", {arguments.source});
   }
+  QELPodcastSource& source = kept(std::move(made));
 
-  return QELRunCommand(arguments, *source);
+  return QELRunCommand(arguments, source);
 }
 
 }  // namespace
@@ -103,16 +114,14 @@ int QELRunCommand(const QELArguments& arguments, QELPodcastSource& source) {
   }
 
   if (arguments.command == "createbundle") {
-    QELBundlePodcastGenerator generator;
-    return QELCreateBundle(arguments, source, generator);
+    return QELCreateBundle(arguments, source, kept(std::make_unique<QELBundlePodcastGenerator>()));
   }
   if (arguments.command == "createfeed") {
-    QELFeedPodcastGenerator generator;
-    return QELCreateFeed(arguments, source, generator);
+    return QELCreateFeed(arguments, source, kept(std::make_unique<QELFeedPodcastGenerator>()));
   }
   if (arguments.command == "parsefeed") {
-    QELReferenceFilePodcastGenerator generator;
-    return QELParseFeed(arguments, source, generator);
+    return QELParseFeed(arguments, source,
+                        kept(std::make_unique<QELReferenceFilePodcastGenerator>()));
   }
   return fail("No recognizable command was provided.\n");
 }

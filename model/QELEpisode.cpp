@@ -12,6 +12,7 @@ using platform::Dictionary;
 using platform::PointInTime;
 using platform::Text;
 using platform::textForKey;
+using platform::operator""_text;
 
 std::optional<PointInTime> dateForKey(const Dictionary& dictionary, std::string_view key) {
   const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);
@@ -102,29 +103,30 @@ void QELEpisode::initWithFeedDictionary(const Dictionary* dictionary) {
 
 Dictionary QELEpisode::dictionary() const {
   Dictionary dictionary;
-  const auto set = [&dictionary](std::string_view key, const auto& value) {
-    if (value) dictionary.emplace(key, *value);
+  // In the order of their keys, so that each goes to the end.
+  constexpr std::size_t kMostEntries = 15;
+  dictionary.reserve(kMostEntries);
+  const auto set = [&dictionary](const Text& key, const auto& value) {
+    if (value) dictionary.emplace_hint(dictionary.end(), key, *value);
   };
 
-  set("EpisodeUUID", uuid());
-  set("EpisodeName", title());
-  set("EpisodeAuthor", author());
-  set("EpisodeDate", date());
-  set("EpisodeKeywords", keywords());
-  set("EpisodeDescription", episodeDescription());
-  set("EpisodeCategory", category());
-  set("EpisodeAdvisoryLabel", advisoryLabel());
-  if (const std::int64_t order = orvaneOrder(); order >= 0) {
-    dictionary.emplace("EpisodeOrder", order);
-  }
-  set("EpisodeType", contentType());
-  if (const std::uint64_t length = contentLength(); length != 0) {
-    dictionary.emplace("EpisodeFileSize", length);
-  }
-  set("EpisodeReference", location());
-  set("EpisodeReferenceType", referenceType());
-  set("EpisodePosterReference", posterLocation());
-  set("EpisodePosterReferenceType", posterReferenceType());
+  set("EpisodeAdvisoryLabel"_text, advisoryLabel());
+  set("EpisodeAuthor"_text, author());
+  set("EpisodeCategory"_text, category());
+  set("EpisodeDate"_text, date());
+  set("EpisodeDescription"_text, episodeDescription());
+  const std::uint64_t length = contentLength();
+  set("EpisodeFileSize"_text, length != 0 ? std::optional(length) : std::nullopt);
+  set("EpisodeKeywords"_text, keywords());
+  set("EpisodeName"_text, title());
+  const std::int64_t order = orvaneOrder();
+  set("EpisodeOrder"_text, order >= 0 ? std::optional(order) : std::nullopt);
+  set("EpisodePosterReference"_text, posterLocation());
+  set("EpisodePosterReferenceType"_text, posterReferenceType());
+  set("EpisodeReference"_text, location());
+  set("EpisodeReferenceType"_text, referenceType());
+  set("EpisodeType"_text, contentType());
+  set("EpisodeUUID"_text, uuid());
   return dictionary;
 }
 

@@ -38,7 +38,7 @@ void QELAddPodcastKeys(std::span<const QELPodcastKey> keys, const QELPodcastSour
                        platform::Dictionary& dictionary) {
   for (const QELPodcastKey& field : keys) {
     if (const auto& value = (source.*field.value)()) {
-      dictionary.insert_or_assign(std::string(field.key), *value);
+      dictionary.insert_or_assign(field.key, *value);
     }
   }
 }

@@ -114,7 +114,7 @@ bool BinaryPropertyListReader::readKey(std::uint64_t number) {
   if (!object) return false;
   const auto key = text(number, *object);
   if (!key) return failAtObject(number, "is a key but no text");
-  builder_.setKey(key->string());
+  builder_.setKey(*key);
   return true;
 }
 

@@ -58,7 +58,7 @@ class Reserve {
 
 /// Never freed: ICU keeps what it has until the process ends.
 Reserve& reserve() {
-  static Reserve* const instance = new Reserve();
+  static auto* const instance = new Reserve();
   return *instance;
 }
 

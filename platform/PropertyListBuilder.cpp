@@ -14,10 +14,8 @@ void PropertyListBuilder::add(PropertyListValue value) {
     array->push_back(std::move(value));
     return;
   }
-  // Keys mostly come in sorted order, and each then goes to the end without a search.
-  auto& dictionary = std::get<PropertyListValue::Dictionary>(level.container);
-  dictionary.insert_or_assign(dictionary.end(), *std::exchange(level.key, std::nullopt),
-                              std::move(value));
+  std::get<Dictionary::Entries>(level.container)
+      .emplace_back(*std::exchange(level.key, std::nullopt), std::move(value));
 }
 
 void PropertyListBuilder::beginArray(std::size_t expectedCount) {
@@ -25,22 +23,25 @@ void PropertyListBuilder::beginArray(std::size_t expectedCount) {
 }
 
 void PropertyListBuilder::beginDictionary() {
-  levels_.emplace_back().container.emplace<PropertyListValue::Dictionary>();
+  levels_.emplace_back().container.emplace<Dictionary::Entries>();
 }
 
 void PropertyListBuilder::end() {
   Level level = std::move(levels_.back());
   levels_.pop_back();
-  std::visit([this](auto& container) { add(std::move(container)); }, level.container);
+  if (auto* array = std::get_if<PropertyListValue::Array>(&level.container)) {
+    add(std::move(*array));
+  } else {
+    add(Dictionary(std::move(std::get<Dictionary::Entries>(level.container))));
+  }
 }
 
-void PropertyListBuilder::setKey(std::string key) {
+void PropertyListBuilder::setKey(Text key) {
   levels_.back().key = std::move(key);
 }
 
 bool PropertyListBuilder::isInDictionary() const {
-  return !levels_.empty() &&
-         std::holds_alternative<PropertyListValue::Dictionary>(levels_.back().container);
+  return !levels_.empty() && std::holds_alternative<Dictionary::Entries>(levels_.back().container);
 }
 
 }  // namespace platform

@@ -2,7 +2,6 @@
 
 #include <cstddef>
 #include <optional>
-#include <string>
 #include <utility>
 #include <variant>
 #include <vector>
@@ -28,7 +27,7 @@ class PropertyListBuilder {
   void end();
 
   /// Sets the key of the next value; the innermost open container is a dictionary.
-  void setKey(std::string key);
+  void setKey(Text key);
 
   /// The number of open containers.
   std::size_t depth() const { return levels_.size(); }
@@ -42,8 +41,8 @@ class PropertyListBuilder {
 
  private:
   struct Level {
-    std::variant<PropertyListValue::Array, PropertyListValue::Dictionary> container;
-    std::optional<std::string> key;
+    std::variant<PropertyListValue::Array, PropertyListValue::Dictionary::Entries> container;
+    std::optional<Text> key;
   };
 
   std::vector<Level> levels_;

@@ -2,7 +2,6 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <map>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -10,6 +9,7 @@
 #include <vector>
 
 #include "platform/PointInTime.h"
+#include "platform/PropertyListDictionary.h"
 #include "platform/Text.h"
 
 namespace platform {
@@ -21,7 +21,7 @@ namespace platform {
 class PropertyListValue {
  public:
   using Array = std::vector<PropertyListValue>;
-  using Dictionary = std::map<std::string, PropertyListValue, std::less<>>;
+  using Dictionary = PropertyListDictionary;
   /// Uninterpreted bytes (the property list's "data"); distinct from text.
   struct Data {
     std::string bytes;

@@ -5,7 +5,6 @@
 #include <ostream>
 #include <string>
 #include <string_view>
-#include <utility>
 
 namespace platform {
 
@@ -19,22 +18,21 @@ class Text {
  public:
   /// The empty text.
   Text() = default;
-  Text(std::string value)
-      : value_(value.empty() ? nullptr : std::make_shared<const std::string>(std::move(value))) {}
-  Text(std::string_view value) : Text(std::string(value)) {}
-  Text(const char* value) : Text(std::string(value)) {}
+  Text(std::string_view value) : bytes_(copied(value)), size_(value.size()) {}
+  Text(const std::string& value) : Text(std::string_view(value)) {}
+  Text(const char* value) : Text(std::string_view(value)) {}
 
-  std::string_view view() const { return value_ ? std::string_view(*value_) : std::string_view(); }
+  std::string_view view() const { return {bytes_.get(), size_}; }
   /// A copy of the characters, for callers that go on to change them.
   std::string string() const { return std::string(view()); }
   operator std::string_view() const { return view(); }
 
-  bool empty() const { return !value_; }
+  bool empty() const { return size_ == 0; }
   /// The length in bytes.
-  std::size_t size() const { return view().size(); }
+  std::size_t size() const { return size_; }
 
   friend bool operator==(const Text& left, const Text& right) {
-    return left.value_ == right.value_ || left.view() == right.view();
+    return left.view() == right.view();
   }
   friend bool operator==(const Text& left, std::string_view right) { return left.view() == right; }
   friend bool operator==(const Text& left, const char* right) { return left.view() == right; }
@@ -46,7 +44,26 @@ class Text {
   }
 
  private:
-  std::shared_ptr<const std::string> value_;  // null for the empty text
+  friend Text operator""_text(const char* bytes, std::size_t size);
+
+  /// Counter and characters in one allocation: a podcast has hundreds of thousands of texts.
+  static std::shared_ptr<const char[]> copied(std::string_view value) {
+    if (value.empty()) return nullptr;
+    auto bytes = std::make_shared_for_overwrite<char[]>(value.size());
+    value.copy(bytes.get(), value.size());
+    return bytes;
+  }
+
+  std::shared_ptr<const char[]> bytes_;  // null for the empty text
+  std::size_t size_ = 0;
 };
+
+/// The text of a literal ("title"_text): nothing is copied or counted, since literals last.
+inline Text operator""_text(const char* bytes, std::size_t size) {
+  Text text;
+  text.bytes_ = std::shared_ptr<const char[]>(std::shared_ptr<const char[]>(), bytes);
+  text.size_ = size;
+  return text;
+}
 
 }  // namespace platform

@@ -50,6 +50,14 @@ bool isLineBreak(UChar32 character) {
   return character >= '\n' && character <= '\r';
 }
 
+/// Room for all pieces where few are expected, as in each of the dates of a feed.
+std::vector<std::string_view> roomForPieces(std::size_t most) {
+  constexpr std::size_t kFew = 8;
+  std::vector<std::string_view> pieces;
+  pieces.reserve(std::min(most, kFew));
+  return pieces;
+}
+
 using CaseMapping = void (*)(const char*, std::uint32_t, icu::StringPiece, icu::ByteSink&,
                              icu::Edits*, UErrorCode&);
 
@@ -109,7 +117,7 @@ std::string replacingAll(std::string_view text, std::string_view target,
 }
 
 std::vector<std::string_view> splitAt(std::string_view text, char separator, std::size_t most) {
-  std::vector<std::string_view> pieces;
+  std::vector<std::string_view> pieces = roomForPieces(most);
   while (pieces.size() + 1 < most) {
     const std::size_t found = text.find(separator);
     if (found == std::string_view::npos) break;
@@ -121,7 +129,7 @@ std::vector<std::string_view> splitAt(std::string_view text, char separator, std
 }
 
 std::vector<std::string_view> splitAtWhitespace(std::string_view text, std::size_t most) {
-  std::vector<std::string_view> pieces;
+  std::vector<std::string_view> pieces = roomForPieces(most);
   std::size_t start = 0;
   for (std::size_t position = 0; position < text.size() && pieces.size() + 1 < most;) {
     const std::size_t characterStart = position;

@@ -14,17 +14,12 @@ namespace {
 // already.
 constexpr unsigned kFormat = pugi::format_indent | pugi::format_no_escapes;
 constexpr const char* kIndent = "  ";
+constexpr std::size_t kDeclarationSize = 64;
 
 // The library reports exhausted memory by a null handle or by false; passing over it would lose a
 // part of the document without a sign.
 void requireMemory(bool isAllocated) {
   if (!isAllocated) throw std::bad_alloc();
-}
-
-pugi::xml_node appendElement(pugi::xml_node parent, std::string_view name) {
-  pugi::xml_node element = parent.append_child(pugi::node_element);
-  requireMemory(element.set_name(std::string(name).c_str()));
-  return element;
 }
 
 class StringWriter : public pugi::xml_writer {
@@ -40,8 +35,24 @@ class StringWriter : public pugi::xml_writer {
 
 }  // namespace
 
+// The nodes, and about how many bytes they take when they are written: a text that large must not
+// be moved again and again while it grows.
+struct XMLElement::Tree {
+  pugi::xml_document document;
+  std::size_t size = 0;
+};
+
+XMLElement::XMLElement(Tree& tree, pugi::xml_node_struct* parent, std::string_view name)
+    : tree_(&tree) {
+  pugi::xml_node element = pugi::xml_node(parent).append_child(pugi::node_element);
+  requireMemory(element.set_name(std::string(name).c_str()));
+  node_ = element.internal_object();
+  constexpr std::size_t kSizeAroundNames = 16;  // brackets, indentation and line break
+  tree_->size += 2 * name.size() + kSizeAroundNames;
+}
+
 XMLElement XMLElement::appendChild(std::string_view name) {
-  return XMLElement(appendElement(pugi::xml_node(node_), name).internal_object());
+  return {*tree_, node_, name};
 }
 
 XMLElement XMLElement::appendChild(std::string_view name, std::string_view text) {
@@ -50,6 +61,7 @@ XMLElement XMLElement::appendChild(std::string_view name, std::string_view text)
   appendEscapedText(escaped, text);
   pugi::xml_node content = pugi::xml_node(child.node_).append_child(pugi::node_pcdata);
   requireMemory(content.set_value(escaped.c_str()));
+  tree_->size += escaped.size();
   return child;
 }
 
@@ -58,14 +70,16 @@ void XMLElement::appendAttribute(std::string_view name, std::string_view value) 
   appendEscapedAttribute(escaped, value);
   pugi::xml_attribute attribute = pugi::xml_node(node_).append_attribute(std::string(name).c_str());
   requireMemory(attribute.set_value(escaped.c_str()));
+  constexpr std::size_t kSizeAroundValue = 4;  // space, equals sign and quotes
+  tree_->size += name.size() + escaped.size() + kSizeAroundValue;
 }
 
 void XMLElement::declareNamespace(std::string_view prefix, std::string_view uri) {
   appendAttribute("xmlns:" + std::string(prefix), uri);
 }
 
-XMLDocument::XMLDocument() : document_(std::make_unique<pugi::xml_document>()) {
-  pugi::xml_node declaration = document_->append_child(pugi::node_declaration);
+XMLDocument::XMLDocument() : tree_(std::make_unique<XMLElement::Tree>()) {
+  pugi::xml_node declaration = tree_->document.append_child(pugi::node_declaration);
   requireMemory(declaration.append_attribute("version").set_value("1.0"));
   requireMemory(declaration.append_attribute("encoding").set_value("UTF-8"));
 }
@@ -75,13 +89,14 @@ XMLDocument::XMLDocument(XMLDocument&&) noexcept = default;
 XMLDocument& XMLDocument::operator=(XMLDocument&&) noexcept = default;
 
 XMLElement XMLDocument::setRoot(std::string_view name) {
-  return XMLElement(appendElement(*document_, name).internal_object());
+  return {*tree_, tree_->document.internal_object(), name};
 }
 
 std::string XMLDocument::serialised() const {
   std::string result;
   StringWriter writer(result);
-  document_->save(writer, kIndent, kFormat, pugi::encoding_utf8);
+  result.reserve(tree_->size + kDeclarationSize);
+  tree_->document.save(writer, kIndent, kFormat, pugi::encoding_utf8);
   return result;
 }
 

@@ -1,11 +1,11 @@
 #pragma once
 
+#include <cstddef>
 #include <memory>
 #include <string>
 #include <string_view>
 
 namespace pugi {
-class xml_document;
 struct xml_node_struct;
 }  // namespace pugi
 
@@ -13,6 +13,8 @@ namespace platform {
 
 /// A handle of one element of an XMLDocument; valid as long as the document is.
 class XMLElement {
+  struct Tree;
+
  public:
   /// Appends a child element without content and returns it.
   XMLElement appendChild(std::string_view name);
@@ -25,7 +27,9 @@ class XMLElement {
 
  private:
   friend class XMLDocument;
-  explicit XMLElement(pugi::xml_node_struct* node) : node_(node) {}
+  XMLElement(Tree& tree, pugi::xml_node_struct* parent, std::string_view name);
+
+  Tree* tree_;  // of the document
   pugi::xml_node_struct* node_;
 };
 
@@ -46,7 +50,7 @@ class XMLDocument {
   std::string serialised() const;
 
  private:
-  std::unique_ptr<pugi::xml_document> document_;
+  std::unique_ptr<XMLElement::Tree> tree_;
 };
 
 }  // namespace platform

@@ -319,9 +319,10 @@ struct XMLParser::Run {
                                     const XML_Char* /*notation*/) {
     Run* const run = static_cast<Run*>(pointer);
     run->hasDeclarations = true;
-    if (value == nullptr) return;  // external
+    // Parameter entities are never resolved, nor are external ones, which have no value.
+    if (isParameter != 0 || value == nullptr) return;
     const std::string_view text(value, static_cast<std::size_t>(length));
-    if (text.find(isParameter != 0 ? '%' : '&') == std::string_view::npos) return;
+    if (text.find('&') == std::string_view::npos) return;
     if (++run->nestingEntities <= kNestingEntitiesLimit) return;
     run->deliver([&](XMLParserEvents&) { run->refuse("too many entities made of entities"); });
   }

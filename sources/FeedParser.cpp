@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <utility>
 
 #include "cli/QELError.h"
 #include "dates/RFC822Parsing.h"
@@ -12,6 +13,7 @@ namespace {
 
 using platform::Dictionary;
 using platform::Text;
+using platform::operator""_text;
 
 /// The local names of the elements whose start empties the text buffer. Built once, at the first
 /// element of the first feed, and shared by all parsers.
@@ -27,6 +29,9 @@ const TextBearingElements& textBearingElements() {
   static const TextBearingElements elements;
   return elements;
 }
+
+/// Of the keys in the dictionary of an item, see the class.
+constexpr std::size_t kMostItemKeys = 14;
 
 /// The length of a uuid in its 8-4-4-4-12 form (RFC 4122), in characters.
 constexpr std::size_t kUuidLength = 36;
@@ -76,19 +81,21 @@ void FeedParser::didStartElement(const platform::XMLName& name,
   if (!readsRSS()) return;
 
   if (name.local == "item") {
+    endItem();
     currentEpisode_ = &episodes_.emplace_back();
+    currentEpisode_->reserve(kMostItemKeys);
   } else if (name.local == "enclosure") {
     readEnclosure(attributes);
   } else if (name.local == "image") {
     parsingImage_ = true;
     if (name.qualified == "orvane:image") {
       if (const auto href = attributes.value("href")) {
-        target().insert_or_assign("poster", Text(*href));
+        target().insert_or_assign("poster"_text, Text(*href));
       }
     }
   } else if (name.qualified == "orvane:category") {
     // The first category wins: later ones and nested subcategories find the key taken.
-    if (const auto text = attributes.value("text")) target().try_emplace("category", Text(*text));
+    if (const auto text = attributes.value("text")) target().emplace("category"_text, Text(*text));
   }
 
   if (std::find(textBearing.begin(), textBearing.end(), name.local) != textBearing.end()) {
@@ -101,17 +108,17 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
 
   const std::string_view local = name.local;
   if (local == "item") {
-    currentEpisode_ = nullptr;
+    endItem();
   } else if (local == "title") {
-    takeText(target(), "title");
+    takeText(target(), "title"_text);
   } else if (local == "author" || local == "creator") {
-    takeText(target(), "author");
+    takeText(target(), "author"_text);
   } else if (local == "description") {
-    takeText(target(), "description");
+    takeText(target(), "description"_text);
   } else if (local == "copyright") {
-    takeText(target(), "copyright");
+    takeText(target(), "copyright"_text);
   } else if (local == "keywords") {
-    takeText(target(), "keywords");
+    takeText(target(), "keywords"_text);
   } else if (local == "explicit") {
     readAdvisoryLabel(target());
   } else if (local == "pubDate") {
@@ -119,43 +126,50 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (local == "image") {
     parsingImage_ = false;
   } else if (local == "url") {
-    if (parsingImage_) target().try_emplace("poster", Text(std::string_view(cdataBuffer_)));
+    if (parsingImage_) target().emplace("poster"_text, Text(std::string_view(cdataBuffer_)));
     emptyBuffer();
   } else if (local == "link") {
     readLink();
   } else if (name.qualified == "qel:uuid") {
-    takeText(target(), "QELUUID");
+    takeText(target(), "QELUUID"_text);
   } else if (name.qualified == "qel:order") {
-    takeText(target(), "order");
+    takeText(target(), "order"_text);
   }
+}
+
+void FeedParser::endItem() {
+  if (!std::exchange(currentEpisode_, nullptr) || !itemReceiver_) return;
+  itemReceiver_(episodes_.back());
+  episodes_.pop_back();
 }
 
 void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
   if (!currentEpisode_) return;
   if (const auto url = attributes.value("url")) {
-    currentEpisode_->insert_or_assign("url", Text(*url));
+    currentEpisode_->insert_or_assign("url"_text, Text(*url));
   }
   if (const auto length = attributes.value("length")) {
     const std::int64_t number = platform::leadingInteger(*length);
-    if (number > 0) currentEpisode_->insert_or_assign("contentLength", number);
+    if (number > 0) currentEpisode_->insert_or_assign("contentLength"_text, number);
   }
   if (const auto type = attributes.value("type")) {
-    currentEpisode_->insert_or_assign("contentType", Text(*type));
+    currentEpisode_->insert_or_assign("contentType"_text, Text(*type));
   }
 }
 
 void FeedParser::readAdvisoryLabel(Dictionary& target) {
   const std::string label = platform::lowercased(cdataBuffer_);
   if (label == "yes") {
-    target.insert_or_assign("advisoryLabel", "Explicit");
+    target.insert_or_assign("advisoryLabel"_text, "Explicit"_text);
   } else if (label == "clean") {
-    target.insert_or_assign("advisoryLabel", "Clean");
+    target.insert_or_assign("advisoryLabel"_text, "Clean"_text);
   }
   emptyBuffer();
 }
 
 void FeedParser::readDate(Dictionary& target) {
-  if (const auto date = dateWithRFC822String(cdataBuffer_)) target.insert_or_assign("date", *date);
+  if (const auto date = dateWithRFC822String(cdataBuffer_))
+    target.insert_or_assign("date"_text, *date);
   emptyBuffer();
 }
 
@@ -163,13 +177,13 @@ void FeedParser::readDate(Dictionary& target) {
 /// buffer is not emptied.
 void FeedParser::readLink() {
   if (const auto uuid = leadingUuid(documentMarker_.textBehindMarker(cdataBuffer_))) {
-    if (currentEpisode_) currentEpisode_->insert_or_assign("QELUUID", Text(*uuid));
+    if (currentEpisode_) currentEpisode_->insert_or_assign("QELUUID"_text, Text(*uuid));
   } else if (const auto feedUuid = leadingUuid(collectionMarker_.textBehindMarker(cdataBuffer_))) {
-    feedAttributes_.insert_or_assign("QELUUID", Text(*feedUuid));
+    feedAttributes_.insert_or_assign("QELUUID"_text, Text(*feedUuid));
   }
 }
 
-void FeedParser::takeText(Dictionary& target, const char* key) {
+void FeedParser::takeText(Dictionary& target, const Text& key) {
   target.insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
   emptyBuffer();
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -10,6 +11,7 @@
 
 #include "platform/ErrorRecord.h"
 #include "platform/PropertyListValue.h"
+#include "platform/Text.h"
 #include "platform/XMLParser.h"
 
 /// Turns the bytes of a podcast feed into two plain results: the feed attributes (one dictionary
@@ -32,6 +34,12 @@ class FeedParser : private platform::XMLParserEvents {
   /// A parser of the bytes, which it gives up as it reads them; null for absent data.
   static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string> data);
 
+  /// Hands each item's dictionary over, in document order, once nothing is added to it any more,
+  /// instead of keeping it. For feeds of tens of thousands of items, whose records are made at
+  /// once.
+  using ItemReceiver = std::function<void(const platform::Dictionary&)>;
+  void setItemReceiver(ItemReceiver receiver) { itemReceiver_ = std::move(receiver); }
+
   /// Runs the whole parse. False for malformed XML, with the XML parser's own record, and for a
   /// document without an "rss" element, with code 3.
   bool parseWithError(platform::ErrorSlot& error);
@@ -41,7 +49,7 @@ class FeedParser : private platform::XMLParserEvents {
   void setFeedType(std::optional<std::string> type) { feedType_ = std::move(type); }
 
   const platform::Dictionary& feedAttributes() const { return feedAttributes_; }
-  /// In document order.
+  /// In document order; none when a receiver got them.
   const std::vector<platform::Dictionary>& episodes() const { return episodes_; }
 
  private:
@@ -67,6 +75,7 @@ class FeedParser : private platform::XMLParserEvents {
   void didEndElement(const platform::XMLName& name) override;
   void foundCharacters(std::string_view text) override { cdataBuffer_.append(text); }
 
+  void endItem();
   void readEnclosure(const platform::XMLAttributes& attributes);
   void readAdvisoryLabel(platform::Dictionary& target);
   void readDate(platform::Dictionary& target);
@@ -75,11 +84,12 @@ class FeedParser : private platform::XMLParserEvents {
   bool readsRSS() const { return feedType_ == "rss"; }
   /// The open item, or the channel between items.
   platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
-  void takeText(platform::Dictionary& target, const char* key);
+  void takeText(platform::Dictionary& target, const platform::Text& key);
   void emptyBuffer();
 
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items
   std::vector<platform::Dictionary> episodes_;
+  ItemReceiver itemReceiver_;
   bool parsingImage_ = false;
   platform::Dictionary feedAttributes_;
   std::string cdataBuffer_;

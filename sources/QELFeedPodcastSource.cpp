@@ -38,6 +38,10 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
     return false;
   }
   const std::unique_ptr<FeedParser> parser = FeedParser::parserWithFeedData(std::move(bytes));
+  auto episodes = std::make_shared<QELEpisodeList>();
+  parser->setItemReceiver([&episodes](const platform::Dictionary& item) {
+    episodes->push_back(QELEpisode::episodeWithFeedDictionary(&item));
+  });
   if (!parser->parseWithError(said)) {
     fillSlot(error, std::move(said), "Could not parse the feed at the specified URL");
     return false;
@@ -60,11 +64,6 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   setPosterLocation(text("poster"));
   setPosterReferenceType(QELReferenceType(posterLocation()));
 
-  auto episodes = std::make_shared<QELEpisodeList>();
-  episodes->reserve(parser->episodes().size());
-  for (const platform::Dictionary& item : parser->episodes()) {
-    episodes->push_back(QELEpisode::episodeWithFeedDictionary(&item));
-  }
   setEpisodes(std::move(episodes));
   return true;
 }

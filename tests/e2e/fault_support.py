@@ -243,6 +243,10 @@ class FaultTestCase(BundleTestCase):
             path.parent.mkdir(parents=True, exist_ok=True)
             path.write_bytes(b"an earlier " + name.encode())
 
+    def leftovers(self):
+        """The leftovers of an earlier run that are still there."""
+        return {path for path in (LEFTOVER, f"Posters/{LEFTOVER}") if (self.bundle / path).exists()}
+
     def in_bundle(self, name):
         return os.path.relpath(self.bundle / name, self.root)
 

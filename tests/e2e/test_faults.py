@@ -44,7 +44,7 @@ def table(*parts):
 # What is not told apart: the C library's care for the standard streams. What is lost of the progress lines or
 # of an output is lost without a word, as everywhere.
 STREAMS = """
-    fcntl ioctl    <std*>            done
+    ioctl          <std*>            done
     write          <stdout>          unsaid
 """
 
@@ -320,10 +320,6 @@ class BundleFaultTest(Sweep):
         # What was made on the way to the failure stays: directories, and nothing in them.
         added = contents(self.root).items() - self.before.items()
         return self.assertLessEqual(added, {("sub", None)}, run)
-
-    def leftovers(self):
-        """The leftovers of an earlier run that are still there."""
-        return {path for path in (LEFTOVER, f"Posters/{LEFTOVER}") if (self.bundle / path).exists()}
 
     def prepare(self, locate, source=None):
         """A server of runs for a source, the show's reference file by default; a run without faults is judged."""

@@ -186,8 +186,8 @@ class RandomMomentTest(InterruptionTestCase):
                     self.assertIn(process.returncode, (0, -number))
                     judge(number if process.returncode else None)
                     ended += process.returncode != 0
-        print(f"{arguments[0]} of {os.path.basename(arguments[1])}: {self.TURNS * len(self.SIGNALS)} signals, of which "
-              f"{ended} ended it", flush=True)
+        print(f"{self._testMethodName}, {arguments[0]} of {os.path.basename(arguments[1])}: "
+              f"{self.TURNS * len(self.SIGNALS)} signals, of which {ended} ended it", flush=True)
 
     def assertFileIsWritten(self, command, source):
         expected = self.run_tool(command, source).stdout
@@ -216,10 +216,10 @@ class RandomMomentTest(InterruptionTestCase):
         text = "Night & Walks 🚶 " * 100
         podcast = {"PodcastName": "Show", "Episodes": [{"EpisodeName": f"{number} {text}"} for number in range(1500)]}
         source = self.reference(podcast)
-        feed = self.feed(self.run_tool("createfeed", source).stdout)
-        for command in ("parsefeed", "createfeed"):
-            for kind in (str(source), feed):
-                self.assertFileIsWritten(command, kind)
+        feed = self.run_tool("createfeed", source).stdout
+        for command, kind in (("parsefeed", str(source)), ("parsefeed", self.server().serve("/feed", feed)),
+                              ("createfeed", str(source)), ("createfeed", self.feed(feed))):
+            self.assertFileIsWritten(command, kind)
 
     def assertBundleIsFilled(self, show, files, earlier):
         """The run fills a bundle, in which the earlier files stand, with all of the files. After the signal each of

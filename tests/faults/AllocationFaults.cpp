@@ -1,6 +1,7 @@
 #include "tests/faults/AllocationFaults.h"
 
 #include <dlfcn.h>
+#include <link.h>
 #include <unwind.h>
 
 #include <algorithm>
@@ -35,21 +36,22 @@ class Callers {
 
   void addAddress(std::uintptr_t address) {
     constexpr std::size_t kLongestEntry = 160;
-    Dl_info object{};
+    dl_find_object object{};
     if (length_ + kLongestEntry > text_.size() ||
-        ::dladdr(reinterpret_cast<void*>(address - 1), &object) == 0) {
+        ::_dl_find_object(reinterpret_cast<void*>(address - 1), &object) != 0) {
       return;
     }
-    std::string_view name(object.dli_fname);
+    std::string_view name(object.dlfo_link_map->l_name);
+    if (name.empty()) name = "qel";
     name = name.substr(name.rfind('/') + 1).substr(0, kLongestEntry / 2);
     if (name.starts_with("libqel_faults")) return;
     length_ += name.copy(text_.data() + length_, name.size());
     text_[length_++] = '+';
-    length_ = static_cast<std::size_t>(
-        std::to_chars(text_.data() + length_, text_.data() + text_.size(),
-                      address - reinterpret_cast<std::uintptr_t>(object.dli_fbase), 16)
-            .ptr -
-        text_.data());
+    length_ =
+        static_cast<std::size_t>(std::to_chars(text_.data() + length_, text_.data() + text_.size(),
+                                               address - object.dlfo_link_map->l_addr, 16)
+                                     .ptr -
+                                 text_.data());
     text_[length_++] = ' ';
   }
 
@@ -82,7 +84,7 @@ unsigned long AllocationFaults::end() {
 }
 
 // The C library's own functions under their second names: looking up the first ones would allocate.
-// NOLINTBEGIN(bugprone-reserved-identifier,readability-identifier-naming)
+// NOLINTBEGIN(bugprone-reserved-identifier,readability-*)
 extern "C" {
 void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
@@ -118,4 +120,4 @@ __attribute__((visibility("default"))) int posix_memalign(void** block, std::siz
   return 0;
 }
 }
-// NOLINTEND(bugprone-reserved-identifier,readability-identifier-naming)
+// NOLINTEND(bugprone-reserved-identifier,readability-*)

@@ -7,7 +7,7 @@
 class AllocationFaults {
  public:
   /// From now on, until `end`; the plan must outlive it.
-  static void begin(FaultPlan& plan);
+  static void begin(FaultPlan& faults);
   /// The number of allocations since `begin`.
   static unsigned long end();
 };

@@ -87,7 +87,6 @@ constexpr auto kCalls = std::to_array<Call>({
     {.number = SYS_ppoll, .kind = "poll"},
     {.number = SYS_socket, .kind = "socket"},
     {.number = SYS_socketpair, .kind = "socketpair"},
-    {.number = SYS_pipe2, .kind = "pipe"},
     {.number = SYS_eventfd2, .kind = "eventfd"},
     {.number = SYS_connect, .kind = "connect", .descriptor = 0},
     {.number = SYS_sendto, .kind = "send", .descriptor = 0, .length = 2},
@@ -180,6 +179,8 @@ Subject subjectOf(const Call& call, const Arguments& arguments, Name& buffer) {
     subject.name = nameOf(argument(call.descriptor));
     const bool duplicates = arguments[1] == F_DUPFD || arguments[1] == F_DUPFD_CLOEXEC;
     if (call.kind == "fcntl" && duplicates) subject.kind = "dup";
+    // This fails for one reason only, that there is no such descriptor.
+    if (call.kind == "fcntl" && arguments[1] == F_GETFD) subject.name = {};
   } else {
     subject.name = "-";
   }
@@ -196,8 +197,8 @@ void follow(const Call& call, const Subject& subject, const Arguments& arguments
     setNameOf(result, name.data());
   } else if (call.kind == "socket" || call.kind == "eventfd") {
     setNameOf(result, call.kind == "socket" ? "<socket>" : "<eventfd>");
-  } else if (call.kind == "socketpair" || call.kind == "pipe") {
-    const auto* pair = reinterpret_cast<const int*>(arguments[call.kind == "pipe" ? 0 : 3]);
+  } else if (call.kind == "socketpair") {
+    const auto* pair = reinterpret_cast<const int*>(arguments[3]);
     setNameOf(pair[0], "<pair>");
     setNameOf(pair[1], "<pair>");
   }

@@ -12,5 +12,5 @@ class SystemCallFaults {
  public:
   /// From now on, until the process ends; the plan must outlive it. False where the kernel does not
   /// allow that.
-  static bool begin(FaultPlan& plan);
+  static bool begin(FaultPlan& faults);
 };

@@ -367,28 +367,24 @@ TEST(XMLParserTest, EntityBombsAreRefused) {
   }
 }
 
-std::string chainOfEntities(std::string_view kind, std::size_t length) {
-  const bool isParameter = kind == "%";
-  std::string chain = isParameter ? "<!ENTITY % e0 '<!-- -->'>" : "<!ENTITY e0 'x'>";
+std::string chainOfEntities(std::size_t length) {
+  std::string chain = "<!ENTITY e0 'x'>";
   for (std::size_t link = 1; link <= length; ++link) {
-    chain.append(isParameter ? "<!ENTITY % e" : "<!ENTITY e").append(std::to_string(link));
-    chain.append(isParameter ? " '&#37;e" : " '&e").append(std::to_string(link - 1));
-    chain.append(";'>");
+    chain.append("<!ENTITY e").append(std::to_string(link));
+    chain.append(" '&e").append(std::to_string(link - 1)).append(";'>");
   }
   return chain;
 }
 
 TEST(XMLParserTest, EntitiesInsideOfEntitiesCannotExhaustTheStack) {
   const struct {
-    std::string_view kind;
     std::string_view declaration;
     std::string_view root;
     std::string_view events;
   } rows[] = {
-      {"&", "", "<r>&eN;</r>", "<r>x</r>"},
-      {"&", "", "<r a='&eN;'/>", "<r a=x></r>"},
-      {"&", "<!ATTLIST r a CDATA '&eN;'>", "<r/>", "<r a=x></r>"},
-      {"%", "%eN;", "<r/>", "<r></r>"},
+      {"", "<r>&eN;</r>", "<r>x</r>"},
+      {"", "<r a='&eN;'/>", "<r a=x></r>"},
+      {"<!ATTLIST r a CDATA '&eN;'>", "<r/>", "<r a=x></r>"},
   };
   for (const auto& row : rows) {
     const auto outcome = [&row](std::size_t length) {
@@ -399,8 +395,8 @@ TEST(XMLParserTest, EntitiesInsideOfEntitiesCannotExhaustTheStack) {
         }
         return result;
       };
-      return eventsOf("<!DOCTYPE r [\n" + chainOfEntities(row.kind, length) +
-                      withNumber(row.declaration) + "]>" + withNumber(row.root));
+      return eventsOf("<!DOCTYPE r [\n" + chainOfEntities(length) + withNumber(row.declaration) +
+                      "]>" + withNumber(row.root));
     };
     EXPECT_EQ(outcome(1000), row.events);
     for (const std::size_t length : {1001U, 100'000U}) {

@@ -326,6 +326,33 @@ TEST(FeedParserTest, MalformedXMLFailsWithTheParsersRecord) {
   EXPECT_NE(error->description.find("line 2"), std::string::npos) << error->description;
 }
 
+TEST(FeedParserTest, ReceiverGetsEachItemOnceItIsWhole) {
+  const std::string document =
+      "<rss><channel><item><title>a</title><item><title>b</title></item><title>c</title></item>"
+      "<item/><item><title>d</title></item></channel></rss>";
+  const std::vector<Dictionary> expected = {
+      {{"title", "a"}}, {{"title", "b"}}, {}, {{"title", "d"}}};
+  EXPECT_EQ(parse(document).episodes, expected);
+
+  const auto parser = FeedParser::parserWithFeedData(document);
+  std::vector<Dictionary> received;
+  parser->setItemReceiver([&received](const Dictionary& item) { received.push_back(item); });
+  platform::ErrorSlot error;
+  EXPECT_TRUE(parser->parseWithError(error));
+  EXPECT_EQ(received, expected);
+  EXPECT_TRUE(parser->episodes().empty());
+  EXPECT_EQ(parser->feedAttributes(), (Dictionary{{"title", "c"}}));
+}
+
+TEST(FeedParserTest, ReceiverHasGotTheItemsBeforeAFault) {
+  const auto parser = FeedParser::parserWithFeedData("<rss><item><title>a</title></item><item>");
+  std::vector<Dictionary> received;
+  parser->setItemReceiver([&received](const Dictionary& item) { received.push_back(item); });
+  platform::ErrorSlot error;
+  EXPECT_FALSE(parser->parseWithError(error));
+  EXPECT_EQ(received, (std::vector<Dictionary>{{{"title", "a"}}}));
+}
+
 TEST(FeedParserTest, ManyNestedLinksStayLinear) {
   // Each end looks for markers in a text that nobody empties. Were it searched anew, this would
   // take minutes, and the test run out of its time.
