@@ -4,6 +4,7 @@
 #include <malloc.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <csignal>
 #include <initializer_list>
 
@@ -30,7 +31,7 @@ void prepareProcess() {
   std::signal(SIGXFSZ, SIG_IGN);
   for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     // Those below it are open, so that the lowest free one, which open gives, is this one.
-    if (::fcntl(descriptor, F_GETFD) < 0) {
+    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) {
       ::open("/dev/null", O_RDWR);
     }
   }

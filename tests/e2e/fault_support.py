@@ -18,7 +18,7 @@ from pathlib import Path
 from typing import NamedTuple
 
 from bundle_support import IN_PLACE, BundleTestCase, contents
-from support import LOADING, SANITIZER_STATUS, element, environment, item, rss, tool
+from support import LOADING, SANITIZER_STATUS, counting_from_start, element, environment, item, rss, tool
 
 ERRORS = ("ENOSPC", "EIO", "EACCES", "EMFILE")
 
@@ -86,7 +86,7 @@ class FaultServer:
             [tool(), *arguments], cwd=directory, pass_fds=(request_end, answer_end),
             env=environment({"LD_PRELOAD": os.environ["QEL_FAULTS"],
                              "QEL_FAULT_SERVER": f"{request_end},{answer_end}",
-                             "ASAN_OPTIONS": sanitizer, **(env or {})}))
+                             "ASAN_OPTIONS": sanitizer, **counting_from_start(), **(env or {})}))
         os.close(request_end)
         os.close(answer_end)
 

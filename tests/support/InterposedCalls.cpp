@@ -10,6 +10,7 @@ InterposedCalls& interposedCalls() {
 }
 
 // The linker takes these for those of the C library.
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name)
 extern "C" {
 
 ssize_t copy_file_range(int source, off_t* sourceOffset, int target, off_t* targetOffset,
@@ -20,11 +21,15 @@ ssize_t copy_file_range(int source, off_t* sourceOffset, int target, off_t* targ
                             flags);
 }
 
+// There is a structure of this name, too.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wshadow"
 int flock(int descriptor, int operation) noexcept {
   const auto& answer = interposedCalls().flock;
   return answer ? answer(descriptor, operation)
                 : static_cast<int>(::syscall(SYS_flock, descriptor, operation));
 }
+#pragma GCC diagnostic pop
 
 int fstat(int descriptor, struct stat* status) noexcept {
   const auto& answer = interposedCalls().fstat;
@@ -48,3 +53,4 @@ int stat(const char* path, struct stat* status) noexcept {
 }
 
 }  // extern "C"
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
