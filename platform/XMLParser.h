@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -55,10 +56,15 @@ class XMLParserEvents {
 /// declare it and is not standalone: then it gives no characters either.
 class XMLParser {
  public:
+  /// What the library can take at once, and what takes least time.
+  static constexpr std::size_t kLargestWholeSize = std::size_t{1023} << 20U;
+
   /// The receiver must outlive `parse`. Move the bytes in where nobody else needs them: the parser
-  /// gives them up as soon as it can, so that they do not lie beside all that is read from them.
-  XMLParser(std::string bytes, XMLParserEvents& events)
-      : bytes_(std::move(bytes)), events_(events) {}
+  /// gives them up as soon as it can, so that they do not lie beside all that is read from them. A
+  /// document of more than `largestWholeSize` bytes is read in pieces, with the same events.
+  XMLParser(std::string bytes, XMLParserEvents& events,
+            std::size_t largestWholeSize = kLargestWholeSize)
+      : bytes_(std::move(bytes)), events_(events), largestWholeSize_(largestWholeSize) {}
 
   /// Runs the whole parse on the calling thread; called once at most. On a malformed document
   /// returns false with a description that names the fault, the line and the column (both counted
@@ -81,6 +87,7 @@ class XMLParser {
 
   std::string bytes_;
   XMLParserEvents& events_;
+  std::size_t largestWholeSize_;
   ErrorSlot abortedWith_;
   const Run* run_ = nullptr;  // while parse() runs
 };

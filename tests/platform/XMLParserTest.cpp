@@ -552,6 +552,42 @@ TEST(XMLParserTest, HugeDocumentsAreRead) {
   }
 }
 
+/// Adds up the sizes of what an XMLParser finds.
+struct SizeCounter : XMLParserEvents {
+  void didStartElement(const XMLName& name, const XMLAttributes& attributes) override {
+    sizes.push_back(name.qualified.size() + attributes.value("last").value_or("").size());
+  }
+  void didEndElement(const XMLName& name) override { sizes.push_back(name.qualified.size()); }
+  void foundCharacters(std::string_view text) override { textSize += text.size(); }
+  std::vector<std::size_t> sizes;
+  std::size_t textSize = 0;
+};
+
+TEST(XMLParserTest, ADocumentReadInPiecesGivesTheSameEvents) {
+  // A tag, and then a character or a reference, across the ends of the pieces.
+  constexpr std::size_t kMillions = 50'000'000;
+  std::string document =
+      "<a>" + std::string(kMillions, 'x') + "<b last='" + std::string(kMillions, 'y') + "'/>";
+  while (document.size() < 135'000'000) document += "日本語&lt;";
+  document += "</a>";
+  SizeCounter whole;
+  SizeCounter inPieces;
+  ErrorSlot error;
+  ASSERT_TRUE(XMLParser(document, whole).parse(error));
+  ASSERT_TRUE(XMLParser(std::move(document), inPieces, 0).parse(error));
+  EXPECT_EQ(inPieces.sizes, whole.sizes);
+  EXPECT_EQ(inPieces.sizes, (std::vector<std::size_t>{1, 1 + kMillions, 1, 1}));
+  EXPECT_EQ(inPieces.textSize, whole.textSize);
+}
+
+TEST(XMLParserTest, AFaultHasTheSamePlaceInPieces) {
+  const std::string document = "<a/>" + std::string(70'000'000, '\n') + "  </b>";
+  SizeCounter counter;
+  ErrorSlot error;
+  EXPECT_FALSE(XMLParser(document, counter, 0).parse(error));
+  EXPECT_EQ(error->description, "not well-formed (invalid token) at line 70000001, column 4");
+}
+
 TEST(XMLParserTest, AFaultBehindTheFirstPieceHasItsPlace) {
   const std::string document = "<a/>" + std::string(70'000'000, '\n') + "  </b>";
   EXPECT_EQ(eventsOf(document), "not well-formed (invalid token) at line 70000001, column 4");
