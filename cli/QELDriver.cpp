@@ -9,7 +9,6 @@
 #include <utility>
 #include <vector>
 
-#include "cli/QELArguments.h"
 #include "cli/QELError.h"
 #include "cli/QELProgress.h"
 #include "cli/QELSourceResolution.h"
@@ -74,52 +73,6 @@ std::string targetPath(const QELArguments& arguments) {
   return arguments.outputPath.value_or(std::string(platform::kStandardOutputPath));
 }
 
-int createBundle(const QELArguments& arguments, QELPodcastSource& source) {
-  auto& generator = kept(std::make_unique<QELBundlePodcastGenerator>());
-  // The path is the bundle itself, exactly as it was given, whatever its extension.
-  generator.setOutputPath(arguments.outputPath.value_or(platform::temporaryDirectory()));
-  ErrorSlot error;
-  if (!generate(generator, source, error)) return failToGenerate("bundle", error);
-  QELProgress("N", "Done!");
-  return kSuccess;
-}
-
-int createFeed(const QELArguments& arguments, QELPodcastSource& source) {
-  const std::string format = platform::lowercased(arguments.feedFormat.value_or("rss"));
-  if (format != "rss" && format != "atom") {
-    return fail("\"%s\" is not a recognized feed format.\n", {format});
-  }
-
-  auto& generator = kept(std::make_unique<QELFeedPodcastGenerator>());
-  generator.setFormat(format);
-  ErrorSlot error;
-  if (!generate(generator, source, error)) return failToGenerate("feed", error);
-  if (!generator.xmlData()) return fail("Could not generate feed: no data was produced.\n");
-
-  // The line break is appended apart, behind whatever the target holds by then. The first
-  // descriptor stays open meanwhile: the reader of a FIFO would take its end for the end of the
-  // feed and leave.
-  const std::string target = targetPath(arguments);
-  platform::OutputFile feed(target, platform::OutputFile::Mode::kReplace);
-  feed.write(*generator.xmlData());
-  platform::OutputFile(target, platform::OutputFile::Mode::kAppend).write("\n");
-  return kSuccess;
-}
-
-int parseFeed(const QELArguments& arguments, QELPodcastSource& source) {
-  auto& generator = kept(std::make_unique<QELReferenceFilePodcastGenerator>());
-  ErrorSlot error;
-  if (!generate(generator, source, error)) return failToGenerate("reference file", error);
-  if (!generator.referenceData()) {
-    return fail("Could not generate reference file: no data was produced.\n");
-  }
-
-  platform::OutputFile output(targetPath(arguments), platform::OutputFile::Mode::kReplace);
-  platform::writePropertyList(*generator.referenceData(),
-                              [&output](std::string_view bytes) { return output.write(bytes); });
-  return kSuccess;
-}
-
 int run(const QELArguments& arguments) {
   QELShouldReportProgress = arguments.command == "createbundle" || arguments.outputPath.has_value();
 
@@ -134,16 +87,7 @@ int run(const QELArguments& arguments) {
   }
   QELPodcastSource& source = kept(std::move(made));
 
-  QELProgress("N", "Loading/interpreting source...");
-  ErrorSlot error;
-  if (!succeeds([&] { return source.loadSourceWithError(error); }, error)) {
-    return fail("Could not load source: %s", {descriptionOf(error)});
-  }
-
-  if (arguments.command == "createbundle") return createBundle(arguments, source);
-  if (arguments.command == "createfeed") return createFeed(arguments, source);
-  if (arguments.command == "parsefeed") return parseFeed(arguments, source);
-  return fail("No recognizable command was provided.\n");
+  return QELRunCommand(arguments, source);
 }
 
 }  // namespace
@@ -160,4 +104,70 @@ int QELRun(std::span<const char* const> arguments) {
     platform::writeToStandardError("Out of memory.\n");
     return kFailure;
   }
+}
+
+int QELRunCommand(const QELArguments& arguments, QELPodcastSource& source) {
+  QELProgress("N", "Loading/interpreting source...");
+  ErrorSlot error;
+  if (!succeeds([&] { return source.loadSourceWithError(error); }, error)) {
+    return fail("Could not load source: %s", {descriptionOf(error)});
+  }
+
+  if (arguments.command == "createbundle") {
+    return QELCreateBundle(arguments, source, kept(std::make_unique<QELBundlePodcastGenerator>()));
+  }
+  if (arguments.command == "createfeed") {
+    return QELCreateFeed(arguments, source, kept(std::make_unique<QELFeedPodcastGenerator>()));
+  }
+  if (arguments.command == "parsefeed") {
+    return QELParseFeed(arguments, source,
+                        kept(std::make_unique<QELReferenceFilePodcastGenerator>()));
+  }
+  return fail("No recognizable command was provided.\n");
+}
+
+int QELCreateBundle(const QELArguments& arguments, QELPodcastSource& source,
+                    QELBundlePodcastGenerator& generator) {
+  // The path is the bundle itself, exactly as it was given, whatever its extension.
+  generator.setOutputPath(arguments.outputPath.value_or(platform::temporaryDirectory()));
+  ErrorSlot error;
+  if (!generate(generator, source, error)) return failToGenerate("bundle", error);
+  QELProgress("N", "Done!");
+  return kSuccess;
+}
+
+int QELCreateFeed(const QELArguments& arguments, QELPodcastSource& source,
+                  QELFeedPodcastGenerator& generator) {
+  const std::string format = platform::lowercased(arguments.feedFormat.value_or("rss"));
+  if (format != "rss" && format != "atom") {
+    return fail("\"%s\" is not a recognized feed format.\n", {format});
+  }
+
+  generator.setFormat(format);
+  ErrorSlot error;
+  if (!generate(generator, source, error)) return failToGenerate("feed", error);
+  if (!generator.xmlData()) return fail("Could not generate feed: no data was produced.\n");
+
+  // The line break is appended apart, behind whatever the target holds by then. The first
+  // descriptor stays open meanwhile: the reader of a FIFO would take its end for the end of the
+  // feed and leave.
+  const std::string target = targetPath(arguments);
+  platform::OutputFile feed(target, platform::OutputFile::Mode::kReplace);
+  feed.write(*generator.xmlData());
+  platform::OutputFile(target, platform::OutputFile::Mode::kAppend).write("\n");
+  return kSuccess;
+}
+
+int QELParseFeed(const QELArguments& arguments, QELPodcastSource& source,
+                 QELReferenceFilePodcastGenerator& generator) {
+  ErrorSlot error;
+  if (!generate(generator, source, error)) return failToGenerate("reference file", error);
+  if (!generator.referenceData()) {
+    return fail("Could not generate reference file: no data was produced.\n");
+  }
+
+  platform::OutputFile output(targetPath(arguments), platform::OutputFile::Mode::kReplace);
+  platform::writePropertyList(*generator.referenceData(),
+                              [&output](std::string_view bytes) { return output.write(bytes); });
+  return kSuccess;
 }

@@ -2,8 +2,27 @@
 
 #include <span>
 
+#include "cli/QELArguments.h"
+
+class QELBundlePodcastGenerator;
+class QELFeedPodcastGenerator;
+class QELPodcastSource;
+class QELReferenceFilePodcastGenerator;
+
 /// One whole run of the tool: scans the arguments (without the program's name), loads the source,
 /// writes what the command asks for and returns the exit status, 0 or 1.
 ///
 /// Every failure is one message on standard error. Null pointers do not occur among the arguments.
 int QELRun(std::span<const char* const> arguments);
+
+/// The part of a run that has its source: loads it and carries out the command. The exit status.
+int QELRunCommand(const QELArguments& arguments, QELPodcastSource& source);
+
+/// The part of a run that has its loaded source and the new generator of its command: has it
+/// generate and writes what it made. The exit status.
+int QELCreateBundle(const QELArguments& arguments, QELPodcastSource& source,
+                    QELBundlePodcastGenerator& generator);
+int QELCreateFeed(const QELArguments& arguments, QELPodcastSource& source,
+                  QELFeedPodcastGenerator& generator);
+int QELParseFeed(const QELArguments& arguments, QELPodcastSource& source,
+                 QELReferenceFilePodcastGenerator& generator);

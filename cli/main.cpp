@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <cstddef>
 #include <span>
 
@@ -8,7 +9,7 @@
 int main(int argc, char** argv) {
   platform::prepareProcess();
   const std::span<const char* const> arguments(argv, static_cast<std::size_t>(argc));
-  const int status = QELRun(arguments.empty() ? arguments : arguments.subspan(1));
+  const int status = QELRun(arguments.subspan(std::min(arguments.size(), std::size_t{1})));
   platform::flushStandardOutput();
   return status;
 }

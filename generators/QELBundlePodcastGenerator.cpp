@@ -1,13 +1,13 @@
 #include "generators/QELBundlePodcastGenerator.h"
 
 #include <algorithm>
-#include <cstddef>
 #include <string_view>
 #include <utility>
 
 #include "cli/QELError.h"
 #include "cli/QELProgress.h"
 #include "cli/QELReferenceType.h"
+#include "generators/QELBundleNames.h"
 #include "generators/QELNameLedger.h"
 #include "model/QELPodcastKeys.h"
 #include "platform/FileManager.h"
@@ -17,8 +17,6 @@
 #include "platform/TemporaryFile.h"
 #include "platform/Text.h"
 #include "platform/TextHelpers.h"
-#include "platform/URL.h"
-#include "platform/XMLEscaping.h"
 
 namespace {
 
@@ -28,43 +26,6 @@ using platform::Text;
 
 constexpr std::string_view kReferenceFileName = "Info.plist";
 constexpr std::string_view kPostersName = "Posters";
-constexpr std::size_t kLongestName = 255;  // bytes, what file systems allow
-
-/// The last component of a location: of the decoded path for a URL, of the path itself otherwise.
-/// Absent for a remote location that is no valid URL.
-///
-/// A URL's component is taken before it is decoded, so that an encoded "/" belongs to the name.
-std::optional<std::string> fileName(const Text& location,
-                                    const std::optional<Text>& referenceType) {
-  if (referenceType != kReferenceTypeRemote) {
-    return std::string(platform::lastPathComponent(location));
-  }
-  const std::optional<platform::URL> url = platform::URL::parse(location);
-  if (!url) return std::nullopt;
-  return platform::percentDecoded(platform::lastPathComponent(url->encodedPath()));
-}
-
-std::string baseName(std::string_view name) {
-  // Colons of the name go before slashes become colons: only the latter are to be seen.
-  return platform::replacingAll(
-      platform::replacingAll(platform::pathWithoutExtension(name), ":", ""), "/", ":");
-}
-
-std::string nameWithExtension(std::string_view base, std::string_view extension) {
-  return platform::formattedText("%@.%@", {base, extension});
-}
-
-/// Whether the last component of a location names a file at all.
-bool namesFile(std::string_view name) {
-  return !name.empty() && name != "." && name != "..";
-}
-
-/// Whether a file can have the name, and "Info.plist" hold it. A name like that of a file in the
-/// making is none: the next run would take the file for one that was left behind.
-bool isSaneName(std::string_view name) {
-  return namesFile(name) && name.size() <= kLongestName && !platform::isTemporaryFileName(name) &&
-         name.find('/') == std::string_view::npos && platform::isXMLText(name);
-}
 
 bool allows(const std::optional<QELPodcastSource::FileTypes>& types, std::string_view extension) {
   return !types ||
@@ -89,13 +50,13 @@ class BundleDirectory {
 
   /// Absent for a name that no file can have, and for the one that the reference file has.
   std::optional<std::string> mediaPath(std::string_view name) const {
-    if (!isSaneName(name) || name == kReferenceFileName) return std::nullopt;
+    if (!QELIsSaneName(name) || name == kReferenceFileName) return std::nullopt;
     return platform::joinedPath(path_, name);
   }
 
   /// Absent for a name that no file can have, and where "Posters" leads out of the bundle.
   std::optional<std::string> posterPath(std::string_view name) const {
-    if (!isSaneName(name) || leavesBundle()) return std::nullopt;
+    if (!QELIsSaneName(name) || leavesBundle()) return std::nullopt;
     return platform::joinedPath(postersPath_, name);
   }
 
@@ -133,14 +94,14 @@ std::optional<std::string> fetchPoster(const BundleDirectory& bundle,
                                        const std::optional<QELPodcastSource::FileTypes>& allowed,
                                        const Poster& poster, Save save) {
   if (!poster.location) return std::nullopt;
-  const std::optional<std::string> name = fileName(*poster.location, poster.referenceType);
+  const std::optional<std::string> name = QELFileName(*poster.location, poster.referenceType);
   const std::string extension(name ? platform::pathExtension(*name) : "");
   if (name && !allows(allowed, extension)) {
     QELProgress("W", "Unsupported poster image type \"%@\" for %@ \"%@\"", extension,
                 poster.subject, poster.title);
     return std::nullopt;
   }
-  const std::string posterName = nameWithExtension(poster.baseName, extension);
+  const std::string posterName = QELNameWithExtension(poster.baseName, extension);
   const std::optional<std::string> path = name ? bundle.posterPath(posterName) : std::nullopt;
   if (!path) {
     QELProgress("W", "Could not generate sane path for poster image for %@ \"%@\"", poster.subject,
@@ -179,20 +140,20 @@ std::optional<Dictionary> fetchEpisode(const BundleDirectory& bundle,
     QELProgress("W", "Found an episode (\"%@\") without a specified location", title);
     return std::nullopt;
   }
-  const std::optional<std::string> name = fileName(*location, episode.referenceType());
+  const std::optional<std::string> name = QELFileName(*location, episode.referenceType());
   if (!name) {
     QELProgress("W", "Could not generate sane path for episode \"%@\"", title);
     return std::nullopt;
   }
-  const std::string base = names.reserve(baseName(*name));
+  const std::string base = names.reserve(QELBaseName(*name));
   const std::string extension(platform::pathExtension(*name));
   if (!allows(source.allowedEpisodeFileTypes(), extension)) {
     QELProgress("W", "Invalid file type \"%@\" for episode \"%@\"", extension, title);
     return std::nullopt;
   }
-  const std::string mediaName = nameWithExtension(base, extension);
+  const std::string mediaName = QELNameWithExtension(base, extension);
   const std::optional<std::string> path =
-      namesFile(*name) ? bundle.mediaPath(mediaName) : std::nullopt;
+      QELNamesFile(*name) ? bundle.mediaPath(mediaName) : std::nullopt;
   if (!path) {
     QELProgress("W", "Could not generate sane path for episode \"%@\"", title);
     return std::nullopt;

@@ -1,9 +1,9 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
+#include <set>
 #include <string>
-#include <unordered_map>
-#include <unordered_set>
 
 /// The base names that one bundle has given out, so that no two episodes get the same.
 ///
@@ -11,12 +11,13 @@
 class QELNameLedger {
  public:
   /// The name itself if it is free, else the first free one of "name-2", "name-3", and so on; it is
-  /// then taken. The cost does not grow with the number of names taken.
+  /// then taken. The cost hardly grows with the number of names taken.
   std::string reserve(const std::string& name);
 
  private:
-  std::unordered_set<std::string> taken_;
+  // Sorted: names that all hash alike can be made, and would make a hash table slow.
+  std::set<std::string> taken_;
   /// For a name asked for again, the number to try next: a name once taken stays so, hence no lower
   /// number can have become free.
-  std::unordered_map<std::string, std::uint64_t> nextNumbers_;
+  std::map<std::string, std::uint64_t> nextNumbers_;
 };

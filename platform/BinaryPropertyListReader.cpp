@@ -18,12 +18,15 @@ constexpr std::size_t kTrailerSize = 32;
 constexpr std::size_t kWidestInteger = 8;
 
 // Containers that share their parts can make a list of any size out of a few bytes, and so can long
-// keys and data that stand in many places. A list may therefore take a fixed multiple of its bytes
+// texts and data that stand in many places. A list may therefore take a fixed multiple of its bytes
 // in memory, which is several times of what one without shared containers takes. The allowance on
 // top is for lists that are small whatever they do.
-constexpr std::uint64_t kMemoryAllowance = std::uint64_t{1} << 20;
+//
+// What is made of the list counts, too: an element may become a record of its own, and a text is
+// written wherever it stands, though it is held once.
+constexpr std::uint64_t kMemoryAllowance = std::uint64_t{16} << 20;
 constexpr std::uint64_t kMemoryPerByte = 128;
-constexpr std::uint64_t kMemoryOfElement = 64;
+constexpr std::uint64_t kMemoryOfElement = 512;
 constexpr std::uint64_t kMemoryOfEntry = 128;
 
 // 2001-01-01 00:00:00 UTC, from where dates count, in seconds since 1970.
@@ -81,7 +84,9 @@ bool BinaryPropertyListReader::readTrailer() {
     return malformed("a binary property list with a malformed trailer");
   tableOffset_ = tableOffset;
 
-  if (!spend(objectCount_ * sizeof(Text))) return false;
+  // There are no more objects than bytes, so this is always there.
+  static_assert(sizeof(Text) <= kMemoryPerByte);
+  memoryLeft_ -= objectCount_ * sizeof(Text);
   texts_.resize(objectCount_);
   isOpen_.resize(objectCount_);
   return readObject(root);
@@ -109,7 +114,6 @@ bool BinaryPropertyListReader::readKey(std::uint64_t number) {
   if (!object) return false;
   const auto key = text(number, *object);
   if (!key) return failAtObject(number, "is a key but no text");
-  if (!spend(key->size())) return false;
   builder_.setKey(*key);
   return true;
 }
@@ -253,7 +257,10 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
   if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8)
     return std::nullopt;
   Text& text = texts_[number];
-  if (!text.empty()) return text;
+  if (!text.empty()) {
+    if (!spend(text.size())) return std::nullopt;
+    return text;
+  }
 
   if (!holds(object, object.size, isUTF16 ? 2 : 1)) return std::nullopt;
   const std::string_view encoded =
@@ -271,6 +278,9 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
                                                                         : "UTF-8";
     auto converted = convertedToUTF8(encoded, encoding);
     if (!converted) return std::nullopt;
+    if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size()))
+      return std::nullopt;
+    converted->shrink_to_fit();
     text = Text(std::move(*converted));
   }
   return text;
@@ -278,7 +288,8 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
 
 bool BinaryPropertyListReader::holds(const Object& object, std::uint64_t count,
                                      std::size_t width) const {
-  return object.content <= tableOffset_ && count <= (tableOffset_ - object.content) / width;
+  // The content of an object begins at the end of the objects at most.
+  return count <= (tableOffset_ - object.content) / width;
 }
 
 std::uint64_t BinaryPropertyListReader::unsignedAt(std::size_t offset, std::size_t width) const {

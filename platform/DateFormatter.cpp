@@ -13,6 +13,7 @@
 #include <limits>
 #include <utility>
 
+#include "platform/ICUMemory.h"
 #include "platform/TimeZone.h"
 
 namespace platform {
@@ -90,12 +91,12 @@ class DateFormatter::Implementation {
 };
 
 DateFormatter::DateFormatter(std::string_view pattern)
-    : implementation_(std::make_unique<Implementation>(pattern)) {}
+    : implementation_(usingICU([&] { return std::make_unique<Implementation>(pattern); })) {}
 
 DateFormatter::~DateFormatter() = default;
 
 std::string DateFormatter::format(PointInTime date) const {
-  return implementation_->format(date);
+  return usingICU([&] { return implementation_->format(date); });
 }
 
 }  // namespace platform

@@ -63,7 +63,7 @@ void Download::Transfer::deliverEvent() {
   } else if (response_) {
     const std::int64_t expectedLength = *std::exchange(response_, std::nullopt);
     receiver_.didReceiveResponse(download_, expectedLength);
-  } else if (writtenLength_ > 0) {
+  } else {
     receiver_.didReceiveDataOfLength(download_, std::exchange(writtenLength_, 0));
   }
 }

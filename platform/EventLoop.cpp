@@ -5,13 +5,13 @@
 
 #include "platform/EventSource.h"
 #include "platform/NetworkTransfer.h"
+#include "platform/PerThread.h"
 
 namespace platform {
 namespace {
 
 std::vector<EventSource*>& sourcesOfThisThread() {
-  thread_local std::vector<EventSource*> sources;
-  return sources;
+  return PerThread<std::vector<EventSource*>>::value();
 }
 
 }  // namespace

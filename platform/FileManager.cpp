@@ -60,7 +60,10 @@ bool fileExists(const std::string& path) {
 
 bool isSymbolicLink(const std::string& path) {
   struct stat status {};
-  return ::lstat(path.c_str(), &status) == 0 && S_ISLNK(status.st_mode);
+  if (::lstat(path.c_str(), &status) == 0) {
+    return S_ISLNK(status.st_mode);
+  }
+  return errno != ENOENT && errno != ENOTDIR;
 }
 
 std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error) {

@@ -14,7 +14,8 @@ inline constexpr std::uint64_t kWholeReadLimit = std::uint64_t{2} << 30U;
 /// Whether anything (file, directory, ...) exists at the path, symbolic links followed.
 bool fileExists(const std::string& path);
 
-/// Whether the path itself is a symbolic link, dangling or not.
+/// Whether the path itself is a symbolic link, dangling or not; true as well when something is
+/// there and cannot be looked at.
 bool isSymbolicLink(const std::string& path);
 
 /// The whole content of a regular file. Anything else (directory, device, FIFO, socket), a file

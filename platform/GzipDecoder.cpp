@@ -1,6 +1,7 @@
 #include "platform/GzipDecoder.h"
 
 #include <climits>
+#include <new>
 
 namespace platform {
 
@@ -12,6 +13,7 @@ bool GzipDecoder::openMember() {
   constexpr int kGzipOnly = 16;
   const int result = state_ == State::kUnopened ? inflateInit2(&stream_, MAX_WBITS + kGzipOnly)
                                                 : inflateReset(&stream_);
+  if (result == Z_MEM_ERROR) throw std::bad_alloc();
   if (result == Z_OK) state_ = State::kInMember;
   return result == Z_OK;
 }
@@ -32,6 +34,7 @@ bool GzipDecoder::decode(std::string_view bytes, const ByteSink& sink) {
       if (size > 0 && !sink({output_.data(), size})) return false;
     } while (result == Z_OK);
     // Z_BUF_ERROR only says that all input is used up.
+    if (result == Z_MEM_ERROR) throw std::bad_alloc();
     if (result != Z_STREAM_END && result != Z_BUF_ERROR) return false;
     if (result == Z_STREAM_END) state_ = State::kBetweenMembers;
     bytes.remove_prefix(input.size() - stream_.avail_in);

@@ -7,6 +7,7 @@
 #include <utility>
 #include <vector>
 
+#include "platform/PerThread.h"
 #include "platform/TransferLibrary.h"
 
 namespace platform {
@@ -18,6 +19,11 @@ constexpr long kReceiveBufferSize = 512L * 1024;
 constexpr long kNoConnectTimeout = INT_MAX / 1000;
 /// A short page with the reason of a failure is read to its end, which keeps the connection alive.
 constexpr std::uint64_t kIgnoredBodyLimit = std::uint64_t{64} * 1024;
+/// The library reads the page of a redirect by itself, and would do so for ever. Some servers send
+/// the whole page that they meant to move away from.
+constexpr std::int64_t kRedirectPageLimit = std::int64_t{16} * 1024 * 1024;
+/// Of all answers of a transfer together; honest ones have a few KiB.
+constexpr std::uint64_t kHeaderLimit = std::uint64_t{1} * 1024 * 1024;
 
 static_assert(static_cast<int>(TransferErrorCode::kUnsupportedScheme) ==
               CURLE_UNSUPPORTED_PROTOCOL);
@@ -55,13 +61,10 @@ ErrorRecord transferError(TransferErrorCode code, std::string description) {
 /// The connections of one thread, and its transfers that are running.
 class NetworkTransfer::Connections {
  public:
-  static Connections& ofThisThread() {
-    thread_local Connections connections;
-    return connections;
-  }
+  static Connections& ofThisThread() { return PerThread<Connections>::value(); }
 
   CURLcode add(NetworkTransfer& transfer) {
-    if (!handle_) return CURLE_FAILED_INIT;
+    if (!handle_) return libraryState() == CURLE_OK ? CURLE_OUT_OF_MEMORY : libraryState();
     running_.push_back(&transfer);
     const CURLMcode code = library().multiAddHandle(handle_.get(), transfer.handle_.get());
     return code == CURLM_OK ? CURLE_OK : CURLE_OUT_OF_MEMORY;
@@ -98,10 +101,12 @@ class NetworkTransfer::Connections {
   };
 
   // What the library sets up once costs milliseconds, which only a run with transfers pays.
-  static CURLM* newHandle() {
-    static const CURLcode libraryState = library().globalInit(CURL_GLOBAL_DEFAULT);
-    return libraryState == CURLE_OK ? library().multiInit() : nullptr;
+  static CURLcode libraryState() {
+    static const CURLcode state = library().globalInit(CURL_GLOBAL_DEFAULT);
+    return state;
   }
+
+  static CURLM* newHandle() { return libraryState() == CURLE_OK ? library().multiInit() : nullptr; }
 
   std::unique_ptr<CURLM, Closer> handle_{newHandle()};
   std::vector<NetworkTransfer*> running_;
@@ -163,6 +168,14 @@ int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
   set(CURLOPT_HEADERDATA, static_cast<void*>(this));
   set(CURLOPT_WRITEFUNCTION, &NetworkTransfer::bodyCallback);
   set(CURLOPT_WRITEDATA, static_cast<void*>(this));
+  const curl_xferinfo_callback progressCallback = [](void* self, curl_off_t, curl_off_t bodySize,
+                                                     curl_off_t, curl_off_t) {
+    const bool isIgnored = !static_cast<NetworkTransfer*>(self)->begun_;
+    return isIgnored && bodySize > kRedirectPageLimit ? 1 : 0;
+  };
+  set(CURLOPT_XFERINFOFUNCTION, progressCallback);
+  set(CURLOPT_XFERINFODATA, static_cast<void*>(this));
+  set(CURLOPT_NOPROGRESS, 0L);
   return result;
 }
 
@@ -179,13 +192,27 @@ void NetworkTransfer::end(int resultCode) {
   const auto result = static_cast<CURLcode>(resultCode);
   // A failed status is the cause, however its page ended.
   const bool hasFailedStatus = !begun_ && (result == CURLE_OK || status() >= 400);
-  if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
+  if (!begun_ && result == CURLE_OK && status() == 200) {
+    error_ = {"transfer", CURLE_PARTIAL_FILE, "The header of the answer is cut short"};
+  } else if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
     error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
+  } else if (result == CURLE_ABORTED_BY_CALLBACK) {
+    error_ = transferError(TransferErrorCode::kTooLarge, "The page of a redirect never ends");
+  } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
+    // The library says the same of a line beyond its limit.
+    error_ = {"transfer", result,
+              "A line of the answer's header is too long, or memory has run out"};
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
     error_ = {"transfer", result,
               shownText(detail.empty() ? library().easyStrerror(result) : detail)};
   }
+}
+
+bool NetworkTransfer::isInHeader() const {
+  curl_off_t firstByteTime = 0;
+  library().easyGetinfo(handle_.get(), CURLINFO_STARTTRANSFER_TIME_T, &firstByteTime);
+  return firstByteTime > 0 && !begun_;
 }
 
 std::optional<std::string> NetworkTransfer::headerValue(const char* name) const {
@@ -197,18 +224,29 @@ std::optional<std::string> NetworkTransfer::headerValue(const char* name) const 
 }
 
 bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
-  const bool endsHeader = line == "\r\n" || line == "\n";
-  if (!endsHeader || begun_ || status() != 200) return true;
-  begun_ = true;
-  curl_off_t length = -1;
-  library().easyGetinfo(handle_.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &length);
-  // The library takes a length that exceeds its integers for none at all, and then any body for
-  // whole.
-  if (length < 0 && headerValue("Content-Length") && !headerValue("Transfer-Encoding")) {
-    error_ = {"transfer", CURLE_PARTIAL_FILE, "The announced length cannot be true"};
+  headerSize_ += line.size();
+  if (headerSize_ > kHeaderLimit) {
+    error_ = transferError(TransferErrorCode::kTooLarge, "The header is longer than 1 MiB");
     return false;
   }
-  return sink_.begin(length, headerValue("Content-Encoding").value_or(""), error_);
+  if (begun_) return true;  // behind the body
+  framing_.takeLine(line);
+  const bool endsHeader = line == "\r\n" || line == "\n";
+  return !endsHeader || didReceiveHeader();
+}
+
+bool NetworkTransfer::didReceiveHeader() {
+  const int status = this->status();
+  const bool hasBody = status >= 200 && status != 204 && status != 304;
+  if (hasBody && !framing_.fault().empty()) {
+    if (status < 400) error_ = {"transfer", CURLE_PARTIAL_FILE, std::string(framing_.fault())};
+    return false;
+  }
+  if (status != 200) return true;
+  begun_ = true;
+  const std::optional<std::uint64_t> length = framing_.length();
+  return sink_.begin(length ? static_cast<std::int64_t>(*length) : -1,
+                     headerValue("Content-Encoding").value_or(""), error_);
 }
 
 bool NetworkTransfer::didReceiveBody(std::string_view bytes) {

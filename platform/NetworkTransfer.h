@@ -8,6 +8,7 @@
 #include <string_view>
 
 #include "platform/ErrorRecord.h"
+#include "platform/MessageFraming.h"
 #include "platform/URL.h"
 
 namespace platform {
@@ -27,8 +28,9 @@ ErrorRecord transferError(TransferErrorCode code, std::string description);
 ///
 /// All transfers of a thread share its connections, which stay open between them. They make
 /// progress while the thread is in runAll(). A final status of 200 is success and nothing else is;
-/// any other is an error of the domain "HTTP" with the status as its code. Destroying a running
-/// transfer cancels it; not from within its sink.
+/// any other is an error of the domain "HTTP" with the status as its code. A header that does not
+/// tell where the body ends, or that is longer than any honest one, is a failure. Destroying a
+/// running transfer cancels it; not from within its sink.
 class NetworkTransfer {
  public:
   /// Takes the answer as it comes. Returning false with an error fails the transfer. Exceptions of
@@ -67,9 +69,12 @@ class NetworkTransfer {
   int configure(const URL& url, const char* acceptedEncoding);
   void end(int resultCode);
   int status() const;
+  /// Whether the end came before the body, but not before the first byte of the answer.
+  bool isInHeader() const;
   /// Of the final response so far; absent when it has no such header.
   std::optional<std::string> headerValue(const char* name) const;
   bool didReceiveHeaderLine(std::string_view line);
+  bool didReceiveHeader();
   bool didReceiveBody(std::string_view bytes);
   static std::size_t headerCallback(char* bytes, std::size_t size, std::size_t count, void* self);
   static std::size_t bodyCallback(char* bytes, std::size_t size, std::size_t count, void* self);
@@ -77,7 +82,9 @@ class NetworkTransfer {
   Sink& sink_;
   ErrorSlot error_;
   bool ended_ = false;
-  bool begun_ = false;             // whether the status 200 has come
+  bool begun_ = false;  // whether the status 200 has come
+  MessageFraming framing_;
+  std::uint64_t headerSize_ = 0;   // of all answers so far, trailers included
   std::uint64_t ignoredSize_ = 0;  // of the body of another status
   std::array<char, 256> errorText_{};
   std::unique_ptr<void, HandleCloser> handle_;

@@ -10,6 +10,7 @@
 #include <system_error>
 #include <vector>
 
+#include "platform/PosixError.h"
 #include "platform/TextHelpers.h"
 
 namespace platform {
@@ -124,10 +125,14 @@ std::string standardisedPath(std::string_view path) {
   return result;
 }
 
-std::string currentDirectory() {
+std::optional<std::string> currentDirectory(ErrorSlot& error) {
   std::error_code failure;
   const std::filesystem::path path = std::filesystem::current_path(failure);
-  return failure ? "/" : path.string();
+  if (failure) {
+    error = posixError(failure.value());
+    return std::nullopt;
+  }
+  return path.string();
 }
 
 std::string temporaryDirectory() {

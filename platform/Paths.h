@@ -1,7 +1,10 @@
 #pragma once
 
+#include <optional>
 #include <string>
 #include <string_view>
+
+#include "platform/ErrorRecord.h"
 
 namespace platform {
 
@@ -31,8 +34,9 @@ bool isAbsolutePath(std::string_view path);
 /// nothing else is left of it.
 std::string standardisedPath(std::string_view path);
 
-/// The process's working directory, absolute; "/" when it cannot be told.
-std::string currentDirectory();
+/// The process's working directory, absolute. Absent, and the slot filled, when it cannot be told,
+/// as after its removal.
+std::optional<std::string> currentDirectory(ErrorSlot& error);
 
 /// The directory for temporary files: TMPDIR, or /tmp.
 std::string temporaryDirectory();

@@ -38,7 +38,7 @@ class PropertyListDictionary {
   /// Makes room for that many entries.
   void reserve(std::size_t count);
   std::size_t size() const;
-  bool empty() const { return entries_.empty(); }
+  bool empty() const { return size() == 0; }
   const_iterator begin() const;
   const_iterator end() const;
 

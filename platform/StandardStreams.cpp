@@ -4,11 +4,37 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstddef>
 #include <cstdio>
 
 #include "platform/FileManager.h"
 
 namespace platform {
+
+namespace {
+
+constexpr std::size_t kBufferSize = 4096;
+
+ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
+  return writeAll(STDOUT_FILENO, {bytes, length}) ? static_cast<ssize_t>(length) : 0;
+}
+
+/// The buffer in front of standard output. The C library's own stream loses what it holds when a
+/// write is interrupted or would block.
+std::FILE* outputStream() {
+  static std::FILE* const stream = [] {
+    cookie_io_functions_t functions{};
+    functions.write = &writeBuffered;
+    std::FILE* made = ::fopencookie(nullptr, "w", functions);
+    if (made == nullptr) return stdout;
+    // A line is seen at once where somebody is looking.
+    std::setvbuf(made, nullptr, ::isatty(STDOUT_FILENO) == 1 ? _IOLBF : _IOFBF, kBufferSize);
+    return made;
+  }();
+  return stream;
+}
+
+}  // namespace
 
 std::string readStandardInput() {
   std::string bytes;
@@ -19,11 +45,11 @@ std::string readStandardInput() {
 }
 
 void writeToStandardOutput(std::string_view text) {
-  std::fwrite(text.data(), 1, text.size(), stdout);
+  std::fwrite(text.data(), 1, text.size(), outputStream());
 }
 
 void flushStandardOutput() {
-  std::fflush(stdout);
+  std::fflush(outputStream());
 }
 
 void writeToStandardError(std::string_view text) {

@@ -11,7 +11,8 @@ namespace platform {
 /// the end of the input does, and so does kWholeReadLimit.
 std::string readStandardInput();
 
-/// Writes to standard output through the process's buffered stream; failures are not reported.
+/// Writes to standard output through a buffer, which is flushed at line breaks on a terminal; where
+/// the output is non-blocking, waits. Failures are not reported.
 void writeToStandardOutput(std::string_view text);
 void flushStandardOutput();
 

@@ -1,5 +1,6 @@
 #include "platform/TemporaryFile.h"
 
+#include <dirent.h>
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -11,8 +12,7 @@
 #include <csignal>
 #include <cstddef>
 #include <cstdio>
-#include <filesystem>
-#include <system_error>
+#include <memory>
 #include <utility>
 
 #include "platform/PosixError.h"
@@ -49,7 +49,11 @@ std::string hiddenName() {
 /// The lock says that the file's owner lives. Without waiting; false with EWOULDBLOCK when another
 /// open file holds it, with other codes where the file system knows no locks.
 bool lock(int descriptor) {
-  return ::flock(descriptor, LOCK_EX | LOCK_NB) == 0;
+  int result = -1;
+  do {
+    result = ::flock(descriptor, LOCK_EX | LOCK_NB);
+  } while (result != 0 && errno == EINTR);
+  return result == 0;
 }
 
 bool isNamed(int descriptor, const std::string& path) {
@@ -58,6 +62,10 @@ bool isNamed(int descriptor, const std::string& path) {
   return ::fstat(descriptor, &open) == 0 && ::lstat(path.c_str(), &named) == 0 &&
          open.st_dev == named.st_dev && open.st_ino == named.st_ino;
 }
+
+struct DirectoryCloser {
+  void operator()(DIR* directory) const { ::closedir(directory); }
+};
 
 int moveReplacing(const char* from, const char* to) {
   return ::rename(from, to);
@@ -117,7 +125,8 @@ class TemporaryFile::Registry {
     }
     for (const int signal : kEndingSignals) {
       struct sigaction current {};
-      if (::sigaction(signal, nullptr, &current) == 0 && current.sa_handler == SIG_DFL) {
+      ::sigaction(signal, nullptr, &current);
+      if (current.sa_handler == SIG_DFL) {
         ::sigaction(signal, &action, nullptr);
       }
     }
@@ -125,14 +134,14 @@ class TemporaryFile::Registry {
 
   static void add(TemporaryFile& file, const Hold&) { file.next_ = std::exchange(first_, &file); }
 
+  /// The file has been added and not been removed since.
   static void remove(TemporaryFile& file) {
     const Hold hold;
-    for (TemporaryFile** link = &first_; *link != nullptr; link = &(*link)->next_) {
-      if (*link == &file) {
-        *link = std::exchange(file.next_, nullptr);
-        return;
-      }
+    TemporaryFile** link = &first_;
+    while (*link != &file) {
+      link = &(*link)->next_;
     }
+    *link = std::exchange(file.next_, nullptr);
   }
 
  private:
@@ -170,6 +179,7 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
     error = posixError(destination.empty() ? ENOENT : EINVAL);
     return false;
   }
+  destination_ = destination;  // before there is a file: memory may run out here
   Registry::handleSignals();
   int failure = EEXIST;
   for (int attempt = 0; attempt < kCreationAttempts && failure == EEXIST; ++attempt) {
@@ -195,7 +205,6 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
     }
     descriptor_ = std::move(file);
     path_ = std::move(path);
-    destination_ = destination;
     Registry::add(*this, hold);
     return true;
   }
@@ -254,15 +263,22 @@ bool isTemporaryFileName(std::string_view name) {
 }
 
 void removeStaleTemporaryFiles(const std::string& directory) {
-  std::error_code failure;
-  std::filesystem::directory_iterator entry(directory.empty() ? "." : directory, failure);
-  for (; !failure && entry != std::filesystem::directory_iterator(); entry.increment(failure)) {
-    std::error_code unknown;
-    if (!isTemporaryFileName(entry->path().filename().string()) ||
-        entry->symlink_status(unknown).type() != std::filesystem::file_type::regular) {
+  // Not by <filesystem>, which ends the process where it gets no memory.
+  const std::string parent = directory.empty() ? "." : directory;
+  const std::unique_ptr<DIR, DirectoryCloser> entries(::opendir(parent.c_str()));
+  if (!entries) {
+    return;
+  }
+  while (const dirent* entry = ::readdir(entries.get())) {
+    const std::string_view name = entry->d_name;
+    if (!isTemporaryFileName(name)) {
       continue;
     }
-    const std::string path = entry->path().string();
+    const std::string path = std::string(parent).append("/").append(name);
+    struct stat status {};
+    if (::lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
+      continue;
+    }
     const FileDescriptor file = FileDescriptor::open(path, O_RDWR | O_NONBLOCK | O_NOFOLLOW);
     if (file.isOpen() && lock(file.get())) {
       ::unlink(path.c_str());

@@ -7,6 +7,8 @@
 #include <ctime>
 #include <mutex>
 
+#include "platform/ICUMemory.h"
+
 namespace platform {
 
 class TimeZone::Rules {
@@ -38,6 +40,7 @@ class DatabaseRules final : public TimeZone::Rules {
     std::int32_t daylight = 0;
     zone_->getOffset(static_cast<UDate>(time.count()), static_cast<UBool>(isLocalTime), standard,
                      daylight, status);
+    requireICUMemory();
     return (std::int64_t{standard} + daylight) / kMillisecondsPerSecond;
   }
 
@@ -65,26 +68,29 @@ class CLibraryRules final : public TimeZone::Rules {
   static std::int64_t offset(std::chrono::seconds sinceEpoch) {
     const time_t time = sinceEpoch.count();
     struct tm fields {};
-    return localtime_r(&time, &fields) != nullptr ? fields.tm_gmtoff : 0;
+    localtime_r(&time, &fields);  // the years of every PointInTime are within those of struct tm
+    return fields.tm_gmtoff;
   }
 };
 
 using SharedRules = std::shared_ptr<const TimeZone::Rules>;
 
-/// The rules of the zone of the database; null when there is none.
-SharedRules databaseRules(std::string_view name) {
-  if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
+SharedRules newDatabaseRules(std::string_view name) {
   // ICU makes a zone of any name: of "GMT+5" an offset, of an unknown one the zone Etc/Unknown.
   const icu::UnicodeString id = icu::UnicodeString::fromUTF8(icu::StringPiece(name));
   icu::UnicodeString canonicalID;
   UBool isInDatabase = 0;
   UErrorCode status = U_ZERO_ERROR;
   icu::TimeZone::getCanonicalID(id, canonicalID, isInDatabase, status);
-  if (U_FAILURE(status) != 0 || isInDatabase == 0 || canonicalID == UCAL_UNKNOWN_ZONE_ID) {
-    return nullptr;
-  }
+  if (U_FAILURE(status) != 0 || isInDatabase == 0) return nullptr;
   return std::make_shared<const DatabaseRules>(
       std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id)));
+}
+
+/// The rules of the zone of the database; null when there is none.
+SharedRules databaseRules(std::string_view name) {
+  if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
+  return usingICU([&] { return newDatabaseRules(name); });
 }
 
 /// A text of TZ that may name a zone of the database: ":name" or a path into the database.

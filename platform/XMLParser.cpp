@@ -24,11 +24,28 @@ constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 constexpr std::string_view kWhitespace = " \t\r\n";
 constexpr std::string_view kDeclarationStart = "<?xml";
 
-// The library takes its input in ints, copies it into a buffer that it grows by doubling to 1 GiB
-// at most, and scans a tag that a piece cuts anew with the next one. A document that fits is one
-// piece, which spares the library's counting of lines, too: that takes a third of the time. Pieces
-// of a larger one leave room for what they cut, and are so few that the scanning stays linear.
+// The library takes its input in ints and copies it into a buffer that it grows by doubling, to
+// 1 GiB at most. A document that fits is one piece, which spares the library's counting of lines,
+// too: that takes a third of the time. A tag that a piece of a larger one cuts is scanned anew with
+// the next piece, which is therefore as large as what waits, so that the scanning stays linear.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
+// The library can double its buffer as long as what waits and the next piece stay below 1 GiB.
+constexpr std::size_t kWaitingLimit = (std::size_t{1} << 30) - kPieceSize;
+
+// What declarations can add to a document. The library recurses once for each entity inside an
+// entity, compares each attribute that is declared with all of its element's, and goes through
+// these at each such element. It bounds what entities deliver only at a hundred times the document,
+// and attributes by default not at all.
+constexpr std::size_t kNestingEntitiesLimit = 1000;
+constexpr std::size_t kDeclaredAttributesLimit = 256;
+// Bytes of names and texts. Without entities no document exceeds its share: the shortest element,
+// "<a/>", counts for just three times its bytes.
+constexpr std::size_t kDeliveryAllowance = std::size_t{1} << 20;
+constexpr std::size_t kDeliveryPerByte = 3;
+constexpr std::size_t kDeliveryOfElement = 11;
+
+// An encoding's name is shorter; a longer one is not repeated in a message.
+constexpr std::size_t kShownLabelLength = 64;
 
 struct ByteOrderMark {
   std::string_view bytes;
@@ -157,8 +174,10 @@ std::optional<std::size_t> makeUTF8(std::string& document, ErrorSlot& error) {
   std::optional<std::string> converted;
   if (encoding) converted = convertedToUTF8(text, *encoding);
   if (!converted) {
+    const std::string shownLabel = std::string(label.substr(0, kShownLabelLength)) +
+                                   (label.size() > kShownLabelLength ? "..." : "");
     error = recordOf(XML_ERROR_UNKNOWN_ENCODING,
-                     "unknown encoding \"" + std::string(label) + "\" at " +
+                     "unknown encoding \"" + shownLabel + "\" at " +
                          positionBehind(text.substr(0, labelPosition)).text());
     return std::nullopt;
   }
@@ -187,13 +206,17 @@ std::optional<std::string_view> XMLAttributes::value(std::string_view name) cons
 // One run of the library's parser over a document, which begins at `start` and is UTF-8.
 struct XMLParser::Run {
   Run(XMLParser& parser, std::string utf8, std::size_t start)
-      : owner(parser), document(std::move(utf8)) {
+      : owner(parser),
+        document(std::move(utf8)),
+        deliveryLeft(kDeliveryAllowance + kDeliveryPerByte * document.size()) {
     // The text is UTF-8 by now, whatever its declaration says.
     handle.reset(XML_ParserCreate("UTF-8"));
     if (!handle) throw std::bad_alloc();
     XML_SetUserData(handle.get(), this);
     XML_SetElementHandler(handle.get(), startElement, endElement);
     XML_SetCharacterDataHandler(handle.get(), characters);
+    XML_SetEntityDeclHandler(handle.get(), declareEntity);
+    XML_SetAttlistDeclHandler(handle.get(), declareAttribute);
     owner.run_ = this;
 
     next = std::min(document.find_first_not_of(kWhitespace, start), document.size());
@@ -214,11 +237,12 @@ struct XMLParser::Run {
     bool isLast = false;
     while (succeeded && !isLast) {
       const std::size_t rest = document.size() - next;
-      const std::size_t size = isWhole ? rest : std::min(rest, kPieceSize);
+      const std::size_t size = isWhole ? rest : std::min(rest, nextPieceSize());
       void* buffer = XML_GetBuffer(handle.get(), static_cast<int>(size));
       if (buffer == nullptr) return false;
       document.copy(static_cast<char*>(buffer), size, next);
       next += size;
+      given += size;
       isLast = next == document.size();
       // The library has its own copy of the rest: what is read from it needs the room.
       if (isLast) std::string().swap(document);
@@ -226,6 +250,14 @@ struct XMLParser::Run {
                   XML_STATUS_OK;
     }
     return succeeded;
+  }
+
+  std::size_t nextPieceSize() const {
+    const XML_Index understood = XML_GetCurrentByteIndex(handle.get());
+    if (understood < 0) return kPieceSize;
+    const std::size_t waiting = given - std::min(given, static_cast<std::size_t>(understood));
+    const std::size_t room = kWaitingLimit - std::min(kWaitingLimit, waiting);
+    return std::max(kPieceSize, std::min(waiting, room));
   }
 
   std::string position() const {
@@ -257,8 +289,60 @@ struct XMLParser::Run {
     if (isEnded()) XML_StopParser(handle.get(), XML_FALSE);
   }
 
-  static void XMLCALL startElement(void* run, const XML_Char* name, const XML_Char** attributes) {
-    static_cast<Run*>(run)->deliver([&](XMLParserEvents& events) {
+  // Ends the run, inside of deliver(), with a fault that the library does not see.
+  void refuse(std::string_view description) {
+    owner.abort(recordOf(XML_ERROR_AMPLIFICATION_LIMIT_BREACH,
+                         std::string(description) + " at " + position()));
+  }
+
+  // Counts what a document with declarations delivers; false when it is too much.
+  bool spend(std::size_t size) {
+    if (!hasDeclarations) return true;
+    if (size > deliveryLeft) {
+      refuse(XML_ErrorString(XML_ERROR_AMPLIFICATION_LIMIT_BREACH));
+      return false;
+    }
+    deliveryLeft -= size;
+    return true;
+  }
+
+  bool spendOnElement(std::string_view name, const XML_Char* const* attributes) {
+    if (!hasDeclarations) return true;
+    std::size_t size = kDeliveryOfElement + name.size();
+    for (const XML_Char* const* text = attributes; *text != nullptr; ++text) {
+      size += std::string_view(*text).size() + 1;
+    }
+    return spend(size);
+  }
+
+  static void XMLCALL declareEntity(void* pointer, const XML_Char* /*name*/, int isParameter,
+                                    const XML_Char* value, int length, const XML_Char* /*base*/,
+                                    const XML_Char* /*systemID*/, const XML_Char* /*publicID*/,
+                                    const XML_Char* /*notation*/) {
+    Run* const run = static_cast<Run*>(pointer);
+    run->hasDeclarations = true;
+    // Parameter entities are never resolved, nor are external ones, which have no value.
+    if (isParameter != 0 || value == nullptr) return;
+    const std::string_view text(value, static_cast<std::size_t>(length));
+    if (text.find('&') == std::string_view::npos) return;
+    if (++run->nestingEntities <= kNestingEntitiesLimit) return;
+    run->deliver([&](XMLParserEvents&) { run->refuse("too many entities made of entities"); });
+  }
+
+  static void XMLCALL declareAttribute(void* pointer, const XML_Char* /*element*/,
+                                       const XML_Char* /*name*/, const XML_Char* /*type*/,
+                                       const XML_Char* /*value*/, int /*isRequired*/) {
+    Run* const run = static_cast<Run*>(pointer);
+    run->hasDeclarations = true;
+    if (++run->declaredAttributes <= kDeclaredAttributesLimit) return;
+    run->deliver([&](XMLParserEvents&) { run->refuse("too many declared attributes"); });
+  }
+
+  static void XMLCALL startElement(void* pointer, const XML_Char* name,
+                                   const XML_Char** attributes) {
+    Run* const run = static_cast<Run*>(pointer);
+    run->deliver([&](XMLParserEvents& events) {
+      if (!run->spendOnElement(name, attributes)) return;
       events.didStartElement(nameOf(name), XMLAttributes(attributes));
     });
   }
@@ -268,18 +352,25 @@ struct XMLParser::Run {
         [&](XMLParserEvents& events) { events.didEndElement(nameOf(name)); });
   }
 
-  static void XMLCALL characters(void* run, const XML_Char* characters, int length) {
-    static_cast<Run*>(run)->deliver([&](XMLParserEvents& events) {
-      events.foundCharacters({characters, static_cast<std::size_t>(length)});
+  static void XMLCALL characters(void* pointer, const XML_Char* characters, int length) {
+    Run* const run = static_cast<Run*>(pointer);
+    const std::string_view text(characters, static_cast<std::size_t>(length));
+    run->deliver([&](XMLParserEvents& events) {
+      if (run->spend(text.size())) events.foundCharacters(text);
     });
   }
 
   XMLParser& owner;
-  std::string document;  // emptied once the library has all of it
-  std::size_t next = 0;  // where in the document the next piece begins
-  Position origin;       // of the library's first character, behind white space that is skipped
+  std::string document;                  // emptied once the library has all of it
+  std::size_t next = 0;                  // where in the document the next piece begins
+  std::size_t given = kUTF8Mark.size();  // the bytes that the library has
+  Position origin;  // of the library's first character, behind white space that is skipped
   std::unique_ptr<std::remove_pointer_t<XML_Parser>, ParserFreer> handle;
-  std::exception_ptr thrown;  // by an event
+  std::exception_ptr thrown;     // by an event
+  bool hasDeclarations = false;  // of entities or of attributes
+  std::size_t nestingEntities = 0;
+  std::size_t declaredAttributes = 0;
+  std::size_t deliveryLeft;
 };
 
 bool XMLParser::parse(ErrorSlot& error) {

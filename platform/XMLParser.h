@@ -48,8 +48,10 @@ class XMLParserEvents {
 /// library knows; without either it is UTF-8. A document labelled ISO-8859-1 or US-ASCII is read as
 /// windows-1252, which is what such documents mean. White space before the declaration is skipped.
 ///
-/// Internal entities are resolved within the parser's limits on amplification; external entities
-/// and DTDs are never loaded. A reference to a declared external entity gives no characters; a
+/// Internal entities and attributes by default are resolved as long as what they add is not much
+/// more than the document itself, and their declarations not too many; beyond that the document is
+/// refused, so that what is delivered stays within a few times of it. External entities and DTDs
+/// are never loaded. A reference to a declared external entity gives no characters; a
 /// reference to an undeclared one is a fault, unless the document names an external DTD that could
 /// declare it and is not standalone: then it gives no characters either.
 class XMLParser {

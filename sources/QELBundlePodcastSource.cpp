@@ -9,11 +9,13 @@
 
 namespace {
 
-/// The path made absolute and standardised.
-std::string absolutePath(const std::string& path) {
-  return platform::standardisedPath(platform::isAbsolutePath(path)
-                                        ? path
-                                        : platform::joinedPath(platform::currentDirectory(), path));
+/// The path made absolute and standardised; absent, and the slot filled, when the working directory
+/// cannot be told.
+std::optional<std::string> absolutePath(const std::string& path, platform::ErrorSlot& error) {
+  if (platform::isAbsolutePath(path)) return platform::standardisedPath(path);
+  const std::optional<std::string> directory = platform::currentDirectory(error);
+  if (!directory) return std::nullopt;
+  return platform::standardisedPath(platform::joinedPath(*directory, path));
 }
 
 }  // namespace
@@ -34,23 +36,25 @@ bool QELBundlePodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
     return false;
   }
 
+  const std::optional<std::string> bundle = absolutePath(*bundlePath_, error);
+  if (!bundle) return false;
+
   static const platform::Text local(kReferenceTypeLocal);
   for (const QELPodcastKey& field : QELPodcastDescriptiveKeys()) {
     (this->*field.setValue)((*referenceFile_.*field.value)());
   }
-  const std::string bundle = absolutePath(*bundlePath_);
   setReferenceType(local);
-  setLocation(bundle);
+  setLocation(*bundle);
   if (const auto& poster = referenceFile_->posterLocation()) {
     setPosterReferenceType(local);
-    setPosterLocation(platform::joinedPath(bundle, *poster));
+    setPosterLocation(platform::joinedPath(*bundle, *poster));
   }
   if (const auto& episodes = referenceFile_->episodes()) {
     for (const auto& episode : *episodes) {
       const auto location = episode->location();
       if (!location) continue;
       episode->setReferenceType(local);
-      episode->setLocation(platform::joinedPath(bundle, *location));
+      episode->setLocation(platform::joinedPath(*bundle, *location));
     }
     setEpisodes(episodes);
   }

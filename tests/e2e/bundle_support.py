@@ -13,7 +13,8 @@ IN_PLACE = re.compile(rb"(?:\x08*  -- \d+ / \d+ \(\d+\.\d%\))+\n")
 
 
 def contents(directory):
-    """Everything below the directory: relative path to bytes, "-> target" for a link, None for a directory."""
+    """Everything below the directory: relative path to bytes, "-> target" for a link, None for a directory,
+    "special" for what is no file at all."""
     found = {}
     for folder, folders, files in os.walk(directory):
         for name in folders + files:
@@ -22,6 +23,8 @@ def contents(directory):
                 value = f"-> {os.readlink(path)}"
             elif os.path.isdir(path):
                 value = None
+            elif not os.path.isfile(path):
+                value = "special"
             else:
                 with open(path, "rb") as file:
                     value = file.read()

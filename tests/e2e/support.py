@@ -5,6 +5,7 @@ its exit status, its two output streams and the files that it writes, read back 
 property-list and XML modules.
 """
 
+import functools
 import os
 import plistlib
 import re
@@ -64,6 +65,23 @@ def environment(changes=None):
     return values
 
 
+@functools.cache
+def counting_from_start():
+    """Changes to the environment of a run that cannot write a file at its end: past a limit, as another user.
+
+    Where coverage is measured, such a run counts into a file that is there from its start; nothing else changes.
+    """
+    name = os.environ.get("LLVM_PROFILE_FILE")
+    if not name:
+        return {}
+    folder = Path(name).parent
+    changes = {"LLVM_PROFILE_FILE": str(folder / f"{os.getpid()}-%c%m.profraw")}
+    run(env=changes)  # makes the file, whole
+    for file in folder.glob(f"{os.getpid()}-*"):
+        file.chmod(0o666)
+    return changes
+
+
 def soaking():
     """Whether this is a long run (QEL_SOAK=1), in which a test tries all cases, not only a choice of them."""
     return os.environ.get("QEL_SOAK") == "1"
@@ -90,7 +108,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     env = dict(env or {})
     shell = ['exec "$0" "$@"', *(_CLOSING[descriptor] for descriptor in closed)]
     if memory_limit is not None:
-        if _is_sanitized():
+        if is_sanitized():
             env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
         else:
             shell.insert(0, f"ulimit -v {memory_limit >> 10} &&")
@@ -102,9 +120,27 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
 
 
-def _is_sanitized():
+def is_sanitized():
     """Whether the executable has its own idea of the address space, which a limit would break."""
     return b"__asan_init" in Path(tool()).read_bytes()
+
+
+def unprivileged(directory):
+    """The prefix that runs the tool as a user who may not do everything, with the directory, as it is now, handed
+    over to that user. Empty where this is such a user already; where there is no other, the test is skipped."""
+    if os.geteuid() != 0:
+        return ()
+    nobody = 65534
+    counting = (f"{name}={value}" for name, value in counting_from_start().items())
+    prefix = ("env", *counting, "setpriv", f"--reuid={nobody}", f"--regid={nobody}", "--clear-groups")
+    tried = shutil.which("setpriv") and subprocess.run(
+        [*prefix, tool(), "unknown"], stdin=subprocess.DEVNULL, capture_output=True, check=False).returncode == 1
+    if not tried:
+        raise unittest.SkipTest("nothing is forbidden to this user, and no other may run the tool")
+    for folder, folders, files in os.walk(directory):
+        for name in (".", *folders, *files):
+            os.lchown(os.path.join(folder, name), nobody, nobody)
+    return prefix
 
 
 def has_gnu_parallel():

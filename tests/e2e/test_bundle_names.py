@@ -346,22 +346,11 @@ class InsideTest(BundleTestCase):
         self.assertEqual(self.info(), {})
         self.assertOutsideUntouched()
 
-    def test_a_download_does_not_replace_a_directory(self):
-        (self.bundle / "a.mp3").mkdir()
-        self.assertWarns(self.create_episodes(self.url), 'Could not save or download episode "(null)"')
-        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", "a.mp3"})
-
     def test_a_hard_link_is_not_written_through(self):
         os.link(self.path("outside"), self.bundle / "a.mp3")
         self.assertWarns(self.create_episodes(self.url))
         self.assertEqual(self.files(), {"a.mp3": b"media"})
         self.assertOutsideUntouched()
-
-    def test_a_fifo_is_replaced_and_never_waited_for(self):
-        os.mkfifo(self.bundle / "a.mp3")
-        os.mkfifo(self.bundle / "Info.plist")
-        self.assertWarns(self.create_episodes(self.url, timeout=30))
-        self.assertEqual(self.files(), {"a.mp3": b"media"})
 
     def test_an_attackers_feed(self):
         web = self.server()

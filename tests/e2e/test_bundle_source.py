@@ -4,7 +4,6 @@ Media and the podcast's poster are found inside the bundle; an episode's poster 
 "Info.plist" names it, relative to the directory in which the tool runs.
 """
 
-import os
 import plistlib
 import unittest
 from pathlib import Path
@@ -59,15 +58,6 @@ class ResolutionTest(BundleSourceTestCase):
             with self.subTest(name):
                 self.write("show.podcast/Info.plist", content)
                 self.assertNoSource("show.podcast")
-
-    def test_a_directory_in_the_reference_files_place(self):
-        (self.bundle / "Info.plist").mkdir(parents=True)
-        self.assertNoSource("show.podcast")
-
-    def test_a_fifo_in_the_reference_files_place(self):
-        self.bundle.mkdir()
-        os.mkfifo(self.bundle / "Info.plist")
-        self.assertNoSource("show.podcast", timeout=20)
 
     def test_a_binary_reference_file(self):
         path = self.make({"PodcastName": "Night Walks"}, fmt=plistlib.FMT_BINARY)

@@ -1,13 +1,10 @@
 """Feeds are fetched from servers that redirect, compress, dawdle, lie and break; each has one right outcome.
 
 A fetch succeeds with status 200 and a whole body, and in no other way; nothing half-fetched is ever used.
+What servers can do wrong in one answer is in lies.py; here are requests, and what takes several answers.
 """
 
 import gzip
-import shutil
-import socket
-import ssl
-import subprocess
 import unittest
 
 from support import ToolTestCase, rss
@@ -75,11 +72,6 @@ class RequestTest(TransportTestCase):
 
 
 class RedirectTest(TransportTestCase):
-    def test_every_kind_of_redirect_is_followed(self):
-        for status in (301, 302, 303, 307, 308):
-            with self.subTest(status):
-                self.assertFetches(self.web.redirect(f"/{status}", self.web.url("/feed.xml"), status))
-
     def test_relative_locations(self):
         self.web.serve("/a/feed.xml", FEED)
         self.web.serve("/a/b?q=1", FEED)
@@ -109,109 +101,23 @@ class RedirectTest(TransportTestCase):
         self.assertFetches(self.web.redirect_chain("/hop", 5, "/feed.xml"))
         self.assertEqual(self.web.connections, 1)
 
-    def test_other_schemes_are_not_followed(self):
-        secret = self.write("feed.xml", FEED).as_uri()
-        for location in (secret, f"ftp://127.0.0.1:{self.web.port}/feed.xml",
-                         f"gopher://127.0.0.1:{self.web.port}/feed.xml",
-                         "data:text/xml,%3Crss/%3E", f"pcast://127.0.0.1:{self.web.port}/feed.xml"):
-            with self.subTest(location):
-                self.assertFetchFails(self.web.redirect("/away", location))
-        self.assertEqual(self.web.hits("/feed.xml"), 0)
-
-    def test_a_location_that_is_no_url(self):
-        for location in ("http://", "http://[::1/", ""):
-            with self.subTest(location):
-                self.assertFetchFails(self.web.redirect("/away", location))
-
-    def test_a_redirect_without_location_is_no_feed(self):
-        for status in (301, 302, 307):
-            with self.subTest(status):
-                self.web.route("/lost", lambda exchange, status=status: exchange.reply(status, FEED))
-                self.assertFetchFails(self.web.url("/lost"), f".*{status}.*")
-
-    def test_a_redirect_to_a_missing_page(self):
-        self.assertFetchFails(self.web.redirect("/old", "/none"), ".*404.*")
-
 
 class StatusTest(TransportTestCase):
-    def test_only_status_200_is_a_feed(self):
-        for status in (201, 202, 203, 206, 226, 300, 400, 401, 403, 404, 410, 429, 500, 502, 503):
-            with self.subTest(status):
-                self.assertFetchFails(self.web.serve("/x", FEED, status), f".*{status}.*")
-
-    def test_a_status_without_body(self):
-        for status in (204, 304):
-            with self.subTest(status):
-                self.assertFetchFails(self.web.serve("/x", b"", status), f".*{status}.*")
-
     def test_a_failed_fetch_is_not_repeated(self):
         self.assertFetchFails(self.web.serve("/x", FEED, 503))
         self.assertEqual(self.web.hits("/x"), 1)
 
-    def test_an_interim_response_is_passed_over(self):
-        answer = b"HTTP/1.1 103 Early Hints\r\nLink: </x>\r\n\r\nHTTP/1.1 200 OK\r\nContent-Length: %d\r\n\r\n" % len(FEED)
-        self.assertFetches(self.web.raw("/hints", answer + FEED))
-
 
 class BodyTest(TransportTestCase):
-    def test_a_compressed_body(self):
-        self.assertFetches(self.web.compressed("/packed", FEED))
-
     def test_a_compressed_body_in_chunks(self):
         packed = gzip.compress(FEED)
         chunks = [packed[start:start + 5] for start in range(0, len(packed), 5)]
         self.assertFetches(self.web.chunked("/packed", chunks, headers=[("Content-Encoding", "gzip")]))
 
-    def test_a_compressed_body_cut_short_is_no_feed(self):
-        for cut in (1, 5, 8, 9, 12, 60):
-            with self.subTest(cut):
-                self.assertFetchFails(self.web.compressed("/cut", FEED, cut=cut))
-
-    def test_a_compressed_body_with_a_wrong_sum_is_no_feed(self):
-        packed = bytearray(gzip.compress(FEED))
-        packed[-8] ^= 1
-        self.assertFetchFails(self.web.serve("/sum", bytes(packed), headers=[("Content-Encoding", "gzip")]))
-
-    def test_a_coding_that_was_not_asked_for_never_passes_unread(self):
-        self.assertFetchFails(self.web.serve("/odd", gzip.compress(FEED), headers=[("Content-Encoding", "br")]))
-
-    def test_a_body_that_is_not_compressed_as_it_says(self):
-        self.assertFetchFails(self.web.serve("/lie", FEED, headers=[("Content-Encoding", "gzip")]))
-
     def test_a_compressed_feed_much_larger_than_its_packing(self):
         description = "d" * 20_000_000
         url = self.web.compressed("/large", rss("<title>Night Walks</title>", f"<x>{description}</x>"))
         self.assertFetches(url)
-
-    def test_chunks(self):
-        chunks = [FEED[start:start + 7] for start in range(0, len(FEED), 7)]
-        self.assertFetches(self.web.chunked("/chunks", chunks))
-
-    def test_unfinished_chunks_are_no_feed(self):
-        self.assertFetchFails(self.web.chunked("/chunks", [FEED], finished=False))
-
-    def test_broken_chunks_are_no_feed(self):
-        head = b"HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n"
-        for name, body in (("no number", b"zz\r\n" + FEED + b"\r\n0\r\n\r\n"),
-                           ("too long", b"%x\r\n" % (len(FEED) + 9) + FEED),
-                           ("too short", b"5\r\n" + FEED + b"\r\n0\r\n\r\n")):
-            with self.subTest(name):
-                self.assertFetchFails(self.web.raw("/broken", head + body))
-
-    def test_a_body_shorter_than_announced_is_no_feed(self):
-        for missing in (1, 100_000):
-            with self.subTest(missing):
-                self.assertFetchFails(self.web.truncated("/short", FEED, missing))
-
-    def test_a_body_that_ends_with_the_connection(self):
-        self.assertFetches(self.web.until_closed("/closed", FEED))
-
-    def test_a_slow_body(self):
-        self.assertFetches(self.web.dripping("/slow", FEED, pause=0.005))
-
-    def test_an_empty_body(self):
-        self.assertFails(self.run_tool("parsefeed", self.web.serve("/empty", b"")),
-                         "Could not load source: Could not load or read the specified feed URL")
 
     def test_a_large_body(self):
         items = "".join(f"<item><title>Episode {number}</title></item>" for number in range(100_000))
@@ -230,48 +136,6 @@ class BodyTest(TransportTestCase):
 
 
 class BrokenConnectionTest(TransportTestCase):
-    def test_a_reset_before_the_answer(self):
-        self.assertFetchFails(self.web.reset("/reset"))
-
-    def test_a_reset_in_the_body(self):
-        head = b"HTTP/1.1 200 OK\r\nContent-Length: %d\r\n\r\n" % (len(FEED) + 10)
-        self.assertFetchFails(self.web.reset("/reset", head + FEED))
-
-    def test_an_empty_reply(self):
-        self.assertFetchFails(self.web.empty_reply("/empty"))
-
-    def test_an_answer_that_is_no_http(self):
-        for name, answer in (("text", b"hello\r\n"), ("a feed", FEED), ("a cut head", b"HTTP/1.1 200 OK\r\nContent-Le"),
-                             ("an odd status", b"HTTP/1.1 abc\r\n\r\n"), ("zeros", bytes(1000)),
-                             ("an endless line", b"HTTP/1.1 200 " + b"x" * 2_000_000)):
-            with self.subTest(name):
-                self.assertFetchFails(self.web.raw("/odd", answer))
-
-    def test_endless_header_fields(self):
-        answer = b"HTTP/1.1 200 OK\r\n" + b"X-Padding: padding\r\n" * 500_000 + b"\r\n"
-        self.assertFetchFails(self.web.raw("/fields", answer))
-
-    def test_nobody_listens(self):
-        with socket.socket() as taken:
-            taken.bind(("127.0.0.1", 0))  # bound, yet not listening: nobody else can have the port
-            self.assertFetchFails(f"http://127.0.0.1:{taken.getsockname()[1]}/feed.xml")
-
-    def test_plain_http_where_tls_is_expected(self):
-        self.assertFetchFails(self.web.url("/feed.xml", scheme="https"))
-        self.assertEqual(self.web.requests, [])
-
-    @unittest.skipUnless(shutil.which("openssl"), "the certificate is made by openssl")
-    def test_a_certificate_that_nobody_vouches_for(self):
-        subprocess.run(["openssl", "req", "-x509", "-newkey", "rsa:2048", "-nodes", "-keyout", "key.pem", "-out",
-                        "cert.pem",
-                        "-days", "2", "-subj", "/CN=localhost", "-addext", "subjectAltName=DNS:localhost,IP:127.0.0.1"],
-                       cwd=self.directory, check=True, capture_output=True)
-        context = ssl.SSLContext(ssl.PROTOCOL_TLS_SERVER)
-        context.load_cert_chain(self.path("cert.pem"), self.path("key.pem"))
-        self.web.use_tls(context)
-        self.assertFetchFails(self.web.url("/feed.xml", scheme="https"))
-        self.assertEqual(self.web.requests, [])
-
     def test_a_failed_fetch_writes_nothing(self):
         self.write("out", b"old")
         for url in (self.web.url("/none"), self.web.truncated("/short", FEED, 5), self.web.reset("/reset")):

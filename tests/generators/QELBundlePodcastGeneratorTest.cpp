@@ -3,15 +3,19 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cerrno>
+#include <cstddef>
 #include <cstdio>
 #include <filesystem>
 #include <fstream>
+#include <functional>
 #include <set>
 #include <string>
 
 #include "cli/QELProgress.h"
 #include "platform/FileManager.h"
 #include "platform/PropertyListReader.h"
+#include "tests/support/InterposedCalls.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace {
@@ -105,9 +109,12 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
 
 TEST_F(QELBundlePodcastGeneratorTest, NoOutputPathFailsWithCodeOne) {
   QELBundlePodcastGenerator generator;
+  EXPECT_EQ(generator.outputPath(), std::nullopt);
   platform::ErrorSlot error;
   EXPECT_FALSE(generator.generateFromSource(source, error));
   EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 1, "No output path was provided"}));
+  generator.setOutputPath("a.podcast");
+  EXPECT_EQ(generator.outputPath(), "a.podcast");
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, DirectoryThatCannotBeCreatedFailsWithCodeTwo) {
@@ -128,6 +135,19 @@ TEST_F(QELBundlePodcastGeneratorTest, ReferenceFileThatCannotBeWrittenFailsWithC
   EXPECT_FALSE(generator.generateFromSource(source, error));
   EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 1, "Could not write Info.plist file"}));
   EXPECT_EQ(contents(), (std::set<std::string>{"Info.plist", "Posters", "a.mp3"}));
+}
+
+TEST_F(QELBundlePodcastGeneratorTest, ReferenceFileThatCannotBeBegunFailsWithCodeOne) {
+  const Interposed names(&InterposedCalls::getentropy, std::function([](void*, std::size_t) {
+    errno = EIO;
+    return -1;
+  }));
+  QELBundlePodcastGenerator generator;
+  generator.setOutputPath(bundlePath().string());
+  platform::ErrorSlot error;
+  EXPECT_FALSE(generator.generateFromSource(source, error));
+  EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 1, "Could not write Info.plist file"}));
+  EXPECT_EQ(contents(), std::set<std::string>{"Posters"});
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, PodcastWithoutEpisodes) {

@@ -270,6 +270,18 @@ TEST(QELFeedPodcastGeneratorTest, AtomIsAnEmptyDocument) {
   EXPECT_EQ(document.substr(0, document.find_last_not_of('\n') + 1), kDeclaration);
 }
 
+TEST(QELFeedPodcastGeneratorTest, NothingFillsAnElementForAtom) {
+  platform::XMLDocument document;
+  const platform::XMLElement feed = document.setRoot("feed");
+  QELPodcastSource source;
+  source.setTitle("t");
+  QELPopulateAtomElementFromItem(feed, source);
+  const auto episode = unorderedEpisode();
+  episode->setTitle("t");
+  QELPopulateAtomElementFromItem(feed, *episode);
+  EXPECT_EQ(compact(document.serialised()), std::string(kDeclaration) + "<feed />\n");
+}
+
 TEST(QELFeedPodcastGeneratorTest, UnknownFormatFailsAndKeepsTheEarlierDocument) {
   for (const char* format : {"RSS", "Atom", "", "rss "}) {
     QELFeedPodcastGenerator generator;

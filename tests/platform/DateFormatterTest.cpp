@@ -57,6 +57,11 @@ TEST(DateFormatterTest, OffsetIsThatOfTheDate) {
   }
 }
 
+TEST(DateFormatterTest, LocaleOfAnotherCalendarCountsByIt) {
+  const Settings settings("fa_IR", nullptr, nullptr, "UTC");
+  EXPECT_EQ(DateFormatter("dd MMMM yyyy HH:mm:ss").format(kDate), "۱۵ خرداد ۱۳۸۶ ۲۱:۳۰:۰۰");
+}
+
 TEST(DateFormatterTest, FirstVariableThatIsNotEmptyNamesTheLocale) {
   const std::string english = "Tue, 05 Jun 2007 21:30:00 GMT";
   const std::string german = "Di., 05 Juni 2007 21:30:00 GMT";

@@ -280,12 +280,31 @@ TEST_F(DownloadTest, MissingDirectoryIsAFailure) {
               ElementsAre("failed: POSIX 2: No such file or directory"));
 }
 
+TEST_F(DownloadTest, LongBodyOfAnotherStatusIsThatStatus) {
+  // Only the beginning of such a body is read.
+  EXPECT_THAT(downloadAnswer("HTTP/1.1 206 Partial Content\r\nContent-Length: 1000000\r\n\r\n" +
+                             std::string(1000000, 'x')),
+              ElementsAre("failed: HTTP 206: HTTP status 206"));
+  EXPECT_THAT(names(), ElementsAre());
+}
+
+TEST_F(DownloadTest, FileThatCannotBeReadToItsEndIsAFailure) {
+  // At its start no process has memory.
+  EXPECT_THAT(download("file:///proc/self/mem"),
+              ElementsAre("response 0", "failed: POSIX 5: Input/output error"));
+  EXPECT_THAT(names(), ElementsAre());
+}
+
 TEST_F(DownloadTest, ReadOnlyDirectoryIsAFailure) {
   std::filesystem::permissions(
       directory_, std::filesystem::perms::owner_read | std::filesystem::perms::owner_exec);
-  if (access(directory_.c_str(), W_OK) == 0) GTEST_SKIP() << "this user may write everywhere";
-  EXPECT_THAT(downloadAnswer(HTTPTestServer::response("media")),
-              ElementsAre("failed: POSIX 13: Permission denied"));
+  // The superuser may write everywhere, and becomes another for a moment.
+  const uid_t user = geteuid();
+  const uid_t nobody = 65534;
+  if (user == 0 && seteuid(nobody) != 0) GTEST_SKIP() << "this user may write everywhere";
+  const std::vector<std::string> events = downloadAnswer(HTTPTestServer::response("media"));
+  ASSERT_EQ(seteuid(user), 0);
+  EXPECT_THAT(events, ElementsAre("failed: POSIX 13: Permission denied"));
 }
 
 TEST_F(DownloadTest, DirectoryAtTheDestinationIsAFailure) {

@@ -9,6 +9,7 @@
 #include <thread>
 
 #include "platform/Download.h"
+#include "platform/EventSource.h"
 #include "tests/support/HTTPTestServer.h"
 
 namespace platform {
@@ -41,6 +42,16 @@ class EventLoopTest : public ::testing::Test {
 };
 
 TEST_F(EventLoopTest, HasNothingToWaitForWithoutADownload) {
+  EXPECT_FALSE(runEventLoopOnce());
+}
+
+TEST_F(EventLoopTest, SourceThatNothingCanHappenToEndsTheWait) {
+  class Idle : public EventSource {
+   public:
+    bool hasEvent() const override { return false; }
+    void deliverEvent() override { ADD_FAILURE(); }
+  };
+  const Idle idle;
   EXPECT_FALSE(runEventLoopOnce());
 }
 

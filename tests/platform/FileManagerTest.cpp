@@ -12,11 +12,13 @@
 #include <array>
 #include <cerrno>
 #include <filesystem>
+#include <functional>
 #include <utility>
 #include <vector>
 
 #include "platform/FileDescriptor.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/InterposedCalls.h"
 #include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -237,6 +239,65 @@ TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
               0);
     EXPECT_EQ(contentOf(copy), content);
   }
+}
+
+TEST_F(FileManagerTest, CopyGoesOnAfterASignal) {
+  int calls = 0;
+  const Interposed signals(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    errno = ++calls == 1 ? EINTR : EXDEV;
+    return ssize_t{-1};
+  }));
+  EXPECT_TRUE(copyFile(directory_.addFile("source", "content"), directory_ / "copy"));
+  EXPECT_EQ(calls, 2);
+  EXPECT_EQ(contentOf(directory_ / "copy"), "content");
+}
+
+TEST_F(FileManagerTest, CopyLeavesAloneWhatAppearsMeanwhile) {
+  const Interposed others(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    directory_.addFile("copy", "of another process");
+    return ssize_t{0};
+  }));
+  EXPECT_FALSE(copyFile(directory_.addFile("source", "content"), directory_ / "copy"));
+  EXPECT_EQ(contentOf(directory_ / "copy"), "of another process");
+  EXPECT_THAT(directory_.names(), ElementsAre("copy", "source"));
+}
+
+TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
+  const std::string source = directory_.addFile("source", "content");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              if (!refuseSystemCall(SYS_read, EIO)) {
+                return 1;
+              }
+              return copyFile(source, directory_ / "copy") ? 2 : 0;
+            }),
+            0);
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
+}
+
+TEST_F(FileManagerTest, WholeReadTellsWhyItFailed) {
+  const std::string path = directory_.addFile("file", "content");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              if (!refuseSystemCall(SYS_read, EIO)) {
+                return 1;
+              }
+              ErrorSlot error;
+              if (readWholeFile(path, error)) {
+                return 2;
+              }
+              return error == ErrorRecord{"POSIX", EIO, "Input/output error"} ? 0 : 3;
+            }),
+            0);
+}
+
+TEST_F(FileManagerTest, DirectoryThatAnotherProcessMakesFirstIsAccepted) {
+  const Interposed quicker(&InterposedCalls::mkdir,
+                           std::function([](const char* path, mode_t mode) {
+                             ::mkdirat(AT_FDCWD, path, mode);
+                             return ::mkdirat(AT_FDCWD, path, mode);
+                           }));
+  EXPECT_TRUE(createDirectories(directory_ / "a/b/c", error_));
+  EXPECT_EQ(error_, std::nullopt);
+  EXPECT_TRUE(std::filesystem::is_directory(directory_ / "a/b/c"));
 }
 
 TEST_F(FileManagerTest, CopyRefusesAnExistingDestination) {

@@ -109,6 +109,7 @@ TEST(GregorianCalendarTest, WhatTheCalendarCannotCountIsAbsent) {
       components(std::int64_t{1} << 32, 1, 1),
       components(1970, std::int64_t{1} << 32, 1),
       components(1970, 1, (std::int64_t{1} << 32)),
+      components(1970, 1, kMin),
       components(1970, 1, 1, std::int64_t{1} << 40),
       components(1970, 1, 1, 0, std::int64_t{1} << 44),
       components(1970, 1, 1, 0, 0, std::int64_t{1} << 50),
@@ -116,6 +117,14 @@ TEST(GregorianCalendarTest, WhatTheCalendarCannotCountIsAbsent) {
   for (const auto& fields : rejected) {
     EXPECT_FALSE(GregorianCalendar().dateFromComponents(fields))
         << *fields.year << " " << *fields.month << " " << *fields.day << " " << *fields.hour;
+  }
+}
+
+TEST(GregorianCalendarTest, ZoneThatLeadsBeyondWhatCanBeCountedIsAbsent) {
+  for (const std::int64_t sign : {1, -1}) {
+    DateComponents fields = components(1970, 1, 1, 0, 0, sign * 9'223'372'036'854'775);
+    fields.timeZone = TimeZone::withOffset(-sign * 1'000'000'000'000);
+    EXPECT_FALSE(GregorianCalendar().dateFromComponents(fields)) << sign;
   }
 }
 

@@ -627,6 +627,56 @@ TEST(PropertyListReaderTest, RefusesOverlappingTextsThatExplode) {
             "PropertyList 2: a binary property list whose shared objects make it too large");
 }
 
+TEST(PropertyListReaderTest, RefusesSharedTextsThatWouldBeWrittenTooOften) {
+  const auto outcomeOf = [](std::size_t size, std::size_t count) {
+    BinaryPropertyList list(2);
+    const auto key = list.addText("EpisodeName");
+    const auto text = list.addText(std::string(size, 'x'));
+    std::vector<std::uint64_t> entries;
+    for (std::size_t i = 0; i < count; ++i) entries.push_back(list.addDictionary({key}, {text}));
+    return outcome(list.bytes(list.addArray(entries))).substr(0, 100);
+  };
+  EXPECT_TRUE(outcomeOf(10'000, 1000).starts_with("[{\"EpisodeName\": \"xxx"));
+  EXPECT_EQ(outcomeOf(100'000, 1000),
+            "PropertyList 2: a binary property list whose shared objects make it too large");
+}
+
+TEST(PropertyListReaderTest, CountsWhatTextsBecome) {
+  // Overlapping texts of bytes that are no ASCII: each byte becomes the three of U+FFFD.
+  const auto outcomeOf = [](std::size_t size, std::size_t count) {
+    BinaryPropertyList list(4);
+    const std::string head = "\x5F\x12" + bigEndian(size, 4);
+    std::vector<std::uint64_t> texts;
+    for (std::size_t i = 0; i < count; ++i) texts.push_back(list.addBytes(head));
+    list.addBytes(std::string(size, '\xFF'));
+    return outcome(list.bytes(list.addArray(texts))).substr(0, 100);
+  };
+  // 10 MB of bytes, which would pass, but nearly 30 MB of UTF-8.
+  EXPECT_EQ(outcomeOf(10'000, 100).substr(0, 2), "[\"");
+  EXPECT_EQ(outcomeOf(10'000, 1000),
+            "PropertyList 2: a binary property list whose shared objects make it too large");
+}
+
+TEST(PropertyListReaderTest, RefusesSharedElementsThatWouldBecomeTooManyRecords) {
+  for (const std::string& element : {"\x09"s, "\xD0"s, "\x51x"s}) {
+    const auto outcomeOf = [&element](std::size_t count) {
+      BinaryPropertyList list;
+      const std::vector<std::uint64_t> elements(count, list.addBytes(element));
+      return outcome(list.bytes(list.addArray(elements))).substr(0, 100);
+    };
+    EXPECT_TRUE(outcomeOf(30'000).starts_with("["));
+    EXPECT_EQ(outcomeOf(100'000),
+              "PropertyList 2: a binary property list whose shared objects make it too large");
+  }
+}
+
+TEST(PropertyListReaderTest, AcceptsUnsharedObjectsInAnyNumber) {
+  BinaryPropertyList list(4);
+  std::vector<std::uint64_t> elements;
+  for (int i = 0; i < 300'000; ++i) elements.push_back(list.addBytes("\xD0"));
+  EXPECT_TRUE(outcome(list.bytes(list.addArray(elements))).starts_with("[{}, {}"));
+}
+
 std::string smallBinaryList() {
   BinaryPropertyList list;
   const auto name = list.addText("Name");

@@ -168,6 +168,90 @@ TEST_F(ResourceReaderTest, CompressionBombEndsAtTheLimit) {
             "transfer 63: The resource is larger than 1000000 bytes");
 }
 
+TEST_F(ResourceReaderTest, SmallDocumentsMayHaveAnyRatio) {
+  std::string packed;
+  for (int i = 0; i < 1000; ++i) packed += kGzipZeros;
+  server_.serve("/packed", HTTPTestServer::response(packed, kGzipHeader));
+  EXPECT_EQ(read(server_.url("/packed")).size(), 1000U * 65'536U);
+}
+
+TEST_F(ResourceReaderTest, CompressionBombEndsBeforeItIsAHundredTimesItsSize) {
+  std::string bomb;
+  for (int i = 0; i < 1100; ++i) bomb += kGzipZeros;  // 69 MiB, almost 700 times its size
+  server_.serve("/bomb", HTTPTestServer::response(bomb, kGzipHeader));
+  EXPECT_EQ(read(server_.url("/bomb")),
+            "transfer 63: The body is more than 100 times as large as its compressed form");
+}
+
+TEST_F(ResourceReaderTest, ContentCodingsThatWereNotAskedForAreFailures) {
+  for (const std::string coding :
+       {"br", "deflate", "zstd", "compress", "X-Compress", "gzip, gzip", "gzip , br"}) {
+    EXPECT_EQ(readAnswer(HTTPTestServer::response(
+                  "<rss/>", std::string("Content-Encoding: ").append(coding).append("\r\n"))),
+              "transfer 61: The body comes in a content coding that was not asked for")
+        << coding;
+  }
+}
+
+TEST_F(ResourceReaderTest, NamesThatAreNoContentCodingsDoNoHarm) {
+  for (const std::string coding : {"", "identity", "none", "utf-8", "binary, identity"}) {
+    EXPECT_EQ(readAnswer(HTTPTestServer::response(
+                  "<rss/>", std::string("Content-Encoding: ").append(coding).append("\r\n"))),
+              "<rss/>")
+        << coding;
+  }
+}
+
+TEST_F(ResourceReaderTest, HeaderThatDoesNotTellWhereTheBodyEndsIsAFailure) {
+  EXPECT_EQ(readAnswer(HTTPTestServer::response("<rss/>", "Content-Length: 5\r\n")),
+            "transfer 18: The announced lengths contradict each other");
+  EXPECT_EQ(readAnswer(HTTPTestServer::response("<rss/>", "Transfer-Encoding: gzip\r\n")),
+            "transfer 18: The body comes in a transfer coding that was not asked for");
+  EXPECT_EQ(readAnswer(
+                HTTPTestServer::response("", "Location: /x\r\nContent-Length: 5\r\n", "302 Found")),
+            "transfer 18: The announced lengths contradict each other");
+  EXPECT_EQ(readAnswer(HTTPTestServer::response("", "Content-Length: 5\r\n", "404 Not Found")),
+            "HTTP 404: HTTP status 404");
+}
+
+TEST_F(ResourceReaderTest, HeaderThatIsCutShortIsAFailure) {
+  for (const char* header : {"HTTP/1.1 200 OK\r\n", "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n"}) {
+    EXPECT_EQ(readAnswerAndClose(header), "transfer 18: The header of the answer is cut short");
+  }
+}
+
+TEST_F(ResourceReaderTest, HeaderLineBeyondAllBoundsIsNamedAsThePossibleCause) {
+  EXPECT_EQ(readAnswerAndClose("HTTP/1.1 200 OK\r\nX: " + std::string(200'000, 'x')),
+            "transfer 27: A line of the answer's header is too long, or memory has run out");
+}
+
+TEST_F(ResourceReaderTest, EndlessTrailersAreAFailure) {
+  server_.serve("/endless", [](Connection& connection) {
+    connection.send("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n");
+    std::string trailers;
+    while (trailers.size() < 10'000) trailers += "X: y\r\n";
+    while (connection.send(trailers)) continue;
+    connection.close();
+  });
+  EXPECT_EQ(read(server_.url("/endless")), "transfer 63: The header is longer than 1 MiB");
+}
+
+TEST_F(ResourceReaderTest, EndlessPageOfARedirectIsAFailure) {
+  server_.serve("/endless", [](Connection& connection) {
+    connection.send("HTTP/1.1 302 x\r\nLocation: /y\r\nContent-Length: 1000000000000\r\n\r\n");
+    while (connection.send(std::string(100'000, 'x'))) continue;
+    connection.close();
+  });
+  EXPECT_EQ(read(server_.url("/endless")), "transfer 63: The page of a redirect never ends");
+}
+
+TEST_F(ResourceReaderTest, LongPageOfARedirectDoesNoHarm) {
+  server_.serve(
+      "/1", HTTPTestServer::response(std::string(1'000'000, 'x'), "Location: /2\r\n", "302 Found"));
+  server_.serve("/2", HTTPTestServer::response("arrived"));
+  EXPECT_EQ(read(server_.url("/1")), "arrived");
+}
+
 TEST_F(ResourceReaderTest, LimitIsTheLastLengthThatIsTaken) {
   server_.serve("/known", HTTPTestServer::response("12345"));
   server_.serve("/unknown", [](Connection& connection) {

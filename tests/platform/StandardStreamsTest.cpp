@@ -5,9 +5,11 @@
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <csignal>
 #include <cstdio>
 #include <functional>
@@ -15,6 +17,7 @@
 
 #include "platform/FileDescriptor.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace platform {
@@ -114,6 +117,20 @@ TEST_F(StandardStreamsTest, UnreadableStandardInputIsEmpty) {
             0);
 }
 
+TEST_F(StandardStreamsTest, StandardInputThatCannotBeWaitedForIsItsEnd) {
+  const Connection pipe = makePipe();
+  makeNonBlocking(pipe.readEnd);
+  ASSERT_TRUE(writeAll(pipe.writeEnd.get(), "first"));
+  EXPECT_EQ(exitStatusOfChild([&] {
+              ::dup2(pipe.readEnd.get(), STDIN_FILENO);
+              if (!refuseSystemCall(SYS_poll, ENOMEM)) {
+                return 1;
+              }
+              return readStandardInput() == "first" ? 0 : 2;
+            }),
+            0);
+}
+
 TEST_F(StandardStreamsTest, StandardErrorIsNotBuffered) {
   const Connection pipe = makePipe();
   EXPECT_EQ(exitStatusOfChild([&] {
@@ -137,6 +154,42 @@ TEST_F(StandardStreamsTest, StandardOutputIsWrittenWhenFlushed) {
                                    const bool isBuffered = contentOf(path).empty();
                                    flushStandardOutput();
                                    return isBuffered && contentOf(path) == "progress";
+                                 }),
+            0);
+}
+
+TEST_F(StandardStreamsTest, PrintedTextWaitsForANonBlockingOutput) {
+  const std::string text = longText();
+  Connection pipe = makePipe();
+  makeNonBlocking(pipe.writeEnd);
+  std::string bytes;
+  std::thread reader([&] {
+    ::usleep(20000);
+    bytes = allFrom(pipe.readEnd);
+  });
+  EXPECT_EQ(exitStatusWithOutput(pipe.writeEnd,
+                                 [&] {
+                                   writeToStandardOutput(text);
+                                   flushStandardOutput();
+                                   return true;
+                                 }),
+            0);
+  pipe.writeEnd.close();
+  reader.join();
+  EXPECT_TRUE(bytes == text) << bytes.size() << " bytes";
+}
+
+TEST_F(StandardStreamsTest, PrintedTextThatIsRefusedIsGone) {
+  const std::string path = directory_.addFile("out", "");
+  EXPECT_EQ(exitStatusWithOutput(FileDescriptor::open("/dev/full", O_WRONLY),
+                                 [&] {
+                                   writeToStandardOutput("refused");
+                                   flushStandardOutput();
+                                   ::dup2(FileDescriptor::open(path, O_WRONLY).get(),
+                                          STDOUT_FILENO);
+                                   writeToStandardOutput("taken");
+                                   flushStandardOutput();
+                                   return contentOf(path) == "taken";
                                  }),
             0);
 }

@@ -12,10 +12,13 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
+#include <cstring>
 #include <filesystem>
+#include <functional>
 #include <thread>
 
 #include "tests/support/ChildProcess.h"
+#include "tests/support/InterposedCalls.h"
 #include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -198,6 +201,101 @@ TEST_F(TemporaryFileTest, DoesWithoutLocks) {
   EXPECT_THAT(directory_.names(), ElementsAre("a"));
 }
 
+TEST_F(TemporaryFileTest, FailedCloseFailsTheCommit) {
+  directory_.addFile("a", "kept");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              TemporaryFile file;
+              ErrorSlot error;
+              if (!file.create(directory_ / "a", error) || !refuseSystemCall(SYS_close, EIO)) {
+                return 1;
+              }
+              if (file.commitReplacing(error) || !error) {
+                return 2;
+              }
+              return error->description == "Input/output error" ? 0 : 3;
+            }),
+            0);
+  EXPECT_THAT(directory_.names(), ElementsAre("a"));
+  EXPECT_EQ(contentOf(directory_ / "a"), "kept");
+}
+
+/// Has hidden names be made of this byte alone.
+int fillWith(unsigned char byte, void* buffer, std::size_t length) {
+  std::memset(buffer, byte, length);
+  return 0;
+}
+
+TEST_F(TemporaryFileTest, TriesAnotherNameForOneThatIsTaken) {
+  directory_.addFile(".qel-0101010101010101.part", "kept");
+  unsigned char byte = 0;
+  const Interposed names(
+      &InterposedCalls::getentropy,
+      std::function([&](void* buffer, std::size_t n) { return fillWith(++byte, buffer, n); }));
+  ASSERT_TRUE(createWith("x", directory_ / "a"));
+  EXPECT_THAT(directory_.names(),
+              ElementsAre(".qel-0101010101010101.part", ".qel-0202020202020202.part"));
+  EXPECT_EQ(contentOf(directory_ / ".qel-0101010101010101.part"), "kept");
+}
+
+TEST_F(TemporaryFileTest, GivesUpWhenEveryNameIsTaken) {
+  directory_.addFile(".qel-0707070707070707.part", "kept");
+  int attempts = 0;
+  const Interposed names(&InterposedCalls::getentropy,
+                         std::function([&](void* buffer, std::size_t n) {
+                           ++attempts;
+                           return fillWith(7, buffer, n);
+                         }));
+  EXPECT_FALSE(file_.create(directory_ / "a", error_));
+  EXPECT_EQ(description(), "File exists");
+  EXPECT_EQ(attempts, 100);
+  EXPECT_EQ(contentOf(directory_ / ".qel-0707070707070707.part"), "kept");
+}
+
+TEST_F(TemporaryFileTest, FailsWithoutRandomBytes) {
+  const Interposed names(&InterposedCalls::getentropy, std::function([](void*, std::size_t) {
+    errno = ENOSYS;
+    return -1;
+  }));
+  EXPECT_FALSE(file_.create(directory_ / "a", error_));
+  EXPECT_EQ(description(), "Function not implemented");
+  EXPECT_THAT(directory_.names(), IsEmpty());
+}
+
+// Between the creation of a file and its lock, a remover can take it for stale.
+TEST_F(TemporaryFileTest, TriesAgainWhenAnotherHasLockedTheFile) {
+  FileDescriptor remover;
+  std::string taken;
+  const Interposed locks(&InterposedCalls::flock, std::function([&](int descriptor, int operation) {
+    if (!remover.isOpen()) {
+      taken = directory_.names().at(0);
+      remover = FileDescriptor::open(directory_ / taken, O_RDWR);
+      ::syscall(SYS_flock, remover.get(), LOCK_EX);
+    }
+    return static_cast<int>(::syscall(SYS_flock, descriptor, operation));
+  }));
+  ASSERT_TRUE(createWith("x", directory_ / "a"));
+  ASSERT_EQ(directory_.names().size(), 1U);
+  EXPECT_NE(directory_.names().at(0), taken);
+  ASSERT_TRUE(file_.commitNew(error_)) << description();
+  EXPECT_EQ(contentOf(directory_ / "a"), "x");
+}
+
+TEST_F(TemporaryFileTest, TriesAgainWhenAnotherHasRemovedTheFile) {
+  std::string removed;
+  const Interposed locks(&InterposedCalls::flock, std::function([&](int descriptor, int operation) {
+    if (removed.empty()) {
+      removed = directory_.names().at(0);
+      ::unlink((directory_ / removed).c_str());
+    }
+    return static_cast<int>(::syscall(SYS_flock, descriptor, operation));
+  }));
+  ASSERT_TRUE(createWith("x", directory_ / "a"));
+  ASSERT_EQ(directory_.names().size(), 1U);
+  EXPECT_NE(directory_.names().at(0), removed);
+  ASSERT_TRUE(file_.commitNew(error_)) << description();
+  EXPECT_EQ(contentOf(directory_ / "a"), "x");
+}
+
 TEST_F(TemporaryFileTest, ShortWriteFailsAndRemovesTheFile) {
   EXPECT_EQ(
       exitStatusOfChild([&] {
@@ -341,10 +439,10 @@ TEST_F(TemporaryFileTest, FilesInUseAreNotStale) {
 }
 
 TEST_F(TemporaryFileTest, OnlyHiddenFilesOfOursAreStale) {
-  const std::array<const char*, 7> others = {
-      ".qel-0123456789abcdef.par",   ".qel-0123456789abcde.part", ".qel-0123456789abcdeff.part",
-      ".qel-0123456789ABCDEF.part",  "qel-0123456789abcdef.part", ".qel-0123456789abcdef.part.mp3",
-      "x.qel-0123456789abcdef.part",
+  const std::array<const char*, 9> others = {
+      ".qel+0123456789abcdef.part", ".qel-0123456789abcdef.para",     ".qel-0123456789abcdef.par",
+      ".qel-0123456789abcde.part",  ".qel-0123456789abcdeff.part",    ".qel-0123456789ABCDEF.part",
+      "qel-0123456789abcdef.part",  ".qel-0123456789abcdef.part.mp3", "x.qel-0123456789abcdef.part",
   };
   for (const char* name : others) {
     directory_.addFile(name, "kept");
@@ -362,6 +460,32 @@ TEST_F(TemporaryFileTest, RemovalOfStaleFilesFromAMissingDirectoryDoesNothing) {
   removeStaleTemporaryFiles(directory_ / "missing");
   removeStaleTemporaryFiles(directory_.addFile("file", "kept"));
   EXPECT_EQ(contentOf(directory_ / "file"), "kept");
+}
+
+TEST_F(TemporaryFileTest, StaleFilesOfTheWorkingDirectoryAreRemoved) {
+  directory_.addFile(".qel-0123456789abcdef.part", "stale");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              std::filesystem::current_path(directory_.path());
+              removeStaleTemporaryFiles("");
+              return 0;
+            }),
+            0);
+  EXPECT_THAT(directory_.names(), IsEmpty());
+}
+
+TEST_F(TemporaryFileTest, StaleFilesThatCannotBeOpenedStay) {
+  directory_.addFile(".qel-0123456789abcdef.part", "stale");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              // The directory takes the last descriptor that is to be had.
+              const FileDescriptor next(::dup(STDIN_FILENO));
+              const auto number = static_cast<rlim_t>(next.get());
+              const rlimit limit{number + 2, number + 2};
+              ::setrlimit(RLIMIT_NOFILE, &limit);
+              removeStaleTemporaryFiles(directory_.path());
+              return 0;
+            }),
+            0);
+  EXPECT_THAT(directory_.names(), ElementsAre(".qel-0123456789abcdef.part"));
 }
 
 // The remover sees new files before their owner has locked them; the owner must notice.

@@ -70,6 +70,7 @@ TEST(URLTest, Accepts) {
 
 TEST(URLTest, Rejects) {
   const std::vector<std::string> rows = {
+      "http://\u00FC." + std::string(300, 'a') + ".example/",
       "",
       ":",
       "://h/",
@@ -148,6 +149,14 @@ TEST(URLTest, Rejects) {
       "http://h/\xF4\x90\x80\x80",
       "http://\u00E9\u3002/\xFF",
       "http://\u200D.example/",
+      "http://a.example\uFF0F.b.example/",
+      "http://a\uFF1Fb/",
+      "http://a\uFF03b/",
+      "http://a\uFF20b/",
+      "http://a\uFF1A80/",
+      "http://a\uFF0541/",
+      "http://a\uFF3Bb/",
+      "x://a\u2009b/",
       "file:",
       "file:p",
       "file://",

@@ -144,6 +144,8 @@ TEST(XMLParserTest, ReadsEveryEncoding) {
       {"UTF-8, mark stronger than declaration",
        "\xEF\xBB\xBF<?xml version='1.0' encoding='ISO-8859-1'?><r>é</r>", "<r>é</r>"},
       {"UTF-8, declared as wide", "<?xml version='1.0' encoding='UTF-16'?><r>é</r>", "<r>é</r>"},
+      {"UTF-8, declared as still wider", "<?xml version='1.0' encoding='UTF-32'?><r>é</r>",
+       "<r>é</r>"},
       {"UTF-16LE with a mark", "\xFF\xFE" + widened(ascii, 0, 1), "<r>text</r>"},
       {"UTF-16BE with a mark", "\xFE\xFF" + widened(ascii, 1, 0), "<r>text</r>"},
       {"UTF-16LE with a mark, declared", "\xFF\xFE" + widened(utf16, 0, 1), "<r>text</r>"},
@@ -242,8 +244,22 @@ TEST(XMLParserTest, FaultsAreNamedWithLineAndColumn) {
       // Encodings.
       {"<?xml version='1.0' encoding='klingon'?>\n<r/>", 18,
        "unknown encoding \"klingon\" at line 1, column 31"},
+      {"<?xml version='1.0' "
+       "encoding='kkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkk"
+       "kx'?>\n<r/>",
+       18,
+       "unknown encoding \"kkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkkk...\" "
+       "at "
+       "line 1, column 31"},
       {"\n\n<?xml version='1.0'\nencoding=\"UTF-9\"?><r/>", 18,
        "unknown encoding \"UTF-9\" at line 4, column 11"},
+      {"<?xml é='1' encoding='UTF-9'?><r/>", 18, "unknown encoding \"UTF-9\" at line 1, column 23"},
+      {"<?xml version='1.0' encoding=''?><r/>", 30,
+       "XML declaration not well-formed at line 1, column 31"},
+      {"<?xml version='1.0' encoding='UTF 8'?><r/>", 30,
+       "XML declaration not well-formed at line 1, column 34"},
+      {"\0\0<\0"sv, 4, "not well-formed (invalid token) at line 1, column 1"},
+      {"<\0\0r"sv, 5, "unclosed token at line 1, column 1"},
       {"<?xml version='1.0' encoding='ISO-8859-1'?>\n<r>\xE9\xE9</b>", 7,
        "mismatched tag at line 2, column 8"},
       {"\xFF\xFE<\0r\0>\0\n\0<\0/\0b\0>\0"sv, 7, "mismatched tag at line 2, column 3"},
@@ -348,6 +364,135 @@ TEST(XMLParserTest, EntityBombsAreRefused) {
         "limit on input amplification factor (from DTD and entities) breached at line 2, column "))
         << error->description;
     EXPECT_LT(counter.length, 50'000'000U);
+  }
+}
+
+std::string chainOfEntities(std::size_t length) {
+  std::string chain = "<!ENTITY e0 'x'>";
+  for (std::size_t link = 1; link <= length; ++link) {
+    chain.append("<!ENTITY e").append(std::to_string(link));
+    chain.append(" '&e").append(std::to_string(link - 1)).append(";'>");
+  }
+  return chain;
+}
+
+TEST(XMLParserTest, EntitiesInsideOfEntitiesCannotExhaustTheStack) {
+  const struct {
+    std::string_view declaration;
+    std::string_view root;
+    std::string_view events;
+  } rows[] = {
+      {"", "<r>&eN;</r>", "<r>x</r>"},
+      {"", "<r a='&eN;'/>", "<r a=x></r>"},
+      {"<!ATTLIST r a CDATA '&eN;'>", "<r/>", "<r a=x></r>"},
+  };
+  for (const auto& row : rows) {
+    const auto outcome = [&row](std::size_t length) {
+      const auto withNumber = [length](std::string_view text) {
+        std::string result(text);
+        if (const std::size_t place = result.find('N'); place != std::string::npos) {
+          result.replace(place, 1, std::to_string(length));
+        }
+        return result;
+      };
+      return eventsOf("<!DOCTYPE r [\n" + chainOfEntities(length) + withNumber(row.declaration) +
+                      "]>" + withNumber(row.root));
+    };
+    EXPECT_EQ(outcome(1000), row.events);
+    for (const std::size_t length : {1001U, 100'000U}) {
+      EXPECT_TRUE(
+          outcome(length).starts_with("too many entities made of entities at line 2, column "))
+          << row.root << " " << outcome(length).substr(0, 200);
+    }
+  }
+}
+
+TEST(XMLParserTest, EntitiesThatHoldNoEntitiesMayBeMany) {
+  std::string declarations;
+  for (int entity = 0; entity < 5000; ++entity) {
+    declarations.append("<!ENTITY e").append(std::to_string(entity)).append(" '&#233;&#37;'>");
+  }
+  EXPECT_EQ(eventsOf("<!DOCTYPE r [" + declarations + "]><r>&e4999;</r>"), "<r>é%</r>");
+}
+
+std::string declaredAttributes(std::size_t count, std::string_view value) {
+  std::string declarations;
+  for (std::size_t attribute = 0; attribute < count; ++attribute) {
+    declarations.append("<!ATTLIST r a").append(std::to_string(attribute)).append(" CDATA ");
+    declarations.append(value).append(">");
+  }
+  return declarations;
+}
+
+TEST(XMLParserTest, DeclaredAttributesAreFew) {
+  for (const std::string_view value : {"'v'", "#IMPLIED", "#REQUIRED"}) {
+    EXPECT_EQ(eventsOf("<!DOCTYPE r [" + declaredAttributes(256, value) + "]><r/>"), "<r></r>");
+    EXPECT_TRUE(eventsOf("<!DOCTYPE r [" + declaredAttributes(257, value) + "]><r/>")
+                    .starts_with("too many declared attributes at line 1, column "))
+        << value;
+  }
+}
+
+/// Counts the bytes of what it receives.
+class Meter : public XMLParserEvents {
+ public:
+  void didStartElement(const XMLName& name, const XMLAttributes& attributes) override {
+    size += name.qualified.size() + attributes.value("a").value_or("").size();
+  }
+  void didEndElement(const XMLName&) override {}
+  void foundCharacters(std::string_view text) override { size += text.size(); }
+  std::size_t size = 0;
+};
+
+TEST(XMLParserTest, DeclarationsMakeNothingMuchLargerThanTheDocument) {
+  const auto repeated = [](std::string_view text, std::size_t count) {
+    std::string result;
+    for (std::size_t copy = 0; copy < count; ++copy) result += text;
+    return result;
+  };
+  const std::string thousand(1000, 'x');
+  const std::string entity = "<!DOCTYPE r [<!ENTITY e '" + thousand + "'>]>\n<r>";
+  const std::string elements = "<!DOCTYPE r [<!ENTITY e '" + repeated("<i/>", 100) + "'>]>\n<r>";
+  const std::string attribute = "<!DOCTYPE r [<!ATTLIST i a CDATA '" + thousand + "'>]>\n<r>";
+  const struct {
+    std::string_view name;
+    std::string head;
+    std::string_view part;
+    std::size_t fits;     // so many parts are read
+    std::size_t exceeds;  // and so many are not
+  } rows[] = {
+      {"text", entity, "&e;", 1000, 1100},
+      {"text in an attribute", entity, "<i a='&e;'/>", 1000, 1100},
+      {"elements", elements, "&e;", 850, 950},
+      {"attributes by default", attribute, "<i/>", 1000, 1100},
+  };
+  for (const auto& row : rows) {
+    Meter meter;
+    ErrorSlot error;
+    EXPECT_TRUE(XMLParser(row.head + repeated(row.part, row.fits) + "</r>", meter).parse(error))
+        << row.name << ": " << error->description;
+
+    for (const std::size_t count : {row.exceeds, std::size_t{100'000}}) {
+      meter.size = 0;
+      const std::string document = row.head + repeated(row.part, count) + "</r>";
+      EXPECT_FALSE(XMLParser(document, meter).parse(error)) << row.name;
+      EXPECT_TRUE(error->description.starts_with(
+          "limit on input amplification factor (from DTD and entities) breached at line 2, "))
+          << row.name << ": " << error->description;
+      EXPECT_LE(meter.size, (1U << 20) + 3 * document.size()) << row.name;
+    }
+  }
+}
+
+TEST(XMLParserTest, DeclarationsRefuseNoLongDocument) {
+  const std::string head = "<!DOCTYPE r [<!ENTITY e 'x'><!ATTLIST b c CDATA 'd'>]><r>";
+  for (const std::string_view part : {"<a/>", "<a b='c'/>", "<a>b</a>", "&e;", "&lt;"}) {
+    std::string document = head;
+    while (document.size() < 8'000'000) document += part;
+    Meter meter;
+    ErrorSlot error;
+    EXPECT_TRUE(XMLParser(document + "</r>", meter).parse(error))
+        << part << ": " << error->description;
   }
 }
 

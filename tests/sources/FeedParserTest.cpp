@@ -267,6 +267,10 @@ TEST(FeedParserTest, MarkerSplitOverNestedLinksIsFound) {
   EXPECT_EQ(
       channelWith("<a:link><link>" + text.substr(0, 9) + "</link>" + text.substr(9) + "</a:link>"),
       (Dictionary{{"QELUUID", kUuid}}));
+  // So does one whose marker has only the beginning of a uuid behind it.
+  EXPECT_EQ(channelWith("<a:link><link>" + text.substr(0, 30) + "</link>" + text.substr(30) +
+                        "</a:link>"),
+            (Dictionary{{"QELUUID", kUuid}}));
 }
 
 TEST(FeedParserTest, OwnElements) {

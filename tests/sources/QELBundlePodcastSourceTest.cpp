@@ -4,9 +4,11 @@
 
 #include <filesystem>
 #include <fstream>
+#include <memory>
 #include <string>
 
 #include "platform/PropertyListWriter.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace {
@@ -152,6 +154,22 @@ TEST_F(QELBundlePodcastSourceTest, RemotePosterIsJoinedLikeAPath) {
 TEST_F(QELBundlePodcastSourceTest, WithoutEpisodesTheListIsAbsent) {
   EXPECT_EQ(loaded(bundle({{"PodcastName", "t"}}))->episodes(), nullptr);
   EXPECT_TRUE(loaded(bundle({{"Episodes", PropertyListValue::Array{}}}))->episodes()->empty());
+}
+
+TEST_F(QELBundlePodcastSourceTest, AnUnknownWorkingDirectoryIsAFailure) {
+  bundle({});
+  EXPECT_EQ(exitStatusOfChild([&] {
+              fs::create_directories(directory() / "gone");
+              fs::current_path(directory() / "gone");
+              QELBundlePodcastSource source("a.podcast",
+                                            QELReferenceFilePodcastSource::initWithDictionary(
+                                                std::make_shared<Dictionary>()));
+              fs::remove(directory() / "gone");
+              platform::ErrorSlot error;
+              if (source.loadSourceWithError(error)) return 1;
+              return error && error->description == "No such file or directory" ? 0 : 2;
+            }),
+            0);
 }
 
 }  // namespace

@@ -1,0 +1,84 @@
+#include <algorithm>
+#include <optional>
+#include <string>
+
+#include "fuzz/FuzzTarget.h"
+#include "platform/Base64.h"
+#include "platform/GzipDecoder.h"
+#include "platform/TextEncoding.h"
+
+namespace {
+
+constexpr std::size_t kMostDecoded = std::size_t{1} << 20;
+
+/// The whole stream's text, handed to the decoder in pieces; absent when it is refused or cut.
+struct Decoding {
+  std::optional<std::string> text;
+  bool isTooLong = false;
+};
+
+Decoding decoded(std::string_view stream, std::size_t pieceSize) {
+  platform::GzipDecoder decoder;
+  std::string text;
+  Decoding result;
+  const auto take = [&](std::string_view bytes) {
+    text += bytes;
+    result.isTooLong = text.size() > kMostDecoded;
+    return !result.isTooLong;
+  };
+  while (!stream.empty()) {
+    if (!decoder.decode(stream.substr(0, pieceSize), take)) return result;
+    stream.remove_prefix(std::min(pieceSize, stream.size()));
+  }
+  if (decoder.isWhole()) result.text = std::move(text);
+  return result;
+}
+
+void decompress(std::string_view input) {
+  if (input.empty()) return;
+  const std::size_t pieceSize = 1 + static_cast<unsigned char>(input.front());
+  input.remove_prefix(1);
+  const Decoding whole = decoded(input, std::string_view::npos);
+  const Decoding pieces = decoded(input, pieceSize);
+  requireThat(whole.isTooLong == pieces.isTooLong && whole.text == pieces.text,
+              "a stream is decompressed the same in whatever pieces it comes");
+}
+
+void requireBase64(std::string_view input) {
+  std::string text;
+  platform::appendBase64(text, input);
+  requireThat(platform::bytesFromBase64(text) == std::string(input), "base64 gives the bytes back");
+  if (const auto bytes = platform::bytesFromBase64(input)) {
+    std::string again;
+    platform::appendBase64(again, *bytes);
+    requireThat(platform::bytesFromBase64(again) == bytes, "base64 gives the bytes back");
+  }
+}
+
+/// The name of an encoding in the first line, a text in the rest.
+void convert(std::string_view input) {
+  const std::string_view encoding = input.substr(0, input.find('\n'));
+  input.remove_prefix(std::min(encoding.size() + 1, input.size()));
+  const auto text = platform::convertedToUTF8(input, encoding);
+  requireThat(!text || platform::convertedToUTF8(*text, "UTF-8") == text,
+              "what was converted is UTF-8");
+  const auto name = platform::canonicalEncodingName(encoding);
+  requireThat(!name || platform::canonicalEncodingName(*name) == name,
+              "a canonical name is its own");
+}
+
+}  // namespace
+
+/// The first byte chooses: the rest is a compressed stream behind the size of its pieces, base64,
+/// or a text in some encoding.
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  const std::string_view input = inputText(data, size);
+  if (input.starts_with('g')) {
+    decompress(input.substr(1));
+  } else if (input.starts_with('b')) {
+    requireBase64(input.substr(1));
+  } else {
+    convert(input.substr(std::min<std::size_t>(1, input.size())));
+  }
+  return 0;
+}

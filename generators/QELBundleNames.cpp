@@ -1,0 +1,47 @@
+#include "generators/QELBundleNames.h"
+
+#include <cstddef>
+
+#include "cli/QELReferenceType.h"
+#include "platform/FormattedText.h"
+#include "platform/Paths.h"
+#include "platform/TemporaryFile.h"
+#include "platform/TextHelpers.h"
+#include "platform/URL.h"
+#include "platform/XMLEscaping.h"
+
+namespace {
+
+constexpr std::size_t kLongestName = 255;  // bytes, what file systems allow
+
+}  // namespace
+
+std::optional<std::string> QELFileName(const platform::Text& location,
+                                       const std::optional<platform::Text>& referenceType) {
+  if (referenceType != kReferenceTypeRemote) {
+    return std::string(platform::lastPathComponent(location));
+  }
+  const std::optional<platform::URL> url = platform::URL::parse(location);
+  if (!url) return std::nullopt;
+  return platform::percentDecoded(platform::lastPathComponent(url->encodedPath()));
+}
+
+bool QELNamesFile(std::string_view name) {
+  return !name.empty() && name != "." && name != "..";
+}
+
+std::string QELBaseName(std::string_view name) {
+  // Colons of the name go before slashes become colons: only the latter are to be seen.
+  return platform::replacingAll(
+      platform::replacingAll(platform::pathWithoutExtension(name), ":", ""), "/", ":");
+}
+
+std::string QELNameWithExtension(std::string_view base, std::string_view extension) {
+  return platform::formattedText("%@.%@", {base, extension});
+}
+
+bool QELIsSaneName(std::string_view name) {
+  return QELNamesFile(name) && name.size() <= kLongestName &&
+         !platform::isTemporaryFileName(name) && name.find('/') == std::string_view::npos &&
+         platform::isXMLText(name);
+}

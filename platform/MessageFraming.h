@@ -1,0 +1,38 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace platform {
+
+/// Where the body of an HTTP answer ends, as its header says (RFC 9112, section 6).
+///
+/// A transfer library is lenient here: of two lengths it may believe the last, it may read "0x20"
+/// as 0 and pass over a coding that it does not know, so that a body cut short, or in another form,
+/// is taken for whole. To a transfer that must be whole or fail, each of these is a fault.
+class MessageFraming {
+ public:
+  /// Takes a line of the header, with or without its line end. A status line forgets all before it.
+  void takeLine(std::string_view line);
+
+  /// Why nobody can tell where the body ends; empty when it can be told.
+  std::string_view fault() const { return fault_; }
+
+  /// The announced length; absent without one, and for a body in chunks, which end by themselves.
+  std::optional<std::uint64_t> length() const;
+
+ private:
+  enum class Field { kLength, kCoding, kOther };
+
+  void takeLengths(std::string_view value);
+  void takeCodings(std::string_view value);
+
+  Field field_ = Field::kOther;  // of the last line
+  std::optional<std::uint64_t> length_;
+  bool isChunked_ = false;
+  std::string_view fault_;
+};
+
+}  // namespace platform
