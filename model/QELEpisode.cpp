@@ -12,7 +12,7 @@ using platform::Dictionary;
 using platform::PointInTime;
 using platform::Text;
 using platform::textForKey;
-using platform::operator""_text;
+using platform::operator""_text;  // NOLINT(misc-unused-using-decls): used in literals
 
 std::optional<PointInTime> dateForKey(const Dictionary& dictionary, std::string_view key) {
   const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);

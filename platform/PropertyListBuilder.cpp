@@ -15,7 +15,7 @@ void PropertyListBuilder::add(PropertyListValue value) {
     return;
   }
   std::get<Dictionary::Entries>(level.container)
-      .emplace_back(*std::exchange(level.key, std::nullopt), std::move(value));
+      .push_back({*std::exchange(level.key, std::nullopt), std::move(value)});
 }
 
 void PropertyListBuilder::beginArray(std::size_t expectedCount) {

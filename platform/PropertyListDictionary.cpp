@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <iterator>
 #include <stdexcept>
+#include <utility>
 
 #include "platform/PropertyListValue.h"
 
@@ -10,7 +11,7 @@ namespace platform {
 
 namespace {
 
-using Entry = PropertyListDictionary::value_type;
+using Entry = PropertyListDictionary::Entry;
 
 bool comesBefore(const Entry& left, const Entry& right) {
   return left.first.view() < right.first.view();
@@ -46,7 +47,7 @@ void sortKeepingLast(PropertyListDictionary::Entries& entries) {
 
 PropertyListDictionary::PropertyListDictionary() = default;
 
-PropertyListDictionary::PropertyListDictionary(std::initializer_list<value_type> entries)
+PropertyListDictionary::PropertyListDictionary(std::initializer_list<Entry> entries)
     : PropertyListDictionary(Entries(entries)) {}
 
 PropertyListDictionary::PropertyListDictionary(Entries entries) : entries_(std::move(entries)) {
@@ -96,7 +97,7 @@ const PropertyListValue& PropertyListDictionary::at(std::string_view key) const 
 void PropertyListDictionary::emplace(Text key, PropertyListValue value) {
   const auto found = place(entries_, key);
   if (found != entries_.end() && found->first == key) return;
-  entries_.emplace(found, std::move(key), std::move(value));
+  entries_.insert(found, {std::move(key), std::move(value)});
 }
 
 void PropertyListDictionary::emplace_hint(const_iterator /*hint*/, Text key,
@@ -109,7 +110,7 @@ void PropertyListDictionary::insert_or_assign(Text key, PropertyListValue value)
   if (found != entries_.end() && found->first == key) {
     found->second = std::move(value);
   } else {
-    entries_.emplace(found, std::move(key), std::move(value));
+    entries_.insert(found, {std::move(key), std::move(value)});
   }
 }
 

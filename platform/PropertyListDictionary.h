@@ -3,7 +3,6 @@
 #include <cstddef>
 #include <initializer_list>
 #include <string_view>
-#include <utility>
 #include <vector>
 
 #include "platform/Text.h"
@@ -21,12 +20,13 @@ class PropertyListValue;
 /// entries in any order are given to the constructor together.
 class PropertyListDictionary {
  public:
-  using value_type = std::pair<Text, PropertyListValue>;
-  using Entries = std::vector<value_type>;
-  using const_iterator = const value_type*;
+  /// A key, `first`, and its value, `second`; see PropertyListValue.h.
+  struct Entry;
+  using Entries = std::vector<Entry>;
+  using const_iterator = const Entry*;
 
   PropertyListDictionary();
-  PropertyListDictionary(std::initializer_list<value_type> entries);
+  PropertyListDictionary(std::initializer_list<Entry> entries);
   /// Of entries in any order. Where a key stands twice, the last one counts.
   explicit PropertyListDictionary(Entries entries);
   ~PropertyListDictionary();

@@ -30,7 +30,7 @@ class PropertyListValue {
 
   PropertyListValue(Text text) : value_(std::move(text)) {}
   PropertyListValue(const char* text) : value_(Text(text)) {}
-  PropertyListValue(std::string text) : value_(Text(std::move(text))) {}
+  PropertyListValue(const std::string& text) : value_(Text(text)) {}
   PropertyListValue(std::int64_t number) : value_(number) {}
   /// A number that a signed integer can hold is kept as one, so that equal numbers compare equal.
   PropertyListValue(std::uint64_t number);
@@ -61,6 +61,12 @@ class PropertyListValue {
 
  private:
   Storage value_;
+};
+
+struct PropertyListDictionary::Entry {
+  Text first;
+  PropertyListValue second;
+  friend bool operator==(const Entry&, const Entry&) = default;
 };
 
 using Dictionary = PropertyListValue::Dictionary;

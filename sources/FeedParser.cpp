@@ -13,7 +13,7 @@ namespace {
 
 using platform::Dictionary;
 using platform::Text;
-using platform::operator""_text;
+using platform::operator""_text;  // NOLINT(misc-unused-using-decls): used in literals
 
 /// The local names of the elements whose start empties the text buffer. Built once, at the first
 /// element of the first feed, and shared by all parsers.

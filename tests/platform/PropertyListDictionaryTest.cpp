@@ -48,7 +48,7 @@ TEST(PropertyListDictionaryTest, OfManyEntriesTheLastOfAKeyCounts) {
 
 TEST(PropertyListDictionaryTest, EveryEntryOfManyIsFound) {
   Dictionary::Entries entries;
-  for (int i = 0; i < 1000; ++i) entries.emplace_back(std::to_string(i * 7919 % 1000), number(i));
+  for (int i = 0; i < 1000; ++i) entries.push_back({std::to_string(i * 7919 % 1000), number(i)});
   const Dictionary dictionary(std::move(entries));
   EXPECT_EQ(dictionary.size(), 1000U);
   for (int i = 0; i < 1000; ++i) {
