@@ -127,6 +127,7 @@ Dictionary QELEpisode::dictionary() const {
   set("EpisodeReferenceType"_text, referenceType());
   set("EpisodeType"_text, contentType());
   set("EpisodeUUID"_text, uuid());
+  dictionary.shrink_to_fit();  // there may be very many episodes with next to no entries
   return dictionary;
 }
 

@@ -65,6 +65,10 @@ void PropertyListDictionary::reserve(std::size_t count) {
   entries_.reserve(count);
 }
 
+void PropertyListDictionary::shrink_to_fit() {
+  entries_.shrink_to_fit();
+}
+
 std::size_t PropertyListDictionary::size() const {
   return entries_.size();
 }

@@ -37,6 +37,8 @@ class PropertyListDictionary {
 
   /// Makes room for that many entries.
   void reserve(std::size_t count);
+  /// Gives back the room that no entry takes.
+  void shrink_to_fit();
   std::size_t size() const;
   bool empty() const { return size() == 0; }
   const_iterator begin() const;
