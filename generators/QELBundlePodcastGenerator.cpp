@@ -71,7 +71,7 @@ class BundleDirectory {
 
  private:
   /// Nothing is written to, nor removed from, a "Posters" that is a symbolic link.
-  bool leavesBundle() const { return platform::isSymbolicLink(postersPath_); }
+  bool leavesBundle() const { return platform::mayBeSymbolicLink(postersPath_); }
 
   std::string path_;
   std::string postersPath_;

@@ -107,7 +107,7 @@ Dictionary QELEpisode::dictionary() const {
   constexpr std::size_t kMostEntries = 15;
   dictionary.reserve(kMostEntries);
   const auto set = [&dictionary](const Text& key, const auto& value) {
-    if (value) dictionary.emplace_hint(dictionary.end(), key, *value);
+    if (value) dictionary.emplace(key, *value);
   };
 
   set("EpisodeAdvisoryLabel"_text, advisoryLabel());

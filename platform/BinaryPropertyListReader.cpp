@@ -280,8 +280,7 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
     if (!converted) return std::nullopt;
     if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size()))
       return std::nullopt;
-    converted->shrink_to_fit();
-    text = Text(std::move(*converted));
+    text = Text(*converted);
   }
   return text;
 }

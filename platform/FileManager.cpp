@@ -58,7 +58,7 @@ bool fileExists(const std::string& path) {
   return path.find('\0') == std::string::npos && ::stat(path.c_str(), &status) == 0;
 }
 
-bool isSymbolicLink(const std::string& path) {
+bool mayBeSymbolicLink(const std::string& path) {
   struct stat status {};
   if (::lstat(path.c_str(), &status) == 0) {
     return S_ISLNK(status.st_mode);

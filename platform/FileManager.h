@@ -16,7 +16,7 @@ bool fileExists(const std::string& path);
 
 /// Whether the path itself is a symbolic link, dangling or not; true as well when something is
 /// there and cannot be looked at.
-bool isSymbolicLink(const std::string& path);
+bool mayBeSymbolicLink(const std::string& path);
 
 /// The whole content of a regular file. Anything else (directory, device, FIFO, socket), a file
 /// over kWholeReadLimit and a failed read give no value and fill the slot.

@@ -103,6 +103,7 @@ void prepareICUMemory() {
     return U_SUCCESS(status) != 0;
   }();
   static_cast<void>(isPrepared);
+  wasRefused = false;  // the work that it was refused to may have failed for another reason
 }
 
 void requireICUMemory() {

@@ -197,7 +197,8 @@ void NetworkTransfer::end(int resultCode) {
   } else if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
     error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
   } else if (result == CURLE_ABORTED_BY_CALLBACK) {
-    error_ = transferError(TransferErrorCode::kTooLarge, "The page of a redirect never ends");
+    error_ =
+        transferError(TransferErrorCode::kTooLarge, "The page of a redirect is larger than 16 MiB");
   } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
     // The library says the same of a line beyond its limit.
     error_ = {"transfer", result,

@@ -38,8 +38,10 @@ class PerThread {
   };
 
   static void make() {
-    static Key key;
     auto made = std::make_unique<Value>();
+    // After the value, so as to end before it: a library that the value is the first to set up ends
+    // itself when the process does, in reverse order, and is needed until the value is gone.
+    static Key key;
     if (!key.set(made.get())) throw std::bad_alloc();
     value_ = made.release();
   }

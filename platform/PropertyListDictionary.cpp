@@ -104,11 +104,6 @@ void PropertyListDictionary::emplace(Text key, PropertyListValue value) {
   entries_.insert(found, {std::move(key), std::move(value)});
 }
 
-void PropertyListDictionary::emplace_hint(const_iterator /*hint*/, Text key,
-                                          PropertyListValue value) {
-  emplace(std::move(key), std::move(value));  // which looks behind all others first
-}
-
 void PropertyListDictionary::insert_or_assign(Text key, PropertyListValue value) {
   const auto found = place(entries_, key);
   if (found != entries_.end() && found->first == key) {

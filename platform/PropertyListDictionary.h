@@ -50,9 +50,8 @@ class PropertyListDictionary {
   /// The value of a key that is there.
   const PropertyListValue& at(std::string_view key) const;
 
-  /// Adds the entry unless the key is there already. The hint is where it may belong.
+  /// Adds the entry unless the key is there already.
   void emplace(Text key, PropertyListValue value);
-  void emplace_hint(const_iterator hint, Text key, PropertyListValue value);
   /// Adds the entry, or gives the key that is there the new value.
   void insert_or_assign(Text key, PropertyListValue value);
   void erase(std::string_view key);

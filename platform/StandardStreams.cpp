@@ -13,8 +13,6 @@ namespace platform {
 
 namespace {
 
-constexpr std::size_t kBufferSize = 4096;
-
 ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
   return writeAll(STDOUT_FILENO, {bytes, length}) ? static_cast<ssize_t>(length) : 0;
 }
@@ -28,7 +26,7 @@ std::FILE* outputStream() {
     std::FILE* made = ::fopencookie(nullptr, "w", functions);
     if (made == nullptr) return stdout;
     // A line is seen at once where somebody is looking.
-    std::setvbuf(made, nullptr, ::isatty(STDOUT_FILENO) == 1 ? _IOLBF : _IOFBF, kBufferSize);
+    std::setvbuf(made, nullptr, ::isatty(STDOUT_FILENO) == 1 ? _IOLBF : _IOFBF, BUFSIZ);
     return made;
   }();
   return stream;

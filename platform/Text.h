@@ -5,6 +5,7 @@
 #include <ostream>
 #include <string>
 #include <string_view>
+#include <utility>
 
 namespace platform {
 
@@ -18,6 +19,17 @@ class Text {
  public:
   /// The empty text.
   Text() = default;
+  /// Leaves the empty text behind.
+  Text(Text&& other) noexcept
+      : bytes_(std::move(other.bytes_)), size_(std::exchange(other.size_, 0)) {}
+  Text& operator=(Text&& other) noexcept {
+    bytes_ = std::move(other.bytes_);
+    size_ = std::exchange(other.size_, 0);
+    return *this;
+  }
+  Text(const Text&) = default;
+  Text& operator=(const Text&) = default;
+  ~Text() = default;
   Text(std::string_view value) : bytes_(copied(value)), size_(value.size()) {}
   Text(const std::string& value) : Text(std::string_view(value)) {}
   Text(const char* value) : Text(std::string_view(value)) {}

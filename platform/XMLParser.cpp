@@ -38,11 +38,15 @@ constexpr std::size_t kWaitingLimit = (std::size_t{1} << 30) - kPieceSize;
 // and attributes by default not at all.
 constexpr std::size_t kNestingEntitiesLimit = 1000;
 constexpr std::size_t kDeclaredAttributesLimit = 256;
-// Bytes of names and texts. Without entities no document exceeds its share: the shortest element,
-// "<a/>", counts for just three times its bytes.
-constexpr std::size_t kDeliveryAllowance = std::size_t{1} << 20;
-constexpr std::size_t kDeliveryPerByte = 3;
-constexpr std::size_t kDeliveryOfElement = 11;
+// Bytes of elements: their names and attributes. Without entities no document exceeds its share:
+// the shortest element, "<a/>", counts for just three times its bytes.
+constexpr std::size_t kElementsAllowance = std::size_t{1} << 20;
+constexpr std::size_t kElementsPerByte = 3;
+constexpr std::size_t kSizeOfElement = 11;
+// Bytes of text, which costs far less to keep. A feed may have its notice on every item from an
+// entity.
+constexpr std::size_t kTextAllowance = std::size_t{4} << 20;
+constexpr std::size_t kTextPerByte = 8;
 
 // An encoding's name is shorter; a longer one is not repeated in a message.
 constexpr std::size_t kShownLabelLength = 64;
@@ -208,7 +212,8 @@ struct XMLParser::Run {
   Run(XMLParser& parser, std::string utf8, std::size_t start)
       : owner(parser),
         document(std::move(utf8)),
-        deliveryLeft(kDeliveryAllowance + kDeliveryPerByte * document.size()) {
+        elementsLeft(kElementsAllowance + kElementsPerByte * document.size()),
+        textLeft(kTextAllowance + kTextPerByte * document.size()) {
     // The text is UTF-8 by now, whatever its declaration says.
     handle.reset(XML_ParserCreate("UTF-8"));
     if (!handle) throw std::bad_alloc();
@@ -296,23 +301,23 @@ struct XMLParser::Run {
   }
 
   // Counts what a document with declarations delivers; false when it is too much.
-  bool spend(std::size_t size) {
+  bool spend(std::size_t size, std::size_t& left) {
     if (!hasDeclarations) return true;
-    if (size > deliveryLeft) {
+    if (size > left) {
       refuse(XML_ErrorString(XML_ERROR_AMPLIFICATION_LIMIT_BREACH));
       return false;
     }
-    deliveryLeft -= size;
+    left -= size;
     return true;
   }
 
   bool spendOnElement(std::string_view name, const XML_Char* const* attributes) {
     if (!hasDeclarations) return true;
-    std::size_t size = kDeliveryOfElement + name.size();
+    std::size_t size = kSizeOfElement + name.size();
     for (const XML_Char* const* text = attributes; *text != nullptr; ++text) {
       size += std::string_view(*text).size() + 1;
     }
-    return spend(size);
+    return spend(size, elementsLeft);
   }
 
   static void XMLCALL declareEntity(void* pointer, const XML_Char* /*name*/, int isParameter,
@@ -356,7 +361,7 @@ struct XMLParser::Run {
     Run* const run = static_cast<Run*>(pointer);
     const std::string_view text(characters, static_cast<std::size_t>(length));
     run->deliver([&](XMLParserEvents& events) {
-      if (run->spend(text.size())) events.foundCharacters(text);
+      if (run->spend(text.size(), run->textLeft)) events.foundCharacters(text);
     });
   }
 
@@ -370,7 +375,8 @@ struct XMLParser::Run {
   bool hasDeclarations = false;  // of entities or of attributes
   std::size_t nestingEntities = 0;
   std::size_t declaredAttributes = 0;
-  std::size_t deliveryLeft;
+  std::size_t elementsLeft;
+  std::size_t textLeft;
 };
 
 bool XMLParser::parse(ErrorSlot& error) {

@@ -168,8 +168,9 @@ void FeedParser::readAdvisoryLabel(Dictionary& target) {
 }
 
 void FeedParser::readDate(Dictionary& target) {
-  if (const auto date = dateWithRFC822String(cdataBuffer_))
+  if (const auto date = dateWithRFC822String(cdataBuffer_)) {
     target.insert_or_assign("date"_text, *date);
+  }
   emptyBuffer();
 }
 

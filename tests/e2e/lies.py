@@ -319,7 +319,7 @@ LIES = {
         Lie("a page that is cut", redirect(GOOD, fields=(length(9),))),
         Lie("a page of 1 MB", redirect(GOOD, fields=(length(10**6),), body=bytes(10**6))),
         Lie("a page that never ends", endless(redirect(GOOD, fields=(length(10**15),)), b"x" * 8000),
-            Cause("The page of a redirect never ends")),
+            Cause("The page of a redirect is larger than 16 MiB")),
         Lie("a page with two lengths", redirect(GOOD, fields=(length(5), length(6))), CONTRADICTORY),
         Lie("20 in a row", redirect(f"{CHAIN}/19")),
         Lie("21 in a row", redirect(f"{CHAIN}/20"), LibraryCause("Maximum (20) redirects followed")),

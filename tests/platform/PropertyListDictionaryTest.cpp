@@ -74,9 +74,9 @@ TEST(PropertyListDictionaryTest, FindsOnlyTheKeyItself) {
 TEST(PropertyListDictionaryTest, EmplaceKeepsTheValueThatIsThere) {
   Dictionary dictionary{{"a", "first"}, {"c", "last"}};
   dictionary.emplace("a", "second");
-  dictionary.emplace_hint(dictionary.end(), "c", "second");
-  dictionary.emplace_hint(dictionary.end(), "b", "new");
-  dictionary.emplace_hint(dictionary.end(), "d", "new");
+  dictionary.emplace("c", "second");
+  dictionary.emplace("b", "new");
+  dictionary.emplace("d", "new");
   EXPECT_EQ(shown(dictionary), R"({"a": "first", "b": "new", "c": "last", "d": "new"})");
 }
 

@@ -174,8 +174,8 @@ TEST(PropertyListWriterTest, DatesReadBackOnEveryDayOfAnEra) {
   // 400 years and some, a prime number of seconds more than a day apart, around the year 0.
   Dictionary dates;
   for (std::int64_t i = 0; i < 150000; ++i)
-    dates.emplace_hint(dates.end(), std::to_string(1000000 + i),
-                       PointInTime(std::chrono::seconds(-68500000000 + i * 86413)));
+    dates.emplace(std::to_string(1000000 + i),
+                  PointInTime(std::chrono::seconds(-68500000000 + i * 86413)));
   EXPECT_TRUE(readBack(written(dates)) == PropertyListValue(dates));
 }
 

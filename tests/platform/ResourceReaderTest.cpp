@@ -242,7 +242,8 @@ TEST_F(ResourceReaderTest, EndlessPageOfARedirectIsAFailure) {
     while (connection.send(std::string(100'000, 'x'))) continue;
     connection.close();
   });
-  EXPECT_EQ(read(server_.url("/endless")), "transfer 63: The page of a redirect never ends");
+  EXPECT_EQ(read(server_.url("/endless")),
+            "transfer 63: The page of a redirect is larger than 16 MiB");
 }
 
 TEST_F(ResourceReaderTest, LongPageOfARedirectDoesNoHarm) {

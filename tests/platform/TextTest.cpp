@@ -4,6 +4,7 @@
 
 #include <optional>
 #include <string>
+#include <utility>
 
 namespace platform {
 namespace {
@@ -47,6 +48,16 @@ TEST(TextTest, LiteralIsNotCopied) {
   EXPECT_EQ(text, "lit\0eral"s);
   const Text copy = text;
   EXPECT_EQ(copy.view().data(), text.view().data());
+}
+
+TEST(TextTest, MovingLeavesTheEmptyTextBehind) {
+  Text first("words");
+  Text second(std::move(first));
+  EXPECT_EQ(second, "words");
+  EXPECT_EQ(first, "");  // NOLINT(bugprone-use-after-move): the matter of this test
+  first = std::move(second);
+  EXPECT_EQ(first, "words");
+  EXPECT_EQ(second.size(), 0U);  // NOLINT(bugprone-use-after-move): the same
 }
 
 }  // namespace
