@@ -97,7 +97,7 @@ std::optional<PointInTime> PropertyListValue::asDate() const {
 }
 
 const PropertyListValue* valueForKey(const Dictionary& dictionary, std::string_view key) {
-  const auto found = dictionary.find(key);
+  const auto* const found = dictionary.find(key);
   return found == dictionary.end() ? nullptr : &found->second;
 }
 

@@ -138,7 +138,8 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
 }
 
 void FeedParser::endItem() {
-  if (!std::exchange(currentEpisode_, nullptr) || !itemReceiver_) return;
+  const bool wasInItem = std::exchange(currentEpisode_, nullptr) != nullptr;
+  if (!wasInItem || !itemReceiver_) return;
   itemReceiver_(episodes_.back());
   episodes_.pop_back();
 }

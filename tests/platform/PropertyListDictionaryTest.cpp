@@ -52,7 +52,7 @@ TEST(PropertyListDictionaryTest, EveryEntryOfManyIsFound) {
   const Dictionary dictionary(std::move(entries));
   EXPECT_EQ(dictionary.size(), 1000U);
   for (int i = 0; i < 1000; ++i) {
-    const auto found = dictionary.find(std::to_string(i * 7919 % 1000));
+    const auto* const found = dictionary.find(std::to_string(i * 7919 % 1000));
     ASSERT_NE(found, dictionary.end());
     EXPECT_EQ(found->second, number(i));
   }
