@@ -323,7 +323,7 @@ LARGE = tuple(family for family in FEEDS if family.name in (
 
 # Time for eight times the size, and for the size: 8 for what is linear, 64 for what grows with the square. What
 # lies between them is for caches that no longer hold all, and for other programs on the machine.
-STEEPEST = 12
+STEEPEST = 20
 
 _SHORTEST = 0.03  # seconds that the smallest document has to take, to be measured at all
 _SMALLEST, _LARGEST = 250_000, 8_000_000  # sizes of the smallest document
