@@ -3,9 +3,9 @@
 #include <chrono>
 
 #include "dates/RFC822Parsing.h"
-#include "platform/DateFormatter.h"
-#include "platform/PointInTime.h"
-#include "platform/PropertyListDate.h"
+#include "platform/plist/PropertyListDate.h"
+#include "platform/time/DateFormatter.h"
+#include "platform/time/PointInTime.h"
 
 namespace {
 

@@ -7,7 +7,7 @@
 #include <string_view>
 
 #include "bench/SampleFeed.h"
-#include "platform/XMLParser.h"
+#include "platform/xml/XMLParser.h"
 #include "sources/FeedParser.h"
 
 namespace {

@@ -7,8 +7,8 @@
 #include <string_view>
 
 #include "bench/SamplePodcast.h"
-#include "platform/PropertyListReader.h"
-#include "platform/PropertyListWriter.h"
+#include "platform/plist/PropertyListReader.h"
+#include "platform/plist/PropertyListWriter.h"
 #include "sources/QELReferenceFilePodcastSource.h"
 
 namespace {

@@ -4,8 +4,8 @@
 
 #include "bench/SampleFeed.h"
 #include "generators/QELReferenceFilePodcastGenerator.h"
-#include "platform/PropertyListWriter.h"
-#include "platform/URL.h"
+#include "platform/net/URL.h"
+#include "platform/plist/PropertyListWriter.h"
 #include "sources/QELFeedPodcastSource.h"
 #include "tests/support/TemporaryDirectory.h"
 

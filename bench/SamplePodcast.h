@@ -4,7 +4,7 @@
 #include <string>
 
 #include "model/QELPodcastSource.h"
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// The podcast of the sample feed with that many items, loaded.
 std::unique_ptr<QELPodcastSource> samplePodcast(int items);

@@ -9,17 +9,17 @@
 #include <utility>
 #include <vector>
 
-#include "cli/QELError.h"
-#include "cli/QELProgress.h"
 #include "cli/QELSourceResolution.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELProgress.h"
 #include "generators/QELBundlePodcastGenerator.h"
 #include "generators/QELFeedPodcastGenerator.h"
 #include "generators/QELReferenceFilePodcastGenerator.h"
-#include "platform/FormattedText.h"
-#include "platform/Paths.h"
-#include "platform/PropertyListWriter.h"
-#include "platform/StandardStreams.h"
-#include "platform/TextHelpers.h"
+#include "platform/files/Paths.h"
+#include "platform/files/StandardStreams.h"
+#include "platform/plist/PropertyListWriter.h"
+#include "platform/text/FormattedText.h"
+#include "platform/text/TextHelpers.h"
 
 namespace {
 

@@ -3,12 +3,12 @@
 #include <string>
 #include <utility>
 
-#include "platform/FileManager.h"
-#include "platform/Paths.h"
-#include "platform/PropertyListReader.h"
-#include "platform/StandardStreams.h"
-#include "platform/TextHelpers.h"
-#include "platform/URL.h"
+#include "platform/files/FileManager.h"
+#include "platform/files/Paths.h"
+#include "platform/files/StandardStreams.h"
+#include "platform/net/URL.h"
+#include "platform/plist/PropertyListReader.h"
+#include "platform/text/TextHelpers.h"
 #include "sources/QELBundlePodcastSource.h"
 #include "sources/QELFeedPodcastSource.h"
 #include "sources/QELReferenceFilePodcastSource.h"

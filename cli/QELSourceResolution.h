@@ -5,7 +5,7 @@
 #include <string_view>
 
 #include "model/QELPodcastSource.h"
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// Whether the source string is acceptable at all. One that begins with "http", "pcast" or "file:"
 /// (in lower case) must be a valid URL, "pcast" read as "http"; any other, even an empty one, is

@@ -3,8 +3,8 @@
 #include <span>
 
 #include "cli/QELDriver.h"
-#include "platform/Process.h"
-#include "platform/StandardStreams.h"
+#include "platform/files/Process.h"
+#include "platform/files/StandardStreams.h"
 
 int main(int argc, char** argv) {
   platform::prepareProcess();

@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
-#include "platform/GregorianCalendar.h"
-#include "platform/TextHelpers.h"
+#include "platform/text/TextHelpers.h"
+#include "platform/time/GregorianCalendar.h"
 
 namespace {
 

@@ -3,8 +3,8 @@
 #include <optional>
 #include <string_view>
 
-#include "platform/PointInTime.h"
-#include "platform/TimeZone.h"
+#include "platform/time/PointInTime.h"
+#include "platform/time/TimeZone.h"
 
 /// The point in time of an RFC 822 date-time text, as feeds give them: "Tue, 05 Jun 2007 14:30:00
 /// PDT", with or without the day name and the seconds.

@@ -1,7 +1,7 @@
 #include "fuzz/BinaryListInput.h"
 #include "fuzz/FuzzTarget.h"
 #include "fuzz/PropertyListRoundTrip.h"
-#include "platform/PropertyListReader.h"
+#include "platform/plist/PropertyListReader.h"
 
 /// Any bytes, or any objects, as a binary property list: it is refused with a cause, or can be
 /// written in the XML form and then reads back as what XML can hold of it.

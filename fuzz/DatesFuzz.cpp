@@ -5,9 +5,9 @@
 
 #include "dates/RFC822Parsing.h"
 #include "fuzz/FuzzTarget.h"
-#include "platform/DateFormatter.h"
-#include "platform/PointInTime.h"
-#include "platform/PropertyListDate.h"
+#include "platform/plist/PropertyListDate.h"
+#include "platform/time/DateFormatter.h"
+#include "platform/time/PointInTime.h"
 
 namespace {
 

@@ -3,9 +3,9 @@
 #include <string>
 
 #include "fuzz/FuzzTarget.h"
-#include "platform/Base64.h"
-#include "platform/GzipDecoder.h"
-#include "platform/TextEncoding.h"
+#include "platform/net/GzipDecoder.h"
+#include "platform/text/Base64.h"
+#include "platform/text/TextEncoding.h"
 
 namespace {
 

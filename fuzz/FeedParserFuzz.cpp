@@ -5,8 +5,8 @@
 #include <variant>
 
 #include "fuzz/FuzzTarget.h"
-#include "platform/PropertyListValue.h"
-#include "platform/XMLEscaping.h"
+#include "platform/plist/PropertyListValue.h"
+#include "platform/xml/XMLEscaping.h"
 #include "sources/FeedParser.h"
 
 namespace {

@@ -10,11 +10,11 @@
 #include <string_view>
 #include <utility>
 
-#include "cli/QELReferenceType.h"
+#include "cli/common/QELReferenceType.h"
 #include "fuzz/PropertyListRoundTrip.h"
-#include "platform/PropertyListDate.h"
-#include "platform/TextHelpers.h"
-#include "platform/URL.h"
+#include "platform/net/URL.h"
+#include "platform/plist/PropertyListDate.h"
+#include "platform/text/TextHelpers.h"
 
 namespace {
 

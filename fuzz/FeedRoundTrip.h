@@ -1,6 +1,6 @@
 #pragma once
 
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// What the record of a reference dictionary is once it was written as a feed (without the moment
 /// of writing) and read back.

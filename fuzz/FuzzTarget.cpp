@@ -3,7 +3,7 @@
 #include <cstdlib>
 #include <iostream>
 
-#include "platform/XMLEscaping.h"
+#include "platform/xml/XMLEscaping.h"
 
 void requireThat(bool holds, std::string_view invariant) {
   if (holds) return;

@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <string_view>
 
-#include "platform/ErrorRecord.h"
+#include "platform/text/ErrorRecord.h"
 
 /// One run of the target with one input. Every source whose name ends in "Fuzz" defines it once:
 /// the fuzzer, and in ordinary builds the replay, call it again and again in one process.

@@ -8,9 +8,9 @@
 #include <variant>
 
 #include "fuzz/FuzzTarget.h"
-#include "platform/PropertyListReader.h"
-#include "platform/PropertyListWriter.h"
-#include "platform/XMLEscaping.h"
+#include "platform/plist/PropertyListReader.h"
+#include "platform/plist/PropertyListWriter.h"
+#include "platform/xml/XMLEscaping.h"
 
 namespace {
 

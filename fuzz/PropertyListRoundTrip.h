@@ -3,7 +3,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// Whether writing the value takes so much that it is not worth a run of a fuzzer: objects that are
 /// shared can make a large list of few bytes.

@@ -3,15 +3,15 @@
 #include <set>
 #include <string>
 
-#include "cli/QELReferenceType.h"
+#include "cli/common/QELReferenceType.h"
 #include "fuzz/FuzzTarget.h"
 #include "generators/QELBundleNames.h"
 #include "generators/QELNameLedger.h"
-#include "platform/Paths.h"
-#include "platform/Text.h"
-#include "platform/TextHelpers.h"
-#include "platform/URL.h"
-#include "platform/XMLEscaping.h"
+#include "platform/files/Paths.h"
+#include "platform/net/URL.h"
+#include "platform/text/Text.h"
+#include "platform/text/TextHelpers.h"
+#include "platform/xml/XMLEscaping.h"
 
 namespace {
 

@@ -4,8 +4,8 @@
 
 #include "fuzz/FuzzTarget.h"
 #include "fuzz/PropertyListRoundTrip.h"
-#include "platform/XMLDocument.h"
-#include "platform/XMLParser.h"
+#include "platform/xml/XMLDocument.h"
+#include "platform/xml/XMLParser.h"
 
 namespace {
 

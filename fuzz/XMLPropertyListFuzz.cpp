@@ -2,7 +2,7 @@
 
 #include "fuzz/FuzzTarget.h"
 #include "fuzz/PropertyListRoundTrip.h"
-#include "platform/PropertyListReader.h"
+#include "platform/plist/PropertyListReader.h"
 
 /// Any bytes as a property list: they are refused with a cause, or can be written and read again.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

@@ -2,13 +2,13 @@
 
 #include <cstddef>
 
-#include "cli/QELReferenceType.h"
-#include "platform/FormattedText.h"
-#include "platform/Paths.h"
-#include "platform/TemporaryFile.h"
-#include "platform/TextHelpers.h"
-#include "platform/URL.h"
-#include "platform/XMLEscaping.h"
+#include "cli/common/QELReferenceType.h"
+#include "platform/files/Paths.h"
+#include "platform/files/TemporaryFile.h"
+#include "platform/net/URL.h"
+#include "platform/text/FormattedText.h"
+#include "platform/text/TextHelpers.h"
+#include "platform/xml/XMLEscaping.h"
 
 namespace {
 

@@ -4,7 +4,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/Text.h"
+#include "platform/text/Text.h"
 
 /// The rules by which the files of a bundle are named after the locations that they come from. They
 /// go by texts alone; nothing here looks at the file system.

@@ -4,19 +4,19 @@
 #include <string_view>
 #include <utility>
 
-#include "cli/QELError.h"
-#include "cli/QELProgress.h"
-#include "cli/QELReferenceType.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELProgress.h"
+#include "cli/common/QELReferenceType.h"
 #include "generators/QELBundleNames.h"
 #include "generators/QELNameLedger.h"
 #include "model/QELPodcastKeys.h"
-#include "platform/FileManager.h"
-#include "platform/FormattedText.h"
-#include "platform/Paths.h"
-#include "platform/PropertyListWriter.h"
-#include "platform/TemporaryFile.h"
-#include "platform/Text.h"
-#include "platform/TextHelpers.h"
+#include "platform/files/FileManager.h"
+#include "platform/files/Paths.h"
+#include "platform/files/TemporaryFile.h"
+#include "platform/plist/PropertyListWriter.h"
+#include "platform/text/FormattedText.h"
+#include "platform/text/Text.h"
+#include "platform/text/TextHelpers.h"
 
 namespace {
 

@@ -6,14 +6,14 @@
 #include <type_traits>
 #include <utility>
 
-#include "cli/QELError.h"
-#include "cli/QELReferenceType.h"
-#include "platform/DateFormatter.h"
-#include "platform/FormattedText.h"
-#include "platform/Paths.h"
-#include "platform/PointInTime.h"
-#include "platform/TextHelpers.h"
-#include "platform/URL.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELReferenceType.h"
+#include "platform/files/Paths.h"
+#include "platform/net/URL.h"
+#include "platform/text/FormattedText.h"
+#include "platform/text/TextHelpers.h"
+#include "platform/time/DateFormatter.h"
+#include "platform/time/PointInTime.h"
 
 namespace {
 

@@ -1,6 +1,6 @@
 #include "generators/QELNameLedger.h"
 
-#include "platform/FormattedText.h"
+#include "platform/text/FormattedText.h"
 
 std::string QELNameLedger::reserve(const std::string& name) {
   if (taken_.insert(name).second) return name;

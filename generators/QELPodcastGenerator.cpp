@@ -1,6 +1,6 @@
 #include "generators/QELPodcastGenerator.h"
 
-#include "cli/QELError.h"
+#include "cli/common/QELError.h"
 
 bool QELPodcastGenerator::generateFromSource(QELPodcastSource& /*source*/,
                                              platform::ErrorSlot& error) {

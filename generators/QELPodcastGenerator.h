@@ -1,7 +1,7 @@
 #pragma once
 
 #include "model/QELPodcastSource.h"
-#include "platform/ErrorRecord.h"
+#include "platform/text/ErrorRecord.h"
 
 /// The abstract generator: given one loaded source, it leaves one output form of it in a property
 /// of its own. Made, asked to generate once, read and dropped; used by one thread.

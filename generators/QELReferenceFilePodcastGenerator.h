@@ -4,7 +4,7 @@
 #include <utility>
 
 #include "generators/QELPodcastGenerator.h"
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// Turns a source into the reference dictionary of a reference file.
 class QELReferenceFilePodcastGenerator : public QELPodcastGenerator {

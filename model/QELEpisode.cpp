@@ -2,9 +2,9 @@
 
 #include <string_view>
 
-#include "cli/QELProgress.h"
-#include "cli/QELReferenceType.h"
-#include "platform/FormattedText.h"
+#include "cli/common/QELProgress.h"
+#include "cli/common/QELReferenceType.h"
+#include "platform/text/FormattedText.h"
 
 namespace {
 

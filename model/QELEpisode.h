@@ -9,11 +9,11 @@
 #include <vector>
 
 #include "model/QELFetch.h"
-#include "platform/AtomicValue.h"
-#include "platform/Download.h"
-#include "platform/PointInTime.h"
-#include "platform/PropertyListValue.h"
-#include "platform/Text.h"
+#include "platform/net/Download.h"
+#include "platform/plist/PropertyListValue.h"
+#include "platform/text/AtomicValue.h"
+#include "platform/text/Text.h"
+#include "platform/time/PointInTime.h"
 
 /// One podcast episode, whatever source it came from.
 ///

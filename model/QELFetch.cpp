@@ -1,9 +1,9 @@
 #include "model/QELFetch.h"
 
-#include "cli/QELReferenceType.h"
-#include "platform/EventLoop.h"
-#include "platform/FileManager.h"
-#include "platform/URL.h"
+#include "cli/common/QELReferenceType.h"
+#include "platform/files/FileManager.h"
+#include "platform/net/EventLoop.h"
+#include "platform/net/URL.h"
 
 bool QELFetchToPath(const std::optional<platform::Text>& location,
                     const std::optional<platform::Text>& referenceType, const std::string& path,

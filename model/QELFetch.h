@@ -4,8 +4,8 @@
 #include <optional>
 #include <string>
 
-#include "platform/Download.h"
-#include "platform/Text.h"
+#include "platform/net/Download.h"
+#include "platform/text/Text.h"
 
 /// The state of a record's running download, which its events change and its wait watches.
 struct QELDownloadState {

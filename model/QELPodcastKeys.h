@@ -5,8 +5,8 @@
 #include <string_view>
 
 #include "model/QELPodcastSource.h"
-#include "platform/PropertyListValue.h"
-#include "platform/Text.h"
+#include "platform/plist/PropertyListValue.h"
+#include "platform/text/Text.h"
 
 /// One text field of the podcast and its key in a reference dictionary.
 struct QELPodcastKey {

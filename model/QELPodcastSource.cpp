@@ -1,7 +1,7 @@
 #include "model/QELPodcastSource.h"
 
-#include "cli/QELError.h"
-#include "cli/QELProgress.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELProgress.h"
 
 bool QELPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   error = QELError(1, "Attempt to load an abstract source");

@@ -8,9 +8,9 @@
 
 #include "model/QELEpisode.h"
 #include "model/QELFetch.h"
-#include "platform/Download.h"
-#include "platform/ErrorRecord.h"
-#include "platform/Text.h"
+#include "platform/net/Download.h"
+#include "platform/text/ErrorRecord.h"
+#include "platform/text/Text.h"
 
 /// A podcast: the fields of its channel and its episodes, which every generator reads; and the
 /// abstract source, whose kinds fill those fields when they are loaded.

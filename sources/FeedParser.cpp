@@ -4,10 +4,10 @@
 #include <cstdint>
 #include <utility>
 
-#include "cli/QELError.h"
+#include "cli/common/QELError.h"
 #include "dates/RFC822Parsing.h"
-#include "platform/Text.h"
-#include "platform/TextHelpers.h"
+#include "platform/text/Text.h"
+#include "platform/text/TextHelpers.h"
 
 namespace {
 

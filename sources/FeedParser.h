@@ -9,10 +9,10 @@
 #include <utility>
 #include <vector>
 
-#include "platform/ErrorRecord.h"
-#include "platform/PropertyListValue.h"
-#include "platform/Text.h"
-#include "platform/XMLParser.h"
+#include "platform/plist/PropertyListValue.h"
+#include "platform/text/ErrorRecord.h"
+#include "platform/text/Text.h"
+#include "platform/xml/XMLParser.h"
 
 /// Turns the bytes of a podcast feed into two plain results: the feed attributes (one dictionary
 /// for the channel) and the episodes (a feed item dictionary for each "item").

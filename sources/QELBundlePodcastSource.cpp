@@ -1,11 +1,11 @@
 #include "sources/QELBundlePodcastSource.h"
 
-#include "cli/QELError.h"
-#include "cli/QELReferenceType.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELReferenceType.h"
 #include "model/QELPodcastKeys.h"
-#include "platform/FileManager.h"
-#include "platform/Paths.h"
-#include "platform/Text.h"
+#include "platform/files/FileManager.h"
+#include "platform/files/Paths.h"
+#include "platform/text/Text.h"
 
 namespace {
 

@@ -4,10 +4,10 @@
 #include <string_view>
 #include <utility>
 
-#include "cli/QELError.h"
-#include "cli/QELReferenceType.h"
-#include "platform/PropertyListValue.h"
-#include "platform/ResourceReader.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELReferenceType.h"
+#include "platform/net/ResourceReader.h"
+#include "platform/plist/PropertyListValue.h"
 #include "sources/FeedParser.h"
 
 namespace {

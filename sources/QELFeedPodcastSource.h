@@ -4,7 +4,7 @@
 #include <optional>
 
 #include "model/QELPodcastSource.h"
-#include "platform/URL.h"
+#include "platform/net/URL.h"
 
 /// A podcast source that reads an RSS feed from a URL (http, https, file:).
 class QELFeedPodcastSource : public QELPodcastSource {

@@ -4,10 +4,10 @@
 #include <string_view>
 #include <utility>
 
-#include "cli/QELError.h"
+#include "cli/common/QELError.h"
 #include "model/QELPodcastKeys.h"
-#include "platform/FileManager.h"
-#include "platform/PropertyListReader.h"
+#include "platform/files/FileManager.h"
+#include "platform/plist/PropertyListReader.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <utility>
 
 #include "model/QELPodcastSource.h"
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// A podcast source that reads a reference file: a property list whose root is a reference
 /// dictionary ("PodcastName", "Episodes", ...).

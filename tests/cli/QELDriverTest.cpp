@@ -6,8 +6,8 @@
 #include <ostream>
 #include <string>
 
-#include "cli/QELError.h"
-#include "cli/QELProgress.h"
+#include "cli/common/QELError.h"
+#include "cli/common/QELProgress.h"
 #include "generators/QELBundlePodcastGenerator.h"
 #include "generators/QELFeedPodcastGenerator.h"
 #include "generators/QELReferenceFilePodcastGenerator.h"

@@ -7,7 +7,7 @@
 #include <thread>
 #include <vector>
 
-#include "platform/GregorianCalendar.h"
+#include "platform/time/GregorianCalendar.h"
 #include "tests/support/EnvironmentGuard.h"
 
 namespace {

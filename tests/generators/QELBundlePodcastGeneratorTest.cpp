@@ -12,9 +12,9 @@
 #include <set>
 #include <string>
 
-#include "cli/QELProgress.h"
-#include "platform/FileManager.h"
-#include "platform/PropertyListReader.h"
+#include "cli/common/QELProgress.h"
+#include "platform/files/FileManager.h"
+#include "platform/plist/PropertyListReader.h"
 #include "tests/support/InterposedCalls.h"
 #include "tests/support/TemporaryDirectory.h"
 

@@ -3,7 +3,7 @@
 #include <cstdio>
 #include <string>
 
-#include "cli/QELProgress.h"
+#include "cli/common/QELProgress.h"
 #include "model/QELEpisode.h"
 #include "model/QELPodcastSource.h"
 #include "tests/support/HTTPTestServer.h"

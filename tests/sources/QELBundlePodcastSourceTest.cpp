@@ -7,7 +7,7 @@
 #include <memory>
 #include <string>
 
-#include "platform/PropertyListWriter.h"
+#include "platform/plist/PropertyListWriter.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
 

@@ -2,7 +2,7 @@
 
 #include <string>
 
-#include "platform/PropertyListValue.h"
+#include "platform/plist/PropertyListValue.h"
 
 /// The value as one short line for comparison in tests: {"a": [1, 2u, 0.5r, "text", true,
 /// 2005-05-16T12:30:00.250, <00ff>]}. Integers that only an unsigned number holds end in u,

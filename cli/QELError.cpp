@@ -1,7 +1,0 @@
-#include "cli/QELError.h"
-
-#include <utility>
-
-platform::ErrorRecord QELError(std::int64_t code, std::string description) {
-  return {std::string(kQELErrorDomain), code, std::move(description)};
-}

@@ -1,0 +1,7 @@
+#include "cli/common/QELError.h"
+
+#include <utility>
+
+platform::ErrorRecord QELError(std::int64_t code, std::string description) {
+  return {std::string(kQELErrorDomain), code, std::move(description)};
+}

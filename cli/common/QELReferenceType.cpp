@@ -1,0 +1,19 @@
+#include "cli/common/QELReferenceType.h"
+
+#include "platform/text/TextHelpers.h"
+
+std::optional<platform::Text> QELReferenceType(std::optional<std::string_view> location) {
+  // Made once: every record shares them.
+  static const platform::Text local(kReferenceTypeLocal);
+  static const platform::Text remote(kReferenceTypeRemote);
+
+  if (!location || location->empty()) return std::nullopt;
+  // No prefix that is looked for takes more characters than this, and no character's lower case
+  // depends on what follows it here.
+  const std::string start = platform::lowercased(platform::firstCharacters(*location, 5));
+  return start.starts_with("http") || start.starts_with("file:") ? remote : local;
+}
+
+std::optional<platform::Text> QELMIMEType(std::optional<std::string_view> /*location*/) {
+  return std::nullopt;
+}

@@ -1,0 +1,126 @@
+#include "platform/files/FileDescriptor.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <exception>
+#include <utility>
+
+namespace platform {
+
+namespace {
+
+constexpr std::uint64_t kChunkSize = std::uint64_t{64} << 10U;
+
+bool waitFor(int descriptor, short events) {
+  pollfd request{descriptor, events, 0};
+  int count = -1;
+  do {
+    count = ::poll(&request, 1, -1);
+  } while (count < 0 && errno == EINTR);
+  return count > 0;
+}
+
+}  // namespace
+
+FileDescriptor::~FileDescriptor() {
+  close();
+}
+
+FileDescriptor::FileDescriptor(FileDescriptor&& other) noexcept
+    : descriptor_(std::exchange(other.descriptor_, -1)) {}
+
+FileDescriptor& FileDescriptor::operator=(FileDescriptor&& other) noexcept {
+  if (this != &other) {
+    close();
+    descriptor_ = std::exchange(other.descriptor_, -1);
+  }
+  return *this;
+}
+
+FileDescriptor FileDescriptor::open(const std::string& path, int flags, unsigned mode) {
+  if (path.find('\0') != std::string::npos) {
+    errno = EINVAL;
+    return {};
+  }
+  int descriptor = -1;
+  do {
+    descriptor = ::open(path.c_str(), flags | O_CLOEXEC | O_NOCTTY, mode);
+  } while (descriptor < 0 && errno == EINTR);
+  return FileDescriptor(descriptor);
+}
+
+FileDescriptor FileDescriptor::duplicated() const {
+  return FileDescriptor(::fcntl(descriptor_, F_DUPFD_CLOEXEC, 0));
+}
+
+bool FileDescriptor::close() {
+  const int descriptor = std::exchange(descriptor_, -1);
+  return descriptor < 0 || ::close(descriptor) == 0;
+}
+
+bool writeAll(int descriptor, std::string_view bytes) {
+  while (!bytes.empty()) {
+    const ssize_t count = ::write(descriptor, bytes.data(), bytes.size());
+    if (count > 0) {
+      bytes.remove_prefix(static_cast<std::size_t>(count));
+    } else if (count == 0) {
+      errno = EIO;
+      return false;
+    } else if (errno == EAGAIN) {
+      // A standard stream is non-blocking where another process that shares it made it so.
+      if (!waitFor(descriptor, POLLOUT)) {
+        return false;
+      }
+    } else if (errno != EINTR) {
+      return false;
+    }
+  }
+  return true;
+}
+
+std::ptrdiff_t readSome(int descriptor, char* buffer, std::size_t capacity) {
+  ssize_t count = -1;
+  do {
+    count = ::read(descriptor, buffer, capacity);
+  } while (count < 0 && errno == EINTR);
+  return count;
+}
+
+int readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit, std::string& bytes) {
+  std::uint64_t length = bytes.size();
+  try {
+    // The byte beyond the expected size lets the end be seen without growing; the one beyond the
+    // limit tells a longer input from one that just fits.
+    bytes.resize(std::min(length + std::max(expectedSize + 1, kChunkSize), limit + 1));
+    for (;;) {
+      if (length == bytes.size()) {
+        bytes.resize(std::min(length * 2, limit + 1));
+      }
+      const std::ptrdiff_t count =
+          readSome(descriptor, bytes.data() + length, bytes.size() - length);
+      const int failure = count < 0 ? errno : 0;
+      if (count <= 0) {
+        bytes.resize(length);
+        return failure;
+      }
+      length += static_cast<std::uint64_t>(count);
+      if (length > limit) {
+        bytes.resize(limit);
+        return EFBIG;
+      }
+    }
+  } catch (const std::exception&) {
+    bytes.resize(std::min<std::uint64_t>(length, bytes.size()));
+    return ENOMEM;
+  }
+}
+
+bool waitForInput(int descriptor) {
+  return waitFor(descriptor, POLLIN);
+}
+
+}  // namespace platform

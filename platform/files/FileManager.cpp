@@ -1,0 +1,130 @@
+#include "platform/files/FileManager.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <cstddef>
+#include <string_view>
+
+#include "platform/files/FileDescriptor.h"
+#include "platform/files/PosixError.h"
+#include "platform/files/RegularFile.h"
+#include "platform/files/TemporaryFile.h"
+
+namespace platform {
+
+namespace {
+
+bool isDirectory(const std::string& path) {
+  struct stat status {};
+  return ::stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
+}
+
+/// Lets the kernel copy as much as it will. Whatever it refuses, or takes for the end of the file
+/// without being there, is left to the caller, who learns the reason by going on from here.
+void copyInsideKernel(const RegularFile& source, const TemporaryFile& copy) {
+  // Small enough that a signal ends a copy promptly.
+  constexpr std::size_t kPieceSize = std::size_t{64} << 20U;
+  ssize_t count = 0;
+  do {
+    count =
+        ::copy_file_range(source.descriptor(), nullptr, copy.descriptor(), nullptr, kPieceSize, 0);
+  } while (count > 0 || (count < 0 && errno == EINTR));
+}
+
+bool copyRest(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
+  std::array<char, std::size_t{128} << 10U> buffer;
+  for (;;) {
+    const std::optional<std::size_t> count = source.read(buffer, error);
+    if (!count) {
+      return false;
+    }
+    if (*count == 0) {
+      return true;
+    }
+    if (!copy.write(std::string_view(buffer.data(), *count), error)) {
+      return false;
+    }
+  }
+}
+
+}  // namespace
+
+bool fileExists(const std::string& path) {
+  struct stat status {};
+  return path.find('\0') == std::string::npos && ::stat(path.c_str(), &status) == 0;
+}
+
+bool mayBeSymbolicLink(const std::string& path) {
+  struct stat status {};
+  if (::lstat(path.c_str(), &status) == 0) {
+    return S_ISLNK(status.st_mode);
+  }
+  return errno != ENOENT && errno != ENOTDIR;
+}
+
+std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error) {
+  const std::optional<RegularFile> file = RegularFile::open(path, error);
+  if (!file) {
+    return std::nullopt;
+  }
+  // The whole is read once and then kept by us: it need not stay in the system's cache as well.
+  ::posix_fadvise(file->descriptor(), 0, 0, POSIX_FADV_NOREUSE);
+  std::string bytes;
+  const int failure = file->size() > kWholeReadLimit
+                          ? EFBIG
+                          : readToEnd(file->descriptor(), file->size(), kWholeReadLimit, bytes);
+  if (failure == EFBIG) {
+    error = ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"};
+    return std::nullopt;
+  }
+  if (failure != 0) {
+    error = posixError(failure);
+    return std::nullopt;
+  }
+  return bytes;
+}
+
+bool createDirectories(const std::string& path, ErrorSlot& error) {
+  if (path.empty() || path.find('\0') != std::string::npos) {
+    error = posixError(path.empty() ? ENOENT : EINVAL);
+    return false;
+  }
+  std::size_t begin = path.find_first_not_of('/');
+  while (begin != std::string::npos) {
+    const std::size_t end = path.find('/', begin);
+    const std::string prefix = path.substr(0, end);
+    begin = path.find_first_not_of('/', end);
+    // What exists is not tried, since a read-only file system may refuse before it looks; and
+    // another process may have been quicker.
+    if (!isDirectory(prefix) && ::mkdir(prefix.c_str(), 0777) != 0) {
+      const int failure = errno;
+      if (!isDirectory(prefix)) {
+        const bool isParent = begin != std::string::npos;
+        error = posixError(failure == EEXIST && isParent ? ENOTDIR : failure);
+        return false;
+      }
+    }
+  }
+  return true;
+}
+
+bool copyFile(const std::string& source, const std::string& destination) {
+  ErrorSlot error;
+  std::optional<RegularFile> original = RegularFile::open(source, error);
+  struct stat status {};
+  if (!original || ::lstat(destination.c_str(), &status) == 0) {
+    return false;
+  }
+  TemporaryFile copy;
+  if (!copy.create(destination, error)) {
+    return false;
+  }
+  copyInsideKernel(*original, copy);
+  return copyRest(*original, copy, error) && copy.commitNew(error);
+}
+
+}  // namespace platform

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+#include "platform/text/ErrorRecord.h"
+
+namespace platform {
+
+/// The largest document that is read into memory: 2 GiB.
+inline constexpr std::uint64_t kWholeReadLimit = std::uint64_t{2} << 30U;
+
+/// Whether anything (file, directory, ...) exists at the path, symbolic links followed.
+bool fileExists(const std::string& path);
+
+/// Whether the path itself is a symbolic link, dangling or not; true as well when something is
+/// there and cannot be looked at.
+bool mayBeSymbolicLink(const std::string& path);
+
+/// The whole content of a regular file. Anything else (directory, device, FIFO, socket), a file
+/// over kWholeReadLimit and a failed read give no value and fill the slot.
+std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error);
+
+/// Creates the directory and all missing parents; an existing directory is accepted.
+bool createDirectories(const std::string& path, ErrorSlot& error);
+
+/// Copies a regular file to a path at which nothing exists yet (not even a dangling symbolic link).
+/// The copy appears under its name whole or not at all.
+bool copyFile(const std::string& source, const std::string& destination);
+
+}  // namespace platform

@@ -1,0 +1,34 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <span>
+#include <string>
+
+#include "platform/files/FileDescriptor.h"
+#include "platform/text/ErrorRecord.h"
+
+namespace platform {
+
+/// A regular file open for reading. Nothing else is ever opened or waited for: a directory, a
+/// device, a FIFO and a socket fail at once.
+class RegularFile {
+ public:
+  /// Symbolic links are followed. No value, and the slot filled, on failure.
+  static std::optional<RegularFile> open(const std::string& path, ErrorSlot& error);
+
+  int descriptor() const { return descriptor_.get(); }
+  /// The size when it was opened; some files (in /proc) claim 0 and hold more.
+  std::uint64_t size() const { return size_; }
+  /// Reads the next bytes: their number, 0 at the end. No value, and the slot filled, on failure.
+  std::optional<std::size_t> read(std::span<char> buffer, ErrorSlot& error);
+
+ private:
+  RegularFile(FileDescriptor descriptor, std::uint64_t size);
+
+  FileDescriptor descriptor_;
+  std::uint64_t size_;
+};
+
+}  // namespace platform

@@ -1,0 +1,76 @@
+#include "platform/files/StandardStreams.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstddef>
+#include <cstdio>
+
+#include "platform/files/FileManager.h"
+
+namespace platform {
+
+namespace {
+
+ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
+  return writeAll(STDOUT_FILENO, {bytes, length}) ? static_cast<ssize_t>(length) : 0;
+}
+
+/// The buffer in front of standard output. The C library's own stream loses what it holds when a
+/// write is interrupted or would block.
+std::FILE* outputStream() {
+  static std::FILE* const stream = [] {
+    cookie_io_functions_t functions{};
+    functions.write = &writeBuffered;
+    std::FILE* made = ::fopencookie(nullptr, "w", functions);
+    if (made == nullptr) return stdout;
+    // A line is seen at once where somebody is looking.
+    std::setvbuf(made, nullptr, ::isatty(STDOUT_FILENO) == 1 ? _IOLBF : _IOFBF, BUFSIZ);
+    return made;
+  }();
+  return stream;
+}
+
+}  // namespace
+
+std::string readStandardInput() {
+  std::string bytes;
+  while (readToEnd(STDIN_FILENO, 0, kWholeReadLimit, bytes) == EAGAIN &&
+         waitForInput(STDIN_FILENO)) {
+  }
+  return bytes;
+}
+
+void writeToStandardOutput(std::string_view text) {
+  std::fwrite(text.data(), 1, text.size(), outputStream());
+}
+
+void flushStandardOutput() {
+  std::fflush(outputStream());
+}
+
+void writeToStandardError(std::string_view text) {
+  writeAll(STDERR_FILENO, text);
+}
+
+OutputFile::OutputFile(const std::string& path, Mode mode) {
+  flushStandardOutput();  // the path may be another name of it
+  if (path == kStandardOutputPath) {
+    descriptor_ = STDOUT_FILENO;
+    return;
+  }
+  const int treatment = mode == Mode::kAppend ? O_APPEND : O_TRUNC;
+  file_ = FileDescriptor::open(path, O_WRONLY | O_CREAT | treatment, 0666);
+  descriptor_ = file_.get();
+}
+
+bool OutputFile::write(std::string_view bytes) {
+  if (descriptor_ >= 0 && writeAll(descriptor_, bytes)) {
+    return true;
+  }
+  descriptor_ = -1;
+  return false;
+}
+
+}  // namespace platform

@@ -1,0 +1,46 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "platform/files/FileDescriptor.h"
+
+namespace platform {
+
+/// Standard input read to its end, in chunks of whatever size is available. A read error ends it as
+/// the end of the input does, and so does kWholeReadLimit.
+std::string readStandardInput();
+
+/// Writes to standard output through a buffer, which is flushed at line breaks on a terminal; where
+/// the output is non-blocking, waits. Failures are not reported.
+void writeToStandardOutput(std::string_view text);
+void flushStandardOutput();
+
+/// Writes to standard error, unbuffered; failures are not reported.
+void writeToStandardError(std::string_view text);
+
+/// The path that stands for standard output where an output path is expected.
+inline constexpr std::string_view kStandardOutputPath = "/dev/stdout";
+
+/// An output path opened for writing, its content replaced or appended to.
+///
+/// kStandardOutputPath is served by the already open standard output, behind anything printed
+/// before, so that a shell's ">>" appends and a pipe or a socket will do. Failures to open or write
+/// are not reported beyond the result of `write`.
+class OutputFile {
+ public:
+  enum class Mode { kReplace, kAppend };
+  OutputFile(const std::string& path, Mode mode);
+  ~OutputFile() = default;
+  OutputFile(const OutputFile&) = delete;
+  OutputFile& operator=(const OutputFile&) = delete;
+
+  /// False when the file is not open or did not take all bytes, and from then on.
+  bool write(std::string_view bytes);
+
+ private:
+  FileDescriptor file_;  // not open for standard output
+  int descriptor_ = -1;  // -1 as well after a failure
+};
+
+}  // namespace platform

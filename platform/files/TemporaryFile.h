@@ -1,0 +1,57 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "platform/files/FileDescriptor.h"
+#include "platform/text/ErrorRecord.h"
+
+namespace platform {
+
+/// A file that is written under a hidden name in its destination's directory and gets its final
+/// name in one step once it is whole.
+///
+/// Unless a commit succeeded, the destructor removes it; so does any failure, and so do SIGINT,
+/// SIGTERM and SIGHUP where they would end the process. A symbolic link at the final name is
+/// replaced, never written through. Move-only is not needed: one scope owns it.
+class TemporaryFile {
+ public:
+  TemporaryFile() = default;
+  ~TemporaryFile();
+  TemporaryFile(const TemporaryFile&) = delete;
+  TemporaryFile& operator=(const TemporaryFile&) = delete;
+
+  /// Creates the hidden file beside `destination`, which may be 255 bytes long in its last
+  /// component. A file that this object had before is removed.
+  bool create(const std::string& destination, ErrorSlot& error);
+  /// Appends the bytes; a short write is a failure.
+  bool write(std::string_view bytes, ErrorSlot& error);
+  /// Closes the file, checks that, and moves it to the destination, replacing what is there (but
+  /// never a directory).
+  bool commitReplacing(ErrorSlot& error);
+  /// The same, failing when anything exists at the destination, be it a dangling symbolic link.
+  bool commitNew(ErrorSlot& error);
+
+  /// The open file, -1 before `create`, after a commit and after a failure.
+  int descriptor() const { return descriptor_.get(); }
+
+ private:
+  class Registry;
+
+  bool commit(int (*move)(const char* from, const char* to), ErrorSlot& error);
+  void discard();
+
+  FileDescriptor descriptor_;
+  std::string path_;  // of the hidden file; empty when there is none
+  std::string destination_;
+  TemporaryFile* next_ = nullptr;  // in the registry
+};
+
+/// Whether the name (without a directory) could be that of such a hidden file, whoever made it.
+bool isTemporaryFileName(std::string_view name);
+
+/// Removes from a directory the hidden files that a killed run left there. A file that a living
+/// process still writes is not touched, nor is any other; failures are not reported.
+void removeStaleTemporaryFiles(const std::string& directory);
+
+}  // namespace platform

@@ -1,0 +1,151 @@
+#include "platform/net/Download.h"
+
+#include <cerrno>
+#include <cstddef>
+#include <optional>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "platform/files/RegularFile.h"
+#include "platform/files/TemporaryFile.h"
+#include "platform/net/EventSource.h"
+#include "platform/net/NetworkTransfer.h"
+
+namespace platform {
+namespace {
+
+constexpr std::size_t kFileChunkSize = std::size_t{256} * 1024;
+
+}  // namespace
+
+/// Gathers what happened to a download and hands it to the receiver, one event at a time.
+class Download::Transfer : public EventSource {
+ public:
+  Transfer(Download& download, std::string destination, DownloadReceiver& receiver)
+      : download_(download), destination_(std::move(destination)), receiver_(receiver) {}
+
+  bool hasEvent() const override { return response_.has_value() || writtenLength_ > 0; }
+  void deliverEvent() final;
+
+ protected:
+  /// Makes the next event, with nothing left to deliver. False once all bytes were written, or with
+  /// an error when that failed.
+  virtual bool advance(ErrorSlot& error) = 0;
+
+  bool beginFile(std::int64_t expectedLength, ErrorSlot& error) {
+    if (!file_.create(destination_, error)) return false;
+    response_ = expectedLength;
+    return true;
+  }
+
+  bool append(std::string_view bytes, ErrorSlot& error) {
+    if (!file_.write(bytes, error)) return false;
+    writtenLength_ += bytes.size();
+    return true;
+  }
+
+ private:
+  void finish(ErrorSlot error);
+
+  Download& download_;
+  std::string destination_;
+  DownloadReceiver& receiver_;
+  TemporaryFile file_;
+  std::optional<std::int64_t> response_;  // what is to be delivered
+  std::uint64_t writtenLength_ = 0;
+};
+
+void Download::Transfer::deliverEvent() {
+  ErrorSlot error;
+  if (!Transfer::hasEvent() && !advance(error)) {
+    finish(std::move(error));
+  } else if (response_) {
+    const std::int64_t expectedLength = *std::exchange(response_, std::nullopt);
+    receiver_.didReceiveResponse(download_, expectedLength);
+  } else {
+    receiver_.didReceiveDataOfLength(download_, std::exchange(writtenLength_, 0));
+  }
+}
+
+void Download::Transfer::finish(ErrorSlot error) {
+  if (!error) file_.commitReplacing(error);
+  // The transfer ends before its last event is told: the receiver may destroy the download, and the
+  // event loop has nothing more to expect of it.
+  Download& download = download_;
+  DownloadReceiver& receiver = receiver_;
+  download.transfer_.reset();
+  if (error) {
+    receiver.didFailWithError(download, *error);
+  } else {
+    receiver.downloadDidFinish(download);
+  }
+}
+
+class Download::NetworkDownload final : public Transfer, private NetworkTransfer::Sink {
+ public:
+  NetworkDownload(const URL& url, const std::string& destination, Download& download,
+                  DownloadReceiver& receiver)
+      : Transfer(download, destination, receiver), network_(url, nullptr, *this) {}
+
+  bool hasEvent() const override { return Transfer::hasEvent() || network_.hasEnded(); }
+
+ private:
+  bool advance(ErrorSlot& error) override {
+    error = network_.error();
+    return false;
+  }
+  bool begin(std::int64_t expectedLength, std::string_view, ErrorSlot& error) override {
+    return beginFile(expectedLength, error);
+  }
+  bool take(std::string_view bytes, ErrorSlot& error) override { return append(bytes, error); }
+
+  NetworkTransfer network_;
+};
+
+class Download::FileDownload final : public Transfer {
+ public:
+  FileDownload(const URL& url, const std::string& destination, Download& download,
+               DownloadReceiver& receiver)
+      : Transfer(download, destination, receiver), path_(url.path()) {}
+
+  bool hasEvent() const override { return true; }
+
+ private:
+  bool advance(ErrorSlot& error) override {
+    if (source_) return copyChunk(error);
+    source_ = RegularFile::open(path_, error);
+    return source_ && beginFile(static_cast<std::int64_t>(source_->size()), error);
+  }
+
+  bool copyChunk(ErrorSlot& error) {
+    if (buffer_.empty()) buffer_.resize(kFileChunkSize);
+    const std::optional<std::size_t> length = source_->read(buffer_, error);
+    if (!length) return false;
+    if (*length == 0) {
+      if (copiedLength_ < source_->size()) {
+        error = ErrorRecord{"POSIX", EIO, "The file became shorter while it was read"};
+      }
+      return false;
+    }
+    copiedLength_ += *length;
+    return append({buffer_.data(), *length}, error);
+  }
+
+  std::string path_;
+  std::optional<RegularFile> source_;
+  std::vector<char> buffer_;
+  std::uint64_t copiedLength_ = 0;
+};
+
+Download::Download(const URL& url, const std::string& destination, DownloadReceiver& receiver) {
+  if (url.scheme() == "file") {
+    transfer_ = std::make_unique<FileDownload>(url, destination, *this, receiver);
+  } else {
+    transfer_ = std::make_unique<NetworkDownload>(url, destination, *this, receiver);
+  }
+}
+
+Download::~Download() = default;
+
+}  // namespace platform

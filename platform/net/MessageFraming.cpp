@@ -1,0 +1,93 @@
+#include "platform/net/MessageFraming.h"
+
+#include <charconv>
+#include <limits>
+#include <system_error>
+
+#include "platform/text/TextHelpers.h"
+
+namespace platform {
+namespace {
+
+constexpr std::string_view kNoNumber = "The announced length is no number";
+constexpr std::string_view kTooLarge = "The announced length cannot be true";
+constexpr std::string_view kTwoLengths = "The announced lengths contradict each other";
+constexpr std::string_view kUnknownCoding =
+    "The body comes in a transfer coding that was not asked for";
+constexpr std::string_view kBrokenField = "The header does not tell where the body ends";
+
+constexpr std::string_view kWhiteSpace = " \t\r\n";
+
+std::string_view trimmed(std::string_view text) {
+  const std::size_t first = text.find_first_not_of(kWhiteSpace);
+  if (first == std::string_view::npos) return {};
+  return text.substr(first, text.find_last_not_of(kWhiteSpace) - first + 1);
+}
+
+}  // namespace
+
+void MessageFraming::takeLine(std::string_view line) {
+  if (lowercased(line.substr(0, 5)) == "http/") {
+    *this = MessageFraming();
+    return;
+  }
+  if (trimmed(line).empty()) return;
+  if (kWhiteSpace.find(line.front()) != std::string_view::npos) {
+    // A field's second line, which servers must not send and few clients read alike.
+    if (field_ != Field::kOther) fault_ = kBrokenField;
+    return;
+  }
+  const std::size_t colon = line.find(':');
+  const std::string_view name = line.substr(0, colon);
+  const std::string plainName = lowercased(trimmed(name));
+  field_ = plainName == "content-length"      ? Field::kLength
+           : plainName == "transfer-encoding" ? Field::kCoding
+                                              : Field::kOther;
+  if (field_ == Field::kOther) return;
+  if (colon == std::string_view::npos || plainName.size() != name.size()) {
+    // A library takes a name with a space behind it for another field.
+    fault_ = kBrokenField;
+    return;
+  }
+  const std::string_view value = line.substr(colon + 1);
+  if (field_ == Field::kLength) {
+    takeLengths(value);
+  } else {
+    takeCodings(value);
+  }
+}
+
+std::optional<std::uint64_t> MessageFraming::length() const {
+  return isChunked_ ? std::nullopt : length_;
+}
+
+void MessageFraming::takeLengths(std::string_view value) {
+  constexpr std::uint64_t kLargest = std::numeric_limits<std::int64_t>::max();
+  for (const std::string_view piece : splitAt(value, ',')) {
+    const std::string_view digits = trimmed(piece);
+    const char* const end = digits.data() + digits.size();
+    std::uint64_t length = 0;
+    const std::from_chars_result result = std::from_chars(digits.data(), end, length);
+    if (result.ptr != end || result.ec == std::errc::invalid_argument) {
+      fault_ = kNoNumber;
+    } else if (result.ec == std::errc::result_out_of_range || length > kLargest) {
+      fault_ = kTooLarge;
+    } else if (length_ && *length_ != length) {
+      fault_ = kTwoLengths;
+    }
+    length_ = length;
+  }
+}
+
+void MessageFraming::takeCodings(std::string_view value) {
+  for (const std::string_view piece : splitAt(value, ',')) {
+    const std::string coding = lowercased(trimmed(piece));
+    if (coding == "chunked") {
+      isChunked_ = true;
+    } else if (!coding.empty() && coding != "identity") {
+      fault_ = kUnknownCoding;
+    }
+  }
+}
+
+}  // namespace platform

@@ -1,0 +1,285 @@
+#include "platform/net/NetworkTransfer.h"
+
+#include <algorithm>
+#include <climits>
+#include <cstddef>
+#include <exception>
+#include <utility>
+#include <vector>
+
+#include "platform/net/PerThread.h"
+#include "platform/net/TransferLibrary.h"
+
+namespace platform {
+namespace {
+
+constexpr long kMaximumRedirects = 20;
+constexpr long kReceiveBufferSize = 512L * 1024;
+/// The library's largest, 24 days: the operating system gives up on a connection long before.
+constexpr long kNoConnectTimeout = INT_MAX / 1000;
+/// A short page with the reason of a failure is read to its end, which keeps the connection alive.
+constexpr std::uint64_t kIgnoredBodyLimit = std::uint64_t{64} * 1024;
+/// The library reads the page of a redirect by itself, and would do so for ever. Some servers send
+/// the whole page that they meant to move away from.
+constexpr std::int64_t kRedirectPageLimit = std::int64_t{16} * 1024 * 1024;
+/// Of all answers of a transfer together; honest ones have a few KiB.
+constexpr std::uint64_t kHeaderLimit = std::uint64_t{1} * 1024 * 1024;
+
+static_assert(static_cast<int>(TransferErrorCode::kUnsupportedScheme) ==
+              CURLE_UNSUPPORTED_PROTOCOL);
+static_assert(static_cast<int>(TransferErrorCode::kOutOfMemory) == CURLE_OUT_OF_MEMORY);
+static_assert(static_cast<int>(TransferErrorCode::kBadContentEncoding) ==
+              CURLE_BAD_CONTENT_ENCODING);
+static_assert(static_cast<int>(TransferErrorCode::kTooLarge) == CURLE_FILESIZE_EXCEEDED);
+
+/// The library quotes what servers sent; none of that may steer a terminal or break the encoding.
+std::string shownText(std::string_view text) {
+  while (!text.empty() && (text.back() == '\n' || text.back() == '\r' || text.back() == '.')) {
+    text.remove_suffix(1);
+  }
+  std::string shown(text);
+  std::replace_if(
+      shown.begin(), shown.end(), [](char c) { return c < ' ' || c > '~'; }, '?');
+  return shown;
+}
+
+/// Only called for a transfer, which is not begun without the library.
+const TransferLibrary& library() {
+  return *TransferLibrary::functions();
+}
+
+ErrorRecord outOfMemory() {
+  return transferError(TransferErrorCode::kOutOfMemory, "Out of memory");
+}
+
+}  // namespace
+
+ErrorRecord transferError(TransferErrorCode code, std::string description) {
+  return {"transfer", static_cast<std::int64_t>(code), std::move(description)};
+}
+
+/// The connections of one thread, and its transfers that are running.
+class NetworkTransfer::Connections {
+ public:
+  static Connections& ofThisThread() { return PerThread<Connections>::value(); }
+
+  CURLcode add(NetworkTransfer& transfer) {
+    if (!handle_) return libraryState() == CURLE_OK ? CURLE_OUT_OF_MEMORY : libraryState();
+    running_.push_back(&transfer);
+    const CURLMcode code = library().multiAddHandle(handle_.get(), transfer.handle_.get());
+    return code == CURLM_OK ? CURLE_OK : CURLE_OUT_OF_MEMORY;
+  }
+
+  void remove(NetworkTransfer& transfer) {
+    library().multiRemoveHandle(handle_.get(), transfer.handle_.get());
+    running_.erase(std::remove(running_.begin(), running_.end(), &transfer), running_.end());
+  }
+
+  bool run() {
+    if (running_.empty()) return false;
+    int count = 0;
+    CURLMcode code = library().multiPoll(handle_.get(), nullptr, 0, INT_MAX, nullptr);
+    if (code == CURLM_OK) code = library().multiPerform(handle_.get(), &count);
+    if (code != CURLM_OK) {
+      const CURLcode result = code == CURLM_OUT_OF_MEMORY ? CURLE_OUT_OF_MEMORY : CURLE_FAILED_INIT;
+      while (!running_.empty()) running_.back()->end(result);
+      return true;
+    }
+    while (const CURLMsg* message = library().multiInfoRead(handle_.get(), &count)) {
+      if (message->msg != CURLMSG_DONE) continue;
+      const CURLcode result = message->data.result;
+      void* transfer = nullptr;
+      library().easyGetinfo(message->easy_handle, CURLINFO_PRIVATE, &transfer);
+      static_cast<NetworkTransfer*>(transfer)->end(result);
+    }
+    return true;
+  }
+
+ private:
+  struct Closer {
+    void operator()(CURLM* handle) const { library().multiCleanup(handle); }
+  };
+
+  // What the library sets up once costs milliseconds, which only a run with transfers pays.
+  static CURLcode libraryState() {
+    static const CURLcode state = library().globalInit(CURL_GLOBAL_DEFAULT);
+    return state;
+  }
+
+  static CURLM* newHandle() { return libraryState() == CURLE_OK ? library().multiInit() : nullptr; }
+
+  std::unique_ptr<CURLM, Closer> handle_{newHandle()};
+  std::vector<NetworkTransfer*> running_;
+};
+
+void NetworkTransfer::HandleCloser::operator()(void* handle) const {
+  library().easyCleanup(handle);
+}
+
+NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink)
+    : sink_(sink) {
+  if (url.scheme() != "http" && url.scheme() != "https") {
+    error_ = transferError(TransferErrorCode::kUnsupportedScheme,
+                           "URLs of the scheme \"" + url.scheme() + "\" are not supported");
+    ended_ = true;
+    return;
+  }
+  if (TransferLibrary::error()) {
+    error_ = TransferLibrary::error();
+    ended_ = true;
+    return;
+  }
+  Connections& connections = Connections::ofThisThread();
+  int result = configure(url, acceptedEncoding);
+  if (result == CURLE_OK) result = connections.add(*this);
+  if (result != CURLE_OK) end(result);
+}
+
+NetworkTransfer::~NetworkTransfer() {
+  if (!ended_) Connections::ofThisThread().remove(*this);
+}
+
+int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
+  handle_.reset(library().easyInit());
+  if (!handle_) return CURLE_OUT_OF_MEMORY;
+
+  CURLcode result = CURLE_OK;
+  const auto set = [this, &result](CURLoption option, auto value) {
+    if (result == CURLE_OK) result = library().easySetopt(handle_.get(), option, value);
+  };
+  static_assert(sizeof(errorText_) >= CURL_ERROR_SIZE);
+  set(CURLOPT_PRIVATE, static_cast<void*>(this));
+  set(CURLOPT_ERRORBUFFER, errorText_.data());
+  set(CURLOPT_URL, url.encodedText().c_str());
+  set(CURLOPT_PROTOCOLS_STR, "http,https");
+  set(CURLOPT_REDIR_PROTOCOLS_STR, "http,https");
+  set(CURLOPT_FOLLOWLOCATION, 1L);
+  set(CURLOPT_MAXREDIRS, kMaximumRedirects);
+  set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
+  set(CURLOPT_USERAGENT, "qel/" QEL_VERSION);
+  // The sink undoes the coding itself: the library takes a stream that stops early for whole.
+  set(CURLOPT_ACCEPT_ENCODING, acceptedEncoding);
+  set(CURLOPT_HTTP_CONTENT_DECODING, 0L);
+  set(CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
+  set(CURLOPT_NOSIGNAL, 1L);
+  set(CURLOPT_CONNECTTIMEOUT, kNoConnectTimeout);
+  set(CURLOPT_BUFFERSIZE, kReceiveBufferSize);
+  set(CURLOPT_HEADERFUNCTION, &NetworkTransfer::headerCallback);
+  set(CURLOPT_HEADERDATA, static_cast<void*>(this));
+  set(CURLOPT_WRITEFUNCTION, &NetworkTransfer::bodyCallback);
+  set(CURLOPT_WRITEDATA, static_cast<void*>(this));
+  const curl_xferinfo_callback progressCallback = [](void* self, curl_off_t, curl_off_t bodySize,
+                                                     curl_off_t, curl_off_t) {
+    const bool isIgnored = !static_cast<NetworkTransfer*>(self)->begun_;
+    return isIgnored && bodySize > kRedirectPageLimit ? 1 : 0;
+  };
+  set(CURLOPT_XFERINFOFUNCTION, progressCallback);
+  set(CURLOPT_XFERINFODATA, static_cast<void*>(this));
+  set(CURLOPT_NOPROGRESS, 0L);
+  return result;
+}
+
+int NetworkTransfer::status() const {
+  long status = 0;
+  library().easyGetinfo(handle_.get(), CURLINFO_RESPONSE_CODE, &status);
+  return static_cast<int>(status);
+}
+
+void NetworkTransfer::end(int resultCode) {
+  Connections::ofThisThread().remove(*this);
+  ended_ = true;
+  if (error_) return;
+  const auto result = static_cast<CURLcode>(resultCode);
+  // A failed status is the cause, however its page ended.
+  const bool hasFailedStatus = !begun_ && (result == CURLE_OK || status() >= 400);
+  if (!begun_ && result == CURLE_OK && status() == 200) {
+    error_ = {"transfer", CURLE_PARTIAL_FILE, "The header of the answer is cut short"};
+  } else if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
+    error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
+  } else if (result == CURLE_ABORTED_BY_CALLBACK) {
+    error_ =
+        transferError(TransferErrorCode::kTooLarge, "The page of a redirect is larger than 16 MiB");
+  } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
+    // The library says the same of a line beyond its limit.
+    error_ = {"transfer", result,
+              "A line of the answer's header is too long, or memory has run out"};
+  } else if (result != CURLE_OK) {
+    const std::string_view detail = errorText_.data();
+    error_ = {"transfer", result,
+              shownText(detail.empty() ? library().easyStrerror(result) : detail)};
+  }
+}
+
+bool NetworkTransfer::isInHeader() const {
+  curl_off_t firstByteTime = 0;
+  library().easyGetinfo(handle_.get(), CURLINFO_STARTTRANSFER_TIME_T, &firstByteTime);
+  return firstByteTime > 0 && !begun_;
+}
+
+std::optional<std::string> NetworkTransfer::headerValue(const char* name) const {
+  curl_header* header = nullptr;
+  if (library().easyHeader(handle_.get(), name, 0, CURLH_HEADER, -1, &header) != CURLHE_OK) {
+    return std::nullopt;
+  }
+  return header->value;
+}
+
+bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
+  headerSize_ += line.size();
+  if (headerSize_ > kHeaderLimit) {
+    error_ = transferError(TransferErrorCode::kTooLarge, "The header is longer than 1 MiB");
+    return false;
+  }
+  if (begun_) return true;  // behind the body
+  framing_.takeLine(line);
+  const bool endsHeader = line == "\r\n" || line == "\n";
+  return !endsHeader || didReceiveHeader();
+}
+
+bool NetworkTransfer::didReceiveHeader() {
+  const int status = this->status();
+  const bool hasBody = status >= 200 && status != 204 && status != 304;
+  if (hasBody && !framing_.fault().empty()) {
+    if (status < 400) error_ = {"transfer", CURLE_PARTIAL_FILE, std::string(framing_.fault())};
+    return false;
+  }
+  if (status != 200) return true;
+  begun_ = true;
+  const std::optional<std::uint64_t> length = framing_.length();
+  return sink_.begin(length ? static_cast<std::int64_t>(*length) : -1,
+                     headerValue("Content-Encoding").value_or(""), error_);
+}
+
+bool NetworkTransfer::didReceiveBody(std::string_view bytes) {
+  if (begun_) return sink_.take(bytes, error_);
+  ignoredSize_ += bytes.size();
+  return ignoredSize_ <= kIgnoredBodyLimit;
+}
+
+std::size_t NetworkTransfer::headerCallback(char* bytes, std::size_t size, std::size_t count,
+                                            void* self) {
+  auto& transfer = *static_cast<NetworkTransfer*>(self);
+  try {
+    return transfer.didReceiveHeaderLine({bytes, size * count}) ? size * count : 0;
+  } catch (const std::exception&) {
+    transfer.error_ = outOfMemory();
+    return 0;
+  }
+}
+
+std::size_t NetworkTransfer::bodyCallback(char* bytes, std::size_t size, std::size_t count,
+                                          void* self) {
+  auto& transfer = *static_cast<NetworkTransfer*>(self);
+  try {
+    return transfer.didReceiveBody({bytes, size * count}) ? size * count : 0;
+  } catch (const std::exception&) {
+    transfer.error_ = outOfMemory();
+    return 0;
+  }
+}
+
+bool NetworkTransfer::runAll() {
+  return Connections::ofThisThread().run();
+}
+
+}  // namespace platform

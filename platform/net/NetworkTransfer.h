@@ -1,0 +1,93 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "platform/net/MessageFraming.h"
+#include "platform/net/URL.h"
+#include "platform/text/ErrorRecord.h"
+
+namespace platform {
+
+/// The codes of the domain "transfer" (those of the transfer library) that others use as well.
+enum class TransferErrorCode : std::int64_t {
+  kUnsupportedScheme = 1,
+  kOutOfMemory = 27,
+  kBadContentEncoding = 61,
+  kTooLarge = 63,
+};
+
+/// A new error record of the domain "transfer".
+ErrorRecord transferError(TransferErrorCode code, std::string description);
+
+/// One http or https request and its answer. For the use of platform/ alone.
+///
+/// All transfers of a thread share its connections, which stay open between them. They make
+/// progress while the thread is in runAll(). A final status of 200 is success and nothing else is;
+/// any other is an error of the domain "HTTP" with the status as its code. A header that does not
+/// tell where the body ends, or that is longer than any honest one, is a failure. Destroying a
+/// running transfer cancels it; not from within its sink.
+class NetworkTransfer {
+ public:
+  /// Takes the answer as it comes. Returning false with an error fails the transfer. Exceptions of
+  /// the standard library may pass.
+  class Sink {
+   public:
+    virtual ~Sink() = default;
+    /// The header with the final status 200 has come. `expectedLength` is -1 when unknown.
+    virtual bool begin(std::int64_t expectedLength, std::string_view contentEncoding,
+                       ErrorSlot& error) = 0;
+    /// The next bytes of the body, as they are sent.
+    virtual bool take(std::string_view bytes, ErrorSlot& error) = 0;
+  };
+
+  /// Starts the transfer. `acceptedEncoding` is a content coding such as "gzip" that the sink
+  /// understands, null for none.
+  NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink);
+  ~NetworkTransfer();
+  NetworkTransfer(const NetworkTransfer&) = delete;
+  NetworkTransfer& operator=(const NetworkTransfer&) = delete;
+
+  bool hasEnded() const { return ended_; }
+  /// Why it failed; empty while it runs and when it ended well.
+  const ErrorSlot& error() const { return error_; }
+
+  /// Waits without a deadline until something happens on one of the thread's transfers, and lets
+  /// all of them proceed. False when none is running.
+  static bool runAll();
+
+ private:
+  class Connections;
+  struct HandleCloser {
+    void operator()(void* handle) const;
+  };
+
+  int configure(const URL& url, const char* acceptedEncoding);
+  void end(int resultCode);
+  int status() const;
+  /// Whether the end came before the body, but not before the first byte of the answer.
+  bool isInHeader() const;
+  /// Of the final response so far; absent when it has no such header.
+  std::optional<std::string> headerValue(const char* name) const;
+  bool didReceiveHeaderLine(std::string_view line);
+  bool didReceiveHeader();
+  bool didReceiveBody(std::string_view bytes);
+  static std::size_t headerCallback(char* bytes, std::size_t size, std::size_t count, void* self);
+  static std::size_t bodyCallback(char* bytes, std::size_t size, std::size_t count, void* self);
+
+  Sink& sink_;
+  ErrorSlot error_;
+  bool ended_ = false;
+  bool begun_ = false;  // whether the status 200 has come
+  MessageFraming framing_;
+  std::uint64_t headerSize_ = 0;   // of all answers so far, trailers included
+  std::uint64_t ignoredSize_ = 0;  // of the body of another status
+  std::array<char, 256> errorText_{};
+  std::unique_ptr<void, HandleCloser> handle_;
+};
+
+}  // namespace platform

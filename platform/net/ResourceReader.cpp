@@ -1,0 +1,121 @@
+#include "platform/net/ResourceReader.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <initializer_list>
+#include <string_view>
+#include <utility>
+
+#include "platform/net/GzipDecoder.h"
+#include "platform/net/NetworkTransfer.h"
+#include "platform/text/TextHelpers.h"
+
+namespace platform {
+namespace {
+
+/// A few KiB can decompress to GiB. No document comes near this ratio; a small one may, by chance.
+constexpr std::uint64_t kLargestRatio = 100;
+constexpr std::uint64_t kAnyRatioSize = std::uint64_t{64} << 20U;
+
+bool isOneOf(std::string_view text, std::initializer_list<std::string_view> texts) {
+  return std::find(texts.begin(), texts.end(), text) != texts.end();
+}
+
+/// Collects a body in memory, decompressed.
+class BodyCollector : public NetworkTransfer::Sink {
+ public:
+  explicit BodyCollector(std::uint64_t limit) : limit_(limit) {}
+
+  bool begin(std::int64_t expectedLength, std::string_view contentEncoding,
+             ErrorSlot& error) override {
+    if (!beginDecoding(lowercased(contentEncoding), error)) return false;
+    if (decoder_) return true;
+    if (expectedLength <= 0) return true;
+    const auto length = static_cast<std::uint64_t>(expectedLength);
+    if (length > limit_) return failAsTooLarge(error);
+    // The announcement may be a lie; beyond this the body grows as its bytes come.
+    constexpr std::uint64_t kLargestReservation = std::uint64_t{16} << 20U;
+    body_.reserve(static_cast<std::size_t>(std::min(length, kLargestReservation)));
+    return true;
+  }
+
+  bool take(std::string_view bytes, ErrorSlot& error) override {
+    receivedSize_ += bytes.size();
+    if (!decoder_) return append(bytes, error);
+    const auto sink = [this, &error](std::string_view piece) { return append(piece, error); };
+    if (decoder_->decode(bytes, sink)) return true;
+    if (!error) {
+      error =
+          transferError(TransferErrorCode::kBadContentEncoding, "The compressed body is malformed");
+    }
+    return false;
+  }
+
+  /// The body once all bytes have come.
+  std::optional<std::string> finish(ErrorSlot& error) {
+    if (decoder_ && !decoder_->isWhole()) {
+      error =
+          transferError(TransferErrorCode::kBadContentEncoding, "The compressed body is cut short");
+      return std::nullopt;
+    }
+    return std::move(body_);
+  }
+
+ private:
+  /// Servers name codings that are none ("utf-8"), so only those that are known to need decoding
+  /// are refused; what an unknown name stands for shows in the document.
+  bool beginDecoding(const std::string& codings, ErrorSlot& error) {
+    const std::string names = replacingAll(codings, " ", "");
+    for (const std::string_view piece : splitAt(names, ',')) {
+      const bool isGzip = isOneOf(piece, {"gzip", "x-gzip"});
+      if ((isGzip && decoder_) ||
+          isOneOf(piece, {"br", "compress", "x-compress", "deflate", "zstd"})) {
+        error = transferError(TransferErrorCode::kBadContentEncoding,
+                              "The body comes in a content coding that was not asked for");
+        return false;
+      }
+      if (isGzip) decoder_.emplace();
+    }
+    return true;
+  }
+
+  bool append(std::string_view bytes, ErrorSlot& error) {
+    if (bytes.size() > limit_ - body_.size()) return failAsTooLarge(error);
+    const std::uint64_t size = body_.size() + bytes.size();
+    if (size > kAnyRatioSize && size / kLargestRatio > receivedSize_) {
+      error = transferError(TransferErrorCode::kTooLarge,
+                            "The body is more than 100 times as large as its compressed form");
+      return false;
+    }
+    body_.append(bytes);
+    return true;
+  }
+
+  bool failAsTooLarge(ErrorSlot& error) const {
+    error = transferError(TransferErrorCode::kTooLarge,
+                          "The resource is larger than " + std::to_string(limit_) + " bytes");
+    return false;
+  }
+
+  std::uint64_t limit_;
+  std::uint64_t receivedSize_ = 0;  // as it was sent
+  std::string body_;
+  std::optional<GzipDecoder> decoder_;
+};
+
+}  // namespace
+
+std::optional<std::string> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit) {
+  if (url.scheme() == "file") return readWholeFile(url.path(), error);
+
+  BodyCollector collector(limit);
+  const NetworkTransfer transfer(url, "gzip", collector);
+  while (!transfer.hasEnded()) NetworkTransfer::runAll();
+  if (transfer.error()) {
+    error = transfer.error();
+    return std::nullopt;
+  }
+  return collector.finish(error);
+}
+
+}  // namespace platform

@@ -1,0 +1,56 @@
+#include "platform/net/TransferLibrary.h"
+
+#include <dlfcn.h>
+
+#include <type_traits>
+
+namespace platform {
+
+namespace {
+
+/// The file of the only binary interface that the library has had since 2006.
+constexpr const char* kFile = "libcurl.so.4";
+
+ErrorRecord loadingError() {
+  const char* const cause = dlerror();
+  return {"transfer", CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded"};
+}
+
+}  // namespace
+
+TransferLibrary::TransferLibrary() {
+  // It stays loaded: what it registered with the thread and the process outlives every transfer.
+  void* const library = dlopen(kFile, RTLD_LAZY | RTLD_LOCAL);
+  if (library == nullptr) {
+    error_ = loadingError();
+    return;
+  }
+  const auto find = [this, library](auto& function, const char* name) {
+    function = reinterpret_cast<std::decay_t<decltype(function)>>(dlsym(library, name));
+    if (function == nullptr && !error_) error_ = loadingError();
+  };
+  find(globalInit, "curl_global_init");
+  find(easyInit, "curl_easy_init");
+  find(easyCleanup, "curl_easy_cleanup");
+  find(easySetopt, "curl_easy_setopt");
+  find(easyGetinfo, "curl_easy_getinfo");
+  find(easyHeader, "curl_easy_header");
+  find(easyStrerror, "curl_easy_strerror");
+  find(multiInit, "curl_multi_init");
+  find(multiCleanup, "curl_multi_cleanup");
+  find(multiAddHandle, "curl_multi_add_handle");
+  find(multiRemoveHandle, "curl_multi_remove_handle");
+  find(multiPoll, "curl_multi_poll");
+  find(multiPerform, "curl_multi_perform");
+  find(multiInfoRead, "curl_multi_info_read");
+  find(url, "curl_url");
+  find(urlCleanup, "curl_url_cleanup");
+  find(urlSet, "curl_url_set");
+}
+
+const TransferLibrary& TransferLibrary::instance() {
+  static const TransferLibrary library;
+  return library;
+}
+
+}  // namespace platform

@@ -1,0 +1,288 @@
+#include "platform/net/URL.h"
+
+#include <unicode/uidna.h>
+#include <unicode/utf8.h>
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <new>
+
+#include "platform/net/TransferLibrary.h"
+#include "platform/text/ICUMemory.h"
+
+namespace platform {
+namespace {
+
+constexpr std::string_view kHexDigits = "0123456789ABCDEF";
+
+bool isDigit(char c) {
+  return c >= '0' && c <= '9';
+}
+bool isASCIILetter(char c) {
+  return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
+}
+bool isASCII(char c) {
+  return static_cast<unsigned char>(c) < 0x80;
+}
+char lowercasedASCII(char c) {
+  return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+}
+
+/// 0 to 15, or -1 for anything but a hexadecimal digit.
+int hexValue(char c) {
+  if (isDigit(c)) return c - '0';
+  const char lower = lowercasedASCII(c);
+  return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
+}
+
+bool isPercentTriplet(std::string_view text, std::size_t at) {
+  return at + 2 < text.size() && text[at] == '%' && hexValue(text[at + 1]) >= 0 &&
+         hexValue(text[at + 2]) >= 0;
+}
+
+void appendPercentEncoded(std::string& output, char c) {
+  const auto byte = static_cast<unsigned char>(c);
+  output += '%';
+  output += kHexDigits[byte >> 4U];
+  output += kHexDigits[byte & 0xFU];
+}
+
+/// Well-formed UTF-8 without the control characters of Unicode's second block.
+bool isAcceptableUTF8(std::string_view text) {
+  if (text.size() > INT32_MAX) return false;
+  const auto* bytes = reinterpret_cast<const std::uint8_t*>(text.data());
+  const auto length = static_cast<std::int32_t>(text.size());
+  for (std::int32_t i = 0; i < length;) {
+    UChar32 character = 0;
+    U8_NEXT(bytes, i, length, character);
+    if (character < 0 || (character >= 0x80 && character < 0xA0)) return false;
+  }
+  return true;
+}
+
+/// Only characters that RFC 3986 knows (or non-ASCII ones), and a "%" only where it encodes.
+bool hasAcceptableCharacters(std::string_view text) {
+  constexpr std::string_view kRefused = "<>\"{}|\\^`";
+  for (std::size_t i = 0; i < text.size(); ++i) {
+    const char c = text[i];
+    if ((isASCII(c) && c <= ' ') || c == '\x7F' || kRefused.find(c) != std::string_view::npos) {
+      return false;
+    }
+    if (c == '%' && !isPercentTriplet(text, i)) return false;
+  }
+  return isAcceptableUTF8(text);
+}
+
+/// The components of a URL by RFC 3986, appendix B. The views point into the text.
+struct Components {
+  std::string_view scheme;
+  std::optional<std::string_view> authority;
+  std::string_view path;
+  std::string_view queryAndFragment;  // with the "?" or "#" that begins it
+};
+
+std::optional<Components> componentsOf(std::string_view text) {
+  const std::size_t colon = text.find(':');
+  if (colon == std::string_view::npos || colon == 0) return std::nullopt;
+  Components components;
+  components.scheme = text.substr(0, colon);
+  std::string_view rest = text.substr(colon + 1);
+  if (rest.substr(0, 2) == "//") {
+    rest.remove_prefix(2);
+    components.authority = rest.substr(0, rest.find_first_of("/?#"));
+    rest.remove_prefix(components.authority->size());
+  }
+  components.path = rest.substr(0, rest.find_first_of("?#"));
+  components.queryAndFragment = rest.substr(components.path.size());
+  return components;
+}
+
+bool isScheme(std::string_view text) {
+  return isASCIILetter(text.front()) && std::all_of(text.begin(), text.end(), [](char c) {
+           return isASCIILetter(c) || isDigit(c) || c == '+' || c == '-' || c == '.';
+         });
+}
+
+struct Authority {
+  std::string_view userInfo;  // with the "@" that ends it
+  std::string_view host;      // an IP literal with its brackets
+  std::string_view port;      // with the ":" that begins it
+};
+
+std::optional<Authority> authorityOf(std::string_view text) {
+  Authority authority;
+  if (const std::size_t at = text.find('@'); at != std::string_view::npos) {
+    authority.userInfo = text.substr(0, at + 1);
+    text.remove_prefix(at + 1);
+  }
+  std::size_t hostLength = text.find(':');
+  if (text.substr(0, 1) == "[") {
+    hostLength = text.find(']');
+    if (hostLength == std::string_view::npos) return std::nullopt;
+    ++hostLength;
+  }
+  authority.host = text.substr(0, hostLength);
+  authority.port = text.substr(authority.host.size());
+  return authority;
+}
+
+/// Decimal digits of a number up to 65535 behind a colon; none at all is the scheme's own port.
+bool isPort(std::string_view text) {
+  if (text.empty()) return true;
+  if (text.front() != ':') return false;
+  unsigned number = 0;
+  for (const char c : text.substr(1)) {
+    if (!isDigit(c)) return false;
+    number = number * 10 + static_cast<unsigned>(c - '0');
+    if (number > 65535) return false;
+  }
+  return true;
+}
+
+bool isWellFormed(const Authority& authority) {
+  const auto hasBrackets = [](std::string_view text) {
+    return text.find_first_of("[]") != std::string_view::npos;
+  };
+  std::string_view host = authority.host;
+  if (host.size() > 2 && host.front() == '[') host = host.substr(1, host.size() - 2);
+  return !hasBrackets(authority.userInfo) && !hasBrackets(host) &&
+         host.find('@') == std::string_view::npos && isPort(authority.port);
+}
+
+bool equalIgnoringCase(std::string_view left, std::string_view right) {
+  return std::equal(left.begin(), left.end(), right.begin(), right.end(),
+                    [](char a, char b) { return lowercasedASCII(a) == lowercasedASCII(b); });
+}
+
+/// The host in the ASCII form that the domain name system knows ("bücher.example" gives
+/// "xn--bcher-kva.example"). The transfer library would take the host's encoding from the locale,
+/// ICU takes it as the UTF-8 that it is.
+std::optional<std::string> hostInASCII(std::string_view host) {
+  if (std::all_of(host.begin(), host.end(), isASCII)) return std::string(host);
+  prepareICUMemory();
+  UErrorCode status = U_ZERO_ERROR;
+  const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
+      uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
+                      &status),
+      &uidna_close);
+  requireICUMemory();
+  if (U_FAILURE(status) != 0) return std::nullopt;
+  std::array<char, 256> ascii{};  // a longer name is an error anyway
+  UIDNAInfo info = UIDNA_INFO_INITIALIZER;
+  const std::int32_t length =
+      uidna_nameToASCII_UTF8(converter.get(), host.data(), static_cast<std::int32_t>(host.size()),
+                             ascii.data(), static_cast<std::int32_t>(ascii.size()), &info, &status);
+  requireICUMemory();
+  if (U_FAILURE(status) != 0 || info.errors != 0) return std::nullopt;
+  // Some characters become ASCII ones: a full-width "/" would end the host where the text goes on.
+  const std::string_view name(ascii.data(), static_cast<std::size_t>(length));
+  const bool isWholeHost =
+      hasAcceptableCharacters(name) && name.find_first_of(":/?#[]@") == std::string_view::npos &&
+      std::count(name.begin(), name.end(), '%') == std::count(host.begin(), host.end(), '%');
+  if (!isWholeHost) return std::nullopt;
+  return std::string(name);
+}
+
+std::string nonASCIIEncoded(std::string_view text) {
+  std::string encoded;
+  encoded.reserve(text.size());
+  for (const char c : text) {
+    if (isASCII(c)) {
+      encoded += c;
+    } else {
+      appendPercentEncoded(encoded, c);
+    }
+  }
+  return encoded;
+}
+
+bool isAcceptedByTransferLibrary(const std::string& encodedText) {
+  const TransferLibrary* const library = TransferLibrary::functions();
+  if (library == nullptr) return true;  // the transfer will tell what is wrong
+  const std::unique_ptr<CURLU, decltype(library->urlCleanup)> handle(library->url(),
+                                                                     library->urlCleanup);
+  if (handle == nullptr) throw std::bad_alloc();
+  const CURLUcode result = library->urlSet(handle.get(), CURLUPART_URL, encodedText.c_str(), 0);
+  if (result == CURLUE_OUT_OF_MEMORY) throw std::bad_alloc();
+  return result == CURLUE_OK;
+}
+
+}  // namespace
+
+std::optional<URL> URL::parse(std::string_view text) {
+  if (!hasAcceptableCharacters(text)) return std::nullopt;
+  const std::optional<Components> components = componentsOf(text);
+  if (!components || !isScheme(components->scheme)) return std::nullopt;
+  // A query and a fragment hold no brackets, and a fragment no second "#".
+  const std::string_view tail = components->queryAndFragment;
+  if (components->path.find_first_of("[]") != std::string_view::npos ||
+      tail.find_first_of("[]") != std::string_view::npos ||
+      std::count(tail.begin(), tail.end(), '#') > 1) {
+    return std::nullopt;
+  }
+
+  URL url;
+  url.text_ = text;
+  url.scheme_ = components->scheme;
+  std::transform(url.scheme_.begin(), url.scheme_.end(), url.scheme_.begin(), lowercasedASCII);
+  url.encodedPath_ = nonASCIIEncoded(components->path);
+  url.encodedText_ = std::string(components->scheme) + ":";
+
+  const std::optional<Authority> authority = authorityOf(components->authority.value_or(""));
+  if (!authority || !isWellFormed(*authority)) return std::nullopt;
+  if (components->authority) {
+    const std::optional<std::string> host = hostInASCII(authority->host);
+    if (!host) return std::nullopt;
+    url.encodedText_ += "//" + nonASCIIEncoded(authority->userInfo) + *host;
+    url.encodedText_ += authority->port;
+  }
+  url.encodedText_ += url.encodedPath_ + nonASCIIEncoded(tail);
+
+  if (url.scheme_ == "file") {
+    const std::string_view host = components->authority.value_or("");
+    if (!host.empty() && !equalIgnoringCase(host, "localhost")) return std::nullopt;
+    if (url.encodedPath_.empty() || url.encodedPath_.front() != '/') return std::nullopt;
+  } else if (url.scheme_ == "http" || url.scheme_ == "https") {
+    if (authority->host.empty() || !isAcceptedByTransferLibrary(url.encodedText_)) {
+      return std::nullopt;
+    }
+  }
+  return url;
+}
+
+std::string URL::path() const {
+  return percentDecoded(encodedPath_);
+}
+
+std::string percentDecoded(std::string_view text) {
+  std::string decoded;
+  decoded.reserve(text.size());
+  for (std::size_t i = 0; i < text.size(); ++i) {
+    if (isPercentTriplet(text, i)) {
+      decoded += static_cast<char>(hexValue(text[i + 1]) * 16 + hexValue(text[i + 2]));
+      i += 2;
+    } else {
+      decoded += text[i];
+    }
+  }
+  return decoded;
+}
+
+std::string fileURLText(std::string_view absolutePath) {
+  constexpr std::string_view kAllowedMarks = "-._~!$&'()*+,;=:@/";
+  std::string text = "file://";
+  text.reserve(text.size() + absolutePath.size());
+  for (const char c : absolutePath) {
+    if (isASCIILetter(c) || isDigit(c) || kAllowedMarks.find(c) != std::string_view::npos) {
+      text += c;
+    } else {
+      appendPercentEncoded(text, c);
+    }
+  }
+  return text;
+}
+
+}  // namespace platform

@@ -1,0 +1,84 @@
+#include "platform/text/FormattedText.h"
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+
+namespace platform {
+namespace {
+
+// The digits of the largest double before its point, and room for the sign, the point and one more.
+constexpr std::size_t kLongestNumber = 320;
+
+// std::to_chars writes what printf writes in the C locale, whatever the locale of the process.
+template <typename... Number>
+void appendNumber(std::string& result, Number... numberAndFormat) {
+  std::array<char, kLongestNumber> characters;
+  const char* end =
+      std::to_chars(characters.data(), characters.data() + characters.size(), numberAndFormat...)
+          .ptr;
+  result.append(static_cast<const char*>(characters.data()), end);
+}
+
+void append(std::string& result, const FormatArgument::Value& value) {
+  if (const auto* text = std::get_if<std::optional<std::string_view>>(&value)) {
+    result.append(text->value_or("(null)"));
+  } else if (const auto* number = std::get_if<std::int64_t>(&value)) {
+    appendNumber(result, *number);
+  } else if (const auto* size = std::get_if<std::uint64_t>(&value)) {
+    appendNumber(result, *size);
+  } else {
+    appendNumber(result, std::get<double>(value), std::chars_format::fixed, 1);
+  }
+}
+
+/// The argument as a Number where it is an integer, as the placeholders for numbers reinterpret it.
+template <typename Number>
+FormatArgument::Value integerAs(const FormatArgument::Value& value) {
+  if (const auto* number = std::get_if<std::int64_t>(&value)) return static_cast<Number>(*number);
+  if (const auto* size = std::get_if<std::uint64_t>(&value)) return static_cast<Number>(*size);
+  return value;
+}
+
+using Conversion = FormatArgument::Value (*)(const FormatArgument::Value&);
+struct Placeholder {
+  std::string_view text;
+  Conversion converted;
+};
+FormatArgument::Value asItIs(const FormatArgument::Value& value) {
+  return value;
+}
+constexpr std::array<Placeholder, 5> kPlaceholders = {{
+    {"%@", asItIs},
+    {"%s", asItIs},
+    {"%ld", integerAs<std::int64_t>},
+    {"%lu", integerAs<std::uint64_t>},
+    {"%0.1f", integerAs<double>},
+}};
+
+}  // namespace
+
+std::string formattedText(std::string_view format,
+                          std::initializer_list<FormatArgument> arguments) {
+  std::string result;
+  const FormatArgument* argument = arguments.begin();
+  for (std::size_t percent = format.find('%'); percent != std::string_view::npos;
+       percent = format.find('%')) {
+    result.append(format.substr(0, percent));
+    format.remove_prefix(percent);
+    const auto* placeholder =
+        std::find_if(kPlaceholders.begin(), kPlaceholders.end(),
+                     [&](const Placeholder& known) { return format.starts_with(known.text); });
+    if (placeholder != kPlaceholders.end()) {
+      append(result, argument == arguments.end() ? FormatArgument::Value()
+                                                 : placeholder->converted((argument++)->value()));
+      format.remove_prefix(placeholder->text.size());
+    } else {
+      result.push_back('%');  // of "%%", or of something that is no placeholder and stays
+      format.remove_prefix(format.starts_with("%%") ? 2 : 1);
+    }
+  }
+  return result.append(format);
+}
+
+}  // namespace platform

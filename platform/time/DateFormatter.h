@@ -1,0 +1,30 @@
+#pragma once
+
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "platform/time/PointInTime.h"
+
+namespace platform {
+
+/// Writes points in time by a pattern of Unicode's date-field symbols (UTS #35), in the locale and
+/// the time zone of the process: LC_ALL, LC_TIME or LANG, and TZ, as they are when it is made. The
+/// first of the three that is not empty names the locale; without one, and for a locale that nobody
+/// knows, dates are written as in the C locale. Zones have no names here: their symbols give the
+/// offset that the zone has at the date.
+class DateFormatter {
+ public:
+  explicit DateFormatter(std::string_view pattern);
+  ~DateFormatter();
+  DateFormatter(const DateFormatter&) = delete;
+  DateFormatter& operator=(const DateFormatter&) = delete;
+
+  std::string format(PointInTime date) const;
+
+ private:
+  class Implementation;
+  std::unique_ptr<Implementation> implementation_;
+};
+
+}  // namespace platform

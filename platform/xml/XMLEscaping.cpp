@@ -1,0 +1,118 @@
+#include "platform/xml/XMLEscaping.h"
+
+#include <array>
+#include <cstddef>
+
+namespace platform {
+
+namespace {
+
+// What becomes of each byte: itself, a reference, nothing, or what the character shows that it
+// begins.
+class ByteRules {
+ public:
+  explicit constexpr ByteRules(bool isAttribute) {
+    for (std::size_t byte = 0; byte < 0x20; ++byte) isSpecial_[byte] = true;
+    for (std::size_t byte = 0x80; byte < 0x100; ++byte) isSpecial_[byte] = true;
+    for (const char character : {'&', '<', '>'}) isSpecial_[index(character)] = true;
+    for (const char character : {'\t', '\n'}) isSpecial_[index(character)] = isAttribute;
+    isSpecial_[index('"')] = isAttribute;
+  }
+  constexpr bool isSpecial(char byte) const { return isSpecial_[index(byte)]; }
+
+ private:
+  static constexpr std::size_t index(char byte) { return static_cast<unsigned char>(byte); }
+  std::array<bool, 256> isSpecial_{};
+};
+
+constexpr ByteRules kTextRules(false);
+constexpr ByteRules kAttributeRules(true);
+
+// Empty for what is left out.
+constexpr std::string_view reference(char character) {
+  switch (character) {
+    case '&':
+      return "&amp;";
+    case '<':
+      return "&lt;";
+    case '>':
+      return "&gt;";
+    case '"':
+      return "&quot;";
+    case '\t':
+      return "&#9;";
+    case '\n':
+      return "&#10;";
+    case '\r':
+      return "&#13;";
+    default:
+      return {};
+  }
+}
+
+// The length of the character that the text begins with, which is not ASCII; 0 when it is
+// malformed, or none that XML can hold.
+std::size_t lengthOfAllowedCharacter(std::string_view text) {
+  const auto byteAt = [text](std::size_t index) {
+    return static_cast<char32_t>(static_cast<unsigned char>(text[index]));
+  };
+  const char32_t lead = byteAt(0);
+  if (lead < 0xC2 || lead > 0xF4) return 0;
+  const std::size_t length = lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
+  if (text.size() < length) return 0;
+
+  char32_t character = lead & (0x7FU >> length);
+  for (std::size_t index = 1; index < length; ++index) {
+    if ((byteAt(index) & 0xC0U) != 0x80) return 0;
+    character = character << 6U | (byteAt(index) & 0x3FU);
+  }
+  const bool isOverlong =
+      (length == 3 && character < 0x800) || (length == 4 && character < 0x10000);
+  const bool isSurrogate = character >= 0xD800 && character <= 0xDFFF;
+  const bool isExcluded = character == 0xFFFE || character == 0xFFFF || character > 0x10FFFF;
+  return isOverlong || isSurrogate || isExcluded ? 0 : length;
+}
+
+void appendEscaped(std::string& output, std::string_view text, const ByteRules& rules) {
+  std::size_t runStart = 0;
+  std::size_t next = 0;
+  while (next < text.size()) {
+    if (!rules.isSpecial(text[next])) {
+      ++next;
+      continue;
+    }
+    const std::size_t length = lengthOfAllowedCharacter(text.substr(next));
+    if (length > 0) {
+      next += length;
+      continue;
+    }
+    output.append(text.substr(runStart, next - runStart));
+    output.append(reference(text[next]));
+    runStart = ++next;
+  }
+  output.append(text.substr(runStart));
+}
+
+}  // namespace
+
+bool isXMLText(std::string_view text) {
+  std::size_t next = 0;
+  while (next < text.size()) {
+    const auto byte = static_cast<unsigned char>(text[next]);
+    if (byte < 0x20 && reference(text[next]).empty()) return false;
+    const std::size_t length = byte < 0x80 ? 1 : lengthOfAllowedCharacter(text.substr(next));
+    if (length == 0) return false;
+    next += length;
+  }
+  return true;
+}
+
+void appendEscapedText(std::string& output, std::string_view text) {
+  appendEscaped(output, text, kTextRules);
+}
+
+void appendEscapedAttribute(std::string& output, std::string_view value) {
+  appendEscaped(output, value, kAttributeRules);
+}
+
+}  // namespace platform

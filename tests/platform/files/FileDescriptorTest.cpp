@@ -1,0 +1,180 @@
+#include "platform/files/FileDescriptor.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <sys/time.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <limits>
+#include <string>
+#include <utility>
+
+#include "tests/support/ChildProcess.h"
+#include "tests/support/RefusedSystemCall.h"
+#include "tests/support/TemporaryDirectory.h"
+
+namespace platform {
+namespace {
+
+struct Pipe {
+  Pipe() {
+    std::array<int, 2> ends{-1, -1};
+    EXPECT_EQ(::pipe(ends.data()), 0);
+    readEnd = FileDescriptor(ends[0]);
+    writeEnd = FileDescriptor(ends[1]);
+  }
+  FileDescriptor readEnd;
+  FileDescriptor writeEnd;
+};
+
+/// Has a signal interrupt what this process waits for a moment later; its handler, which may call
+/// only what a signal handler may, makes the end of the wait possible.
+class Interruption {
+ public:
+  explicit Interruption(void (*handler)(int)) {
+    struct sigaction action {};
+    action.sa_handler = handler;  // and no SA_RESTART
+    ::sigaction(SIGALRM, &action, &previous_);
+    const itimerval soon{.it_interval = {}, .it_value = {.tv_sec = 0, .tv_usec = 50000}};
+    ::setitimer(ITIMER_REAL, &soon, nullptr);
+  }
+  ~Interruption() { ::sigaction(SIGALRM, &previous_, nullptr); }
+  Interruption(const Interruption&) = delete;
+  Interruption& operator=(const Interruption&) = delete;
+
+ private:
+  struct sigaction previous_ {};
+};
+
+// For the handlers.
+int handlersDescriptor = -1;
+const char* handlersPath = nullptr;
+
+TEST(FileDescriptorTest, MovesCloseWhatWasOpen) {
+  Pipe pipe;
+  const int kept = pipe.readEnd.get();
+  const int closed = pipe.writeEnd.get();
+  pipe.writeEnd = std::move(pipe.readEnd);
+  EXPECT_FALSE(pipe.readEnd.isOpen());
+  EXPECT_EQ(pipe.writeEnd.get(), kept);
+  EXPECT_EQ(::fcntl(closed, F_GETFD), -1);
+  EXPECT_NE(::fcntl(kept, F_GETFD), -1);
+}
+
+TEST(FileDescriptorTest, MoveToItselfKeepsItOpen) {
+  Pipe pipe;
+  FileDescriptor& same = pipe.readEnd;
+  const int number = same.get();
+  pipe.readEnd = std::move(same);
+  EXPECT_EQ(pipe.readEnd.get(), number);
+  EXPECT_NE(::fcntl(number, F_GETFD), -1);
+}
+
+TEST(FileDescriptorTest, ClosingTellsAFailedClose) {
+  FileDescriptor none;
+  EXPECT_TRUE(none.close());
+  EXPECT_EQ(exitStatusOfChild([] {
+              Pipe pipe;
+              if (!refuseSystemCall(SYS_close, EIO)) return 1;
+              if (pipe.writeEnd.close() || errno != EIO) return 2;
+              return pipe.writeEnd.isOpen() ? 3 : 0;
+            }),
+            0);
+}
+
+TEST(FileDescriptorTest, OpeningGoesOnAfterASignal) {
+  const TemporaryDirectory directory;
+  const std::string fifo = directory / "fifo";
+  ASSERT_EQ(::mkfifo(fifo.c_str(), 0600), 0);
+  handlersPath = fifo.c_str();
+  // Until the handler opens the other end, there is no reader.
+  const Interruption interruption(
+      [](int) { handlersDescriptor = ::open(handlersPath, O_RDONLY | O_NONBLOCK); });
+  const FileDescriptor writer = FileDescriptor::open(fifo, O_WRONLY);
+  const FileDescriptor reader(handlersDescriptor);
+  EXPECT_TRUE(writer.isOpen());
+  EXPECT_TRUE(reader.isOpen());
+}
+
+TEST(FileDescriptorTest, ReadingGoesOnAfterASignal) {
+  const Pipe pipe;
+  handlersDescriptor = pipe.writeEnd.get();
+  const Interruption interruption([](int) {
+    if (::write(handlersDescriptor, "ab", 2) != 2) ::_exit(1);
+  });
+  std::array<char, 8> buffer{};
+  ASSERT_EQ(readSome(pipe.readEnd.get(), buffer.data(), buffer.size()), 2);
+  EXPECT_EQ(std::string(buffer.data(), 2), "ab");
+}
+
+/// Fills the pipe, whose writing end is then blocking or not.
+void fill(const Pipe& pipe, bool isBlocking) {
+  const int flags = ::fcntl(pipe.writeEnd.get(), F_GETFL);
+  ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, flags | O_NONBLOCK), 0);
+  const std::array<char, 4096> page{};
+  while (::write(pipe.writeEnd.get(), page.data(), page.size()) > 0) {
+  }
+  if (isBlocking) {
+    ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, flags), 0);
+  }
+}
+
+TEST(FileDescriptorTest, WritingGoesOnAfterASignal) {
+  const Pipe pipe;
+  fill(pipe, true);
+  handlersDescriptor = pipe.readEnd.get();
+  const Interruption interruption([](int) {
+    std::array<char, 8192> drained;
+    if (::read(handlersDescriptor, drained.data(), drained.size()) <= 0) ::_exit(1);
+  });
+  EXPECT_TRUE(writeAll(pipe.writeEnd.get(), std::string(4096, 'x')));
+}
+
+TEST(FileDescriptorTest, WaitingToWriteGoesOnAfterASignal) {
+  const Pipe pipe;
+  fill(pipe, false);
+  handlersDescriptor = pipe.readEnd.get();
+  const Interruption interruption([](int) {
+    std::array<char, 8192> drained;
+    if (::read(handlersDescriptor, drained.data(), drained.size()) <= 0) ::_exit(1);
+  });
+  EXPECT_TRUE(writeAll(pipe.writeEnd.get(), std::string(4096, 'x')));
+}
+
+TEST(FileDescriptorTest, WritingFailsWhereTheWaitFails) {
+  EXPECT_EQ(exitStatusOfChild([] {
+              const Pipe pipe;
+              ::fcntl(pipe.writeEnd.get(), F_SETFL, O_NONBLOCK);
+              if (!refuseSystemCall(SYS_poll, ENOMEM)) return 1;
+              if (writeAll(pipe.writeEnd.get(), std::string(std::size_t{1} << 20U, 'x'))) return 2;
+              return errno == ENOMEM ? 0 : 3;
+            }),
+            0);
+}
+
+TEST(FileDescriptorTest, WriteThatTakesNothingFails) {
+  EXPECT_EQ(exitStatusOfChild([] {
+              const Pipe pipe;
+              if (!refuseSystemCall(SYS_write, 0)) return 1;
+              if (writeAll(pipe.writeEnd.get(), "x")) return 2;
+              return errno == EIO ? 0 : 3;
+            }),
+            0);
+}
+
+TEST(FileDescriptorTest, ReadingMoreThanMemoryHoldsFails) {
+  const Pipe pipe;
+  ASSERT_TRUE(writeAll(pipe.writeEnd.get(), "more"));
+  constexpr std::uint64_t kHuge = std::numeric_limits<std::int64_t>::max();
+  std::string bytes = "kept";
+  EXPECT_EQ(readToEnd(pipe.readEnd.get(), kHuge - 1, kHuge, bytes), ENOMEM);
+  EXPECT_EQ(bytes, "kept");
+}
+
+}  // namespace
+}  // namespace platform

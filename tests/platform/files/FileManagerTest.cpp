@@ -1,0 +1,333 @@
+#include "platform/files/FileManager.h"
+
+#include <fcntl.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <filesystem>
+#include <functional>
+#include <utility>
+#include <vector>
+
+#include "platform/files/FileDescriptor.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/InterposedCalls.h"
+#include "tests/support/RefusedSystemCall.h"
+#include "tests/support/TemporaryDirectory.h"
+
+namespace platform {
+namespace {
+
+using testing::ElementsAre;
+
+/// Every byte value, in an order that a misplaced piece would break.
+std::string largeContent(std::size_t size) {
+  std::string content(size, '\0');
+  for (std::size_t index = 0; index < size; ++index) {
+    content[index] = static_cast<char>((index * 31 + index / 251) & 0xFFU);
+  }
+  return content;
+}
+
+class FileManagerTest : public testing::Test {
+ protected:
+  /// The paths of a FIFO, a socket and a device: all that is neither file nor directory.
+  std::vector<std::string> specialFiles() {
+    const std::string fifo = directory_ / "fifo";
+    EXPECT_EQ(::mkfifo(fifo.c_str(), 0600), 0);
+    const std::string path = directory_ / "socket";
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    EXPECT_LT(path.size(), sizeof address.sun_path);
+    path.copy(address.sun_path, path.size());
+    const FileDescriptor socket(::socket(AF_UNIX, SOCK_STREAM, 0));
+    EXPECT_EQ(::bind(socket.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+    return {fifo, path, "/dev/null", "/dev/zero"};
+  }
+
+  TemporaryDirectory directory_;
+  ErrorSlot error_;
+};
+
+TEST_F(FileManagerTest, IsSymbolicLinkLooksAtThePathItself) {
+  directory_.addFile("file", "");
+  std::filesystem::create_symlink("file", directory_ / "link");
+  std::filesystem::create_symlink("missing", directory_ / "dangling");
+  EXPECT_TRUE(mayBeSymbolicLink(directory_ / "link"));
+  EXPECT_TRUE(mayBeSymbolicLink(directory_ / "dangling"));
+  EXPECT_FALSE(mayBeSymbolicLink(directory_ / "file"));
+  EXPECT_FALSE(mayBeSymbolicLink(directory_.path()));
+  EXPECT_FALSE(mayBeSymbolicLink(directory_ / "missing"));
+}
+
+TEST_F(FileManagerTest, FileExistsFollowsLinks) {
+  directory_.addFile("file", "");
+  std::filesystem::create_symlink("file", directory_ / "link");
+  std::filesystem::create_symlink("nowhere", directory_ / "dangling");
+  EXPECT_TRUE(fileExists(directory_ / "file"));
+  EXPECT_TRUE(fileExists(directory_.path()));
+  EXPECT_TRUE(fileExists(directory_.path() + "/"));
+  EXPECT_TRUE(fileExists(directory_ / "link"));
+  EXPECT_FALSE(fileExists(directory_ / "dangling"));
+  EXPECT_FALSE(fileExists(directory_ / "missing"));
+  EXPECT_FALSE(fileExists(directory_ / "file/"));
+  EXPECT_FALSE(fileExists(""));
+  EXPECT_FALSE(fileExists(directory_ / std::string("file\0x", 6)));
+}
+
+TEST_F(FileManagerTest, ReadsFilesOfAnySizeWhole) {
+  for (const std::size_t size : {0U, 1U, 65535U, 65536U, 65537U, 3000000U}) {
+    SCOPED_TRACE(size);
+    const std::string content = largeContent(size);
+    EXPECT_EQ(readWholeFile(directory_.addFile("file", content), error_), content);
+    EXPECT_EQ(error_, std::nullopt);
+  }
+}
+
+TEST_F(FileManagerTest, ReadsFilesThatClaimToBeEmpty) {
+  const std::optional<std::string> content = readWholeFile("/proc/self/status", error_);
+  ASSERT_TRUE(content);
+  EXPECT_EQ(content->substr(0, 5), "Name:");
+  EXPECT_EQ(content->back(), '\n');
+}
+
+TEST_F(FileManagerTest, FailedReadsTellTheCause) {
+  const std::string file = directory_.addFile("file", "x");
+  std::vector<std::pair<std::string, ErrorRecord>> rows = {
+      {"", {"POSIX", ENOENT, "No such file or directory"}},
+      {directory_ / "missing", {"POSIX", ENOENT, "No such file or directory"}},
+      {file + "/x", {"POSIX", ENOTDIR, "Not a directory"}},
+      {directory_.path(), {"POSIX", EISDIR, "Is a directory"}},
+      {directory_ / std::string(256, 'n'), {"POSIX", ENAMETOOLONG, "File name too long"}},
+      {directory_ / std::string("file\0x", 6), {"POSIX", EINVAL, "Invalid argument"}},
+  };
+  for (const std::string& path : specialFiles()) {
+    rows.push_back({path, {"POSIX", EINVAL, "Not a regular file"}});
+  }
+  for (const auto& [path, expected] : rows) {
+    SCOPED_TRACE(path);
+    ErrorSlot error;
+    EXPECT_EQ(readWholeFile(path, error), std::nullopt);
+    EXPECT_EQ(error, expected);
+  }
+}
+
+TEST_F(FileManagerTest, FilesOverTheLimitAreNotRead) {
+  const std::string path = directory_.addFile("file", "");
+  std::filesystem::resize_file(path, kWholeReadLimit + 1);
+  EXPECT_EQ(readWholeFile(path, error_), std::nullopt);
+  EXPECT_EQ(error_, (ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"}));
+}
+
+TEST_F(FileManagerTest, ReadingStopsAtTheLimitWhateverTheSizeSaid) {
+  const std::string content = largeContent(200000);
+  const std::string path = directory_.addFile("file", content);
+  struct Row {
+    std::uint64_t expectedSize;
+    std::uint64_t limit;
+    int result;
+  };
+  for (const auto& [expectedSize, limit, result] : std::array<Row, 8>{{
+           {200000, 200000, 0},
+           {200000, 199999, EFBIG},
+           {0, 200000, 0},
+           {0, 199999, EFBIG},
+           {5, 200001, 0},
+           {5, 100, EFBIG},
+           {5, 0, EFBIG},
+           {1000000, 500000, 0},
+       }}) {
+    SCOPED_TRACE(testing::Message() << "expected " << expectedSize << ", limit " << limit);
+    const FileDescriptor file = FileDescriptor::open(path, O_RDONLY);
+    std::string bytes;
+    EXPECT_EQ(readToEnd(file.get(), expectedSize, limit, bytes), result);
+    EXPECT_EQ(bytes, content.substr(0, limit));
+  }
+}
+
+TEST_F(FileManagerTest, CreatesAllMissingDirectories) {
+  for (const char* path : {"a", "b/c/d", "e/", "f//g///", "./h", "i/../j", "k/."}) {
+    SCOPED_TRACE(path);
+    EXPECT_TRUE(createDirectories(directory_ / path, error_));
+    EXPECT_TRUE(std::filesystem::is_directory(directory_ / path));
+    EXPECT_TRUE(createDirectories(directory_ / path, error_)) << "a second time";
+  }
+  EXPECT_EQ(error_, std::nullopt);
+  EXPECT_TRUE(createDirectories("/", error_));
+  EXPECT_TRUE(createDirectories(".", error_));
+}
+
+TEST_F(FileManagerTest, CreatesDirectoriesBehindLinksAndRelativePaths) {
+  std::filesystem::create_directory(directory_ / "real");
+  std::filesystem::create_symlink("real", directory_ / "link");
+  EXPECT_TRUE(createDirectories(directory_ / "link", error_));
+  EXPECT_TRUE(createDirectories(directory_ / "link/sub", error_));
+  EXPECT_TRUE(std::filesystem::is_directory(directory_ / "real/sub"));
+
+  const std::filesystem::path previous = std::filesystem::current_path();
+  std::filesystem::current_path(directory_.path());
+  EXPECT_TRUE(createDirectories("relative/sub", error_));
+  std::filesystem::current_path(previous);
+  EXPECT_TRUE(std::filesystem::is_directory(directory_ / "relative/sub"));
+}
+
+TEST_F(FileManagerTest, DirectoriesThatCannotBeMadeTellTheCause) {
+  directory_.addFile("file", "kept");
+  std::filesystem::create_symlink("nowhere", directory_ / "dangling");
+  const std::array<std::pair<std::string, ErrorRecord>, 7> rows = {{
+      {"", {"POSIX", ENOENT, "No such file or directory"}},
+      {directory_ / "file", {"POSIX", EEXIST, "File exists"}},
+      {directory_ / "file/", {"POSIX", EEXIST, "File exists"}},
+      {directory_ / "file/sub", {"POSIX", ENOTDIR, "Not a directory"}},
+      {directory_ / "dangling", {"POSIX", EEXIST, "File exists"}},
+      {directory_ / std::string(256, 'n'), {"POSIX", ENAMETOOLONG, "File name too long"}},
+      {directory_ / std::string("a\0b", 3), {"POSIX", EINVAL, "Invalid argument"}},
+  }};
+  for (const auto& [path, expected] : rows) {
+    SCOPED_TRACE(path);
+    ErrorSlot error;
+    EXPECT_FALSE(createDirectories(path, error));
+    EXPECT_EQ(error, expected);
+  }
+  EXPECT_FALSE(createDirectories("/proc/qel-no-such-place/x", error_));
+  EXPECT_THAT(directory_.names(), ElementsAre("dangling", "file"));
+}
+
+TEST_F(FileManagerTest, CopiesFilesOfAnySize) {
+  for (const std::size_t size : {0U, 1U, 131072U, 131073U, 3000000U}) {
+    SCOPED_TRACE(size);
+    const std::string content = largeContent(size);
+    const std::string source = directory_.addFile("source", content);
+    const std::string copy = directory_ / ("copy" + std::to_string(size));
+    EXPECT_TRUE(copyFile(source, copy));
+    EXPECT_EQ(contentOf(copy), content);
+    EXPECT_EQ(contentOf(source), content);
+  }
+}
+
+TEST_F(FileManagerTest, CopiesThroughLinksAndFilesThatClaimToBeEmpty) {
+  directory_.addFile("source", "content");
+  std::filesystem::create_symlink("source", directory_ / "link");
+  EXPECT_TRUE(copyFile(directory_ / "link", directory_ / "copy"));
+  EXPECT_FALSE(std::filesystem::is_symlink(directory_ / "copy"));
+  EXPECT_EQ(contentOf(directory_ / "copy"), "content");
+
+  EXPECT_TRUE(copyFile("/proc/version", directory_ / "version"));
+  EXPECT_EQ(contentOf(directory_ / "version"), contentOf("/proc/version"));
+  EXPECT_NE(contentOf(directory_ / "version"), "");
+}
+
+TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
+  const std::string content = largeContent(300000);
+  const std::string source = directory_.addFile("source", content);
+  for (const int refusal : {EXDEV, EINVAL, ENOSYS, EOPNOTSUPP, EPERM}) {
+    SCOPED_TRACE(refusal);
+    const std::string copy = directory_ / ("copy" + std::to_string(refusal));
+    EXPECT_EQ(exitStatusOfChild([&] {
+                if (!refuseSystemCall(SYS_copy_file_range, refusal)) {
+                  return 1;
+                }
+                return copyFile(source, copy) ? 0 : 2;
+              }),
+              0);
+    EXPECT_EQ(contentOf(copy), content);
+  }
+}
+
+TEST_F(FileManagerTest, CopyGoesOnAfterASignal) {
+  int calls = 0;
+  const Interposed signals(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    errno = ++calls == 1 ? EINTR : EXDEV;
+    return ssize_t{-1};
+  }));
+  EXPECT_TRUE(copyFile(directory_.addFile("source", "content"), directory_ / "copy"));
+  EXPECT_EQ(calls, 2);
+  EXPECT_EQ(contentOf(directory_ / "copy"), "content");
+}
+
+TEST_F(FileManagerTest, CopyLeavesAloneWhatAppearsMeanwhile) {
+  const Interposed others(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    directory_.addFile("copy", "of another process");
+    return ssize_t{0};
+  }));
+  EXPECT_FALSE(copyFile(directory_.addFile("source", "content"), directory_ / "copy"));
+  EXPECT_EQ(contentOf(directory_ / "copy"), "of another process");
+  EXPECT_THAT(directory_.names(), ElementsAre("copy", "source"));
+}
+
+TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
+  const std::string source = directory_.addFile("source", "content");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              if (!refuseSystemCall(SYS_read, EIO)) {
+                return 1;
+              }
+              return copyFile(source, directory_ / "copy") ? 2 : 0;
+            }),
+            0);
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
+}
+
+TEST_F(FileManagerTest, WholeReadTellsWhyItFailed) {
+  const std::string path = directory_.addFile("file", "content");
+  EXPECT_EQ(exitStatusOfChild([&] {
+              if (!refuseSystemCall(SYS_read, EIO)) {
+                return 1;
+              }
+              ErrorSlot error;
+              if (readWholeFile(path, error)) {
+                return 2;
+              }
+              return error == ErrorRecord{"POSIX", EIO, "Input/output error"} ? 0 : 3;
+            }),
+            0);
+}
+
+TEST_F(FileManagerTest, DirectoryThatAnotherProcessMakesFirstIsAccepted) {
+  const Interposed quicker(&InterposedCalls::mkdir,
+                           std::function([](const char* path, mode_t mode) {
+                             ::mkdirat(AT_FDCWD, path, mode);
+                             return ::mkdirat(AT_FDCWD, path, mode);
+                           }));
+  EXPECT_TRUE(createDirectories(directory_ / "a/b/c", error_));
+  EXPECT_EQ(error_, std::nullopt);
+  EXPECT_TRUE(std::filesystem::is_directory(directory_ / "a/b/c"));
+}
+
+TEST_F(FileManagerTest, CopyRefusesAnExistingDestination) {
+  const std::string source = directory_.addFile("source", "new");
+  directory_.addFile("file", "kept");
+  std::filesystem::create_directory(directory_ / "directory");
+  std::filesystem::create_symlink("nowhere", directory_ / "dangling");
+  for (const char* name : {"file", "directory", "dangling", "source"}) {
+    EXPECT_FALSE(copyFile(source, directory_ / name)) << name;
+  }
+  EXPECT_EQ(contentOf(directory_ / "file"), "kept");
+  EXPECT_EQ(contentOf(source), "new");
+  EXPECT_THAT(directory_.names(), ElementsAre("dangling", "directory", "file", "source"));
+}
+
+TEST_F(FileManagerTest, CopyRefusesWhatIsNoRegularFile) {
+  std::vector<std::string> sources = specialFiles();
+  sources.insert(sources.end(), {"", directory_ / "missing", directory_.path()});
+  for (const std::string& source : sources) {
+    EXPECT_FALSE(copyFile(source, directory_ / "copy")) << source;
+  }
+  EXPECT_THAT(directory_.names(), ElementsAre("fifo", "socket"));
+}
+
+TEST_F(FileManagerTest, CopyIntoAMissingDirectoryFails) {
+  const std::string source = directory_.addFile("source", "new");
+  EXPECT_FALSE(copyFile(source, directory_ / "missing/copy"));
+  EXPECT_FALSE(copyFile(source, ""));
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
+}
+
+}  // namespace
+}  // namespace platform

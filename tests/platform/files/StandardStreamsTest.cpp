@@ -1,0 +1,312 @@
+#include "platform/files/StandardStreams.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <cstdio>
+#include <functional>
+#include <thread>
+
+#include "platform/files/FileDescriptor.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/RefusedSystemCall.h"
+#include "tests/support/TemporaryDirectory.h"
+
+namespace platform {
+namespace {
+
+/// Two connected ends; what is written to the second comes out of the first.
+struct Connection {
+  FileDescriptor readEnd;
+  FileDescriptor writeEnd;
+};
+
+Connection connectionOf(const std::array<int, 2>& ends) {
+  return {FileDescriptor(ends[0]), FileDescriptor(ends[1])};
+}
+
+Connection makePipe() {
+  std::array<int, 2> ends{-1, -1};
+  EXPECT_EQ(::pipe(ends.data()), 0);
+  return connectionOf(ends);
+}
+
+Connection makeSocketPair() {
+  std::array<int, 2> ends{-1, -1};
+  EXPECT_EQ(::socketpair(AF_UNIX, SOCK_STREAM, 0, ends.data()), 0);
+  return connectionOf(ends);
+}
+
+void makeNonBlocking(const FileDescriptor& descriptor) {
+  ASSERT_EQ(::fcntl(descriptor.get(), F_SETFL, O_NONBLOCK), 0);
+}
+
+std::string allFrom(const FileDescriptor& descriptor) {
+  std::string bytes;
+  EXPECT_EQ(readToEnd(descriptor.get(), 0, 1U << 30U, bytes), 0);
+  return bytes;
+}
+
+/// More than a pipe holds.
+std::string longText() {
+  std::string text;
+  for (int line = 0; line < 60000; ++line) {
+    text += std::to_string(line) + "\n";
+  }
+  return text;
+}
+
+class StandardStreamsTest : public testing::Test {
+ protected:
+  /// What OutputFile and the buffered stream make of the descriptor as standard output, in a
+  /// process of its own: 0 when every write told success.
+  static int exitStatusWithOutput(const FileDescriptor& output,
+                                  const std::function<bool()>& write) {
+    return exitStatusOfChild([&] {
+      ::dup2(output.get(), STDOUT_FILENO);
+      return write() ? 0 : 1;
+    });
+  }
+
+  TemporaryDirectory directory_;
+};
+
+TEST_F(StandardStreamsTest, ReadsStandardInputInPiecesToItsEnd) {
+  const std::string text = longText();
+  for (const bool isNonBlocking : {false, true}) {
+    SCOPED_TRACE(isNonBlocking ? "non-blocking" : "blocking");
+    Connection pipe = makePipe();
+    if (isNonBlocking) {
+      makeNonBlocking(pipe.readEnd);
+    }
+    std::thread writer([&] {
+      writeAll(pipe.writeEnd.get(), text.substr(0, 10));
+      ::usleep(20000);
+      writeAll(pipe.writeEnd.get(), text.substr(10));
+      pipe.writeEnd.close();
+    });
+    const FileDescriptor saved(::dup(STDIN_FILENO));
+    ::dup2(pipe.readEnd.get(), STDIN_FILENO);
+    const std::string bytes = readStandardInput();
+    const std::string again = readStandardInput();
+    ::dup2(saved.get(), STDIN_FILENO);
+    writer.join();
+    EXPECT_TRUE(bytes == text) << bytes.size() << " bytes";
+    EXPECT_EQ(again, "");
+  }
+}
+
+TEST_F(StandardStreamsTest, UnreadableStandardInputIsEmpty) {
+  EXPECT_EQ(exitStatusOfChild([&] {
+              const FileDescriptor directory = FileDescriptor::open(directory_.path(), O_RDONLY);
+              ::dup2(directory.get(), STDIN_FILENO);
+              if (!readStandardInput().empty()) {
+                return 1;
+              }
+              ::close(STDIN_FILENO);
+              return readStandardInput().empty() ? 0 : 2;
+            }),
+            0);
+}
+
+TEST_F(StandardStreamsTest, StandardInputThatCannotBeWaitedForIsItsEnd) {
+  const Connection pipe = makePipe();
+  makeNonBlocking(pipe.readEnd);
+  ASSERT_TRUE(writeAll(pipe.writeEnd.get(), "first"));
+  EXPECT_EQ(exitStatusOfChild([&] {
+              ::dup2(pipe.readEnd.get(), STDIN_FILENO);
+              if (!refuseSystemCall(SYS_poll, ENOMEM)) {
+                return 1;
+              }
+              return readStandardInput() == "first" ? 0 : 2;
+            }),
+            0);
+}
+
+TEST_F(StandardStreamsTest, StandardErrorIsNotBuffered) {
+  const Connection pipe = makePipe();
+  EXPECT_EQ(exitStatusOfChild([&] {
+              ::dup2(pipe.writeEnd.get(), STDERR_FILENO);
+              writeToStandardError("first, ");
+              writeToStandardError(std::string("a\0b\n", 4));
+              return 0;
+            }),
+            0);
+  std::array<char, 64> buffer{};
+  const std::ptrdiff_t count = readSome(pipe.readEnd.get(), buffer.data(), buffer.size());
+  EXPECT_EQ(std::string(buffer.data(), static_cast<std::size_t>(count)),
+            std::string("first, a\0b\n", 11));
+}
+
+TEST_F(StandardStreamsTest, StandardOutputIsWrittenWhenFlushed) {
+  const std::string path = directory_.addFile("out", "");
+  EXPECT_EQ(exitStatusWithOutput(FileDescriptor::open(path, O_WRONLY),
+                                 [&] {
+                                   writeToStandardOutput("progress");
+                                   const bool isBuffered = contentOf(path).empty();
+                                   flushStandardOutput();
+                                   return isBuffered && contentOf(path) == "progress";
+                                 }),
+            0);
+}
+
+TEST_F(StandardStreamsTest, PrintedTextWaitsForANonBlockingOutput) {
+  const std::string text = longText();
+  Connection pipe = makePipe();
+  makeNonBlocking(pipe.writeEnd);
+  std::string bytes;
+  std::thread reader([&] {
+    ::usleep(20000);
+    bytes = allFrom(pipe.readEnd);
+  });
+  EXPECT_EQ(exitStatusWithOutput(pipe.writeEnd,
+                                 [&] {
+                                   writeToStandardOutput(text);
+                                   flushStandardOutput();
+                                   return true;
+                                 }),
+            0);
+  pipe.writeEnd.close();
+  reader.join();
+  EXPECT_TRUE(bytes == text) << bytes.size() << " bytes";
+}
+
+TEST_F(StandardStreamsTest, PrintedTextThatIsRefusedIsGone) {
+  const std::string path = directory_.addFile("out", "");
+  EXPECT_EQ(exitStatusWithOutput(FileDescriptor::open("/dev/full", O_WRONLY),
+                                 [&] {
+                                   writeToStandardOutput("refused");
+                                   flushStandardOutput();
+                                   ::dup2(FileDescriptor::open(path, O_WRONLY).get(),
+                                          STDOUT_FILENO);
+                                   writeToStandardOutput("taken");
+                                   flushStandardOutput();
+                                   return contentOf(path) == "taken";
+                                 }),
+            0);
+}
+
+TEST_F(StandardStreamsTest, OutputFileReplacesOrAppends) {
+  const std::string path = directory_.addFile("out", "a longer old content");
+  {
+    OutputFile file(path, OutputFile::Mode::kReplace);
+    EXPECT_TRUE(file.write("new"));
+    EXPECT_TRUE(file.write(""));
+    EXPECT_TRUE(file.write(" text"));
+  }
+  EXPECT_EQ(contentOf(path), "new text");
+  EXPECT_TRUE(OutputFile(path, OutputFile::Mode::kAppend).write("\n"));
+  EXPECT_EQ(contentOf(path), "new text\n");
+  EXPECT_TRUE(OutputFile(directory_ / "other", OutputFile::Mode::kAppend).write("\n"));
+  EXPECT_EQ(contentOf(directory_ / "other"), "\n");
+}
+
+TEST_F(StandardStreamsTest, OutputFileThatCannotBeOpenedTakesNothing) {
+  for (const std::string& path :
+       {std::string(), directory_.path(), directory_ / "missing/out",
+        directory_.addFile("file", "") + "/out", directory_ / std::string("a\0b", 3)}) {
+    OutputFile file(path, OutputFile::Mode::kReplace);
+    EXPECT_FALSE(file.write("x")) << path;
+  }
+}
+
+TEST_F(StandardStreamsTest, FullOutputFileTellsSo) {
+  OutputFile file("/dev/full", OutputFile::Mode::kReplace);
+  EXPECT_FALSE(file.write("x"));
+
+  EXPECT_EQ(exitStatusOfChild([&] {
+              ::signal(SIGXFSZ, SIG_IGN);
+              const rlimit limit{5, 5};
+              ::setrlimit(RLIMIT_FSIZE, &limit);
+              OutputFile limited(directory_ / "out", OutputFile::Mode::kReplace);
+              return limited.write("0123456789") || limited.write("") ? 1 : 0;
+            }),
+            0);
+  EXPECT_EQ(contentOf(directory_ / "out"), "01234");
+}
+
+TEST_F(StandardStreamsTest, OutputFileServesFIFOs) {
+  const std::string path = directory_ / "fifo";
+  ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+  const std::string text = longText();
+  bool written = false;
+  std::thread writer([&] { written = OutputFile(path, OutputFile::Mode::kReplace).write(text); });
+  const FileDescriptor reader = FileDescriptor::open(path, O_RDONLY);
+  const std::string received = allFrom(reader);
+  writer.join();
+  EXPECT_TRUE(written);
+  EXPECT_TRUE(received == text) << received.size() << " bytes";
+}
+
+// As with ">>" in a shell: what was there stays, and the order is that of the calls.
+TEST_F(StandardStreamsTest, StandardOutputPathAppendsBehindWhatWasPrinted) {
+  const std::string path = directory_.addFile("out", "before\n");
+  EXPECT_EQ(exitStatusWithOutput(
+                FileDescriptor::open(path, O_WRONLY | O_APPEND),
+                [] {
+                  const std::string standardOutput(kStandardOutputPath);
+                  writeToStandardOutput("progress\n");
+                  const bool replaced =
+                      OutputFile(standardOutput, OutputFile::Mode::kReplace).write("feed");
+                  const bool appended =
+                      OutputFile(standardOutput, OutputFile::Mode::kAppend).write("\n");
+                  writeToStandardOutput("done\n");
+                  flushStandardOutput();
+                  return replaced && appended;
+                }),
+            0);
+  EXPECT_EQ(contentOf(path), "before\nprogress\nfeed\ndone\n");
+}
+
+TEST_F(StandardStreamsTest, StandardOutputPathServesPipesAndSockets) {
+  const std::string text = longText();
+  for (const bool isSocket : {false, true}) {
+    for (const bool isNonBlocking : {false, true}) {
+      SCOPED_TRACE(testing::Message()
+                   << "socket " << isSocket << " non-blocking " << isNonBlocking);
+      Connection connection = isSocket ? makeSocketPair() : makePipe();
+      if (isNonBlocking) {
+        makeNonBlocking(connection.writeEnd);
+      }
+      std::string received;
+      std::thread reader([&] {
+        ::usleep(20000);
+        received = allFrom(connection.readEnd);
+      });
+      EXPECT_EQ(exitStatusWithOutput(connection.writeEnd,
+                                     [&] {
+                                       return OutputFile(std::string(kStandardOutputPath),
+                                                         OutputFile::Mode::kReplace)
+                                           .write(text);
+                                     }),
+                0);
+      connection.writeEnd.close();
+      reader.join();
+      EXPECT_TRUE(received == text) << received.size() << " bytes";
+    }
+  }
+}
+
+TEST_F(StandardStreamsTest, ClosedPipeIsAFailedWrite) {
+  Connection pipe = makePipe();
+  pipe.readEnd.close();
+  EXPECT_EQ(exitStatusWithOutput(pipe.writeEnd,
+                                 [] {
+                                   ::signal(SIGPIPE, SIG_IGN);
+                                   return !OutputFile(std::string(kStandardOutputPath),
+                                                      OutputFile::Mode::kReplace)
+                                               .write("x");
+                                 }),
+            0);
+}
+
+}  // namespace
+}  // namespace platform

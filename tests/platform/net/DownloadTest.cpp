@@ -1,0 +1,452 @@
+#include "platform/net/Download.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <iterator>
+#include <memory>
+#include <stdexcept>
+#include <thread>
+#include <vector>
+
+#include "platform/net/EventLoop.h"
+#include "platform/net/ResourceReader.h"
+#include "tests/support/HTTPTestServer.h"
+
+namespace platform {
+namespace {
+
+using Connection = HTTPTestServer::Connection;
+using ::testing::ElementsAre;
+using ::testing::UnorderedElementsAre;
+
+URL urlOf(const std::string& text) {
+  const std::optional<URL> url = URL::parse(text);
+  if (!url) throw std::invalid_argument(text);
+  return *url;
+}
+
+/// Writes the events down, data events that follow one another as one.
+class Recorder : public DownloadReceiver {
+ public:
+  std::vector<std::string> events;
+  std::uint64_t total = 0;
+  int dataEvents = 0;
+  bool ended = false;
+  std::function<void()> atEvent = [] {};
+
+  void didReceiveResponse(Download&, std::int64_t expectedLength) override {
+    note("response " + std::to_string(expectedLength));
+  }
+  void didReceiveDataOfLength(Download&, std::uint64_t length) override {
+    EXPECT_GT(length, 0U);
+    if (!events.empty() && events.back() == dataEvent()) events.pop_back();
+    total += length;
+    ++dataEvents;
+    note(dataEvent());
+  }
+  void downloadDidFinish(Download&) override {
+    ended = true;
+    note("finished");
+  }
+  void didFailWithError(Download&, const ErrorRecord& error) override {
+    ended = true;
+    note("failed: " + error.domain + " " + std::to_string(error.code) + ": " + error.description);
+  }
+
+ private:
+  std::string dataEvent() const { return "data " + std::to_string(total); }
+  void note(std::string event) {
+    events.push_back(std::move(event));
+    const std::function<void()> action = atEvent;  // may end this recorder's download
+    action();
+  }
+};
+
+class DownloadTest : public ::testing::Test {
+ protected:
+  DownloadTest() {
+    directory_ = ::testing::TempDir() + "DownloadTest." + std::to_string(getpid());
+    std::filesystem::remove_all(directory_);
+    std::filesystem::create_directories(directory_);
+    destination_ = directory_ + "/media.mp3";
+  }
+  ~DownloadTest() override {
+    std::filesystem::permissions(directory_, std::filesystem::perms::owner_all);
+    std::filesystem::remove_all(directory_);
+  }
+
+  /// The events of a download that runs to its end.
+  std::vector<std::string> download(const std::string& url) { return download(url, destination_); }
+  static std::vector<std::string> download(const std::string& url, const std::string& destination) {
+    Recorder recorder;
+    const Download download(urlOf(url), destination, recorder);
+    EXPECT_TRUE(recorder.events.empty()) << "an event came before the event loop ran";
+    while (!recorder.ended && runEventLoopOnce()) continue;
+    EXPECT_FALSE(runEventLoopOnce()) << "an ended download keeps the event loop busy";
+    return recorder.events;
+  }
+  std::vector<std::string> downloadAnswer(const std::string& answer, bool closes = false) {
+    server_.serve("/answer", [answer, closes](Connection& connection) {
+      connection.send(answer);
+      if (closes) connection.close();
+    });
+    return download(server_.url("/answer"));
+  }
+
+  static std::string contentOf(const std::string& path) {
+    std::ifstream stream(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(stream), {}};
+  }
+  static void write(const std::string& path, const std::string& content) {
+    std::ofstream(path, std::ios::binary) << content;
+  }
+  /// The names in the directory, hidden ones included.
+  std::vector<std::string> names() const {
+    std::vector<std::string> names;
+    for (const auto& entry : std::filesystem::directory_iterator(directory_)) {
+      names.push_back(entry.path().filename().string());
+    }
+    return names;
+  }
+
+  std::string directory_;
+  std::string destination_;
+  HTTPTestServer server_;
+};
+
+TEST_F(DownloadTest, WritesTheFile) {
+  EXPECT_THAT(downloadAnswer(HTTPTestServer::response("media")),
+              ElementsAre("response 5", "data 5", "finished"));
+  EXPECT_EQ(contentOf(destination_), "media");
+  EXPECT_THAT(names(), ElementsAre("media.mp3"));
+}
+
+TEST_F(DownloadTest, WritesAnEmptyFile) {
+  EXPECT_THAT(downloadAnswer(HTTPTestServer::response("")), ElementsAre("response 0", "finished"));
+  EXPECT_EQ(contentOf(destination_), "");
+  EXPECT_THAT(names(), ElementsAre("media.mp3"));
+}
+
+TEST_F(DownloadTest, UnknownLengthIsAnnouncedAsMinusOne) {
+  EXPECT_THAT(downloadAnswer("HTTP/1.1 200 OK\r\n\r\nmedia", true),
+              ElementsAre("response -1", "data 5", "finished"));
+  EXPECT_THAT(downloadAnswer("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n"
+                             "5\r\nmedia\r\n0\r\n\r\n"),
+              ElementsAre("response -1", "data 5", "finished"));
+  EXPECT_EQ(contentOf(destination_), "media");
+}
+
+TEST_F(DownloadTest, ReplacesAnExistingFile) {
+  write(destination_, "the old and longer content");
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
+  EXPECT_EQ(contentOf(destination_), "media");
+  EXPECT_THAT(names(), ElementsAre("media.mp3"));
+}
+
+TEST_F(DownloadTest, ReplacesASymbolicLinkAndLeavesItsTarget) {
+  write(directory_ + "/target", "target");
+  std::filesystem::create_symlink("target", destination_);
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
+  EXPECT_TRUE(std::filesystem::is_regular_file(std::filesystem::symlink_status(destination_)));
+  EXPECT_EQ(contentOf(directory_ + "/target"), "target");
+}
+
+TEST_F(DownloadTest, SendsExactlyThisRequest) {
+  downloadAnswer(HTTPTestServer::response(""));
+  EXPECT_THAT(
+      server_.requests(),
+      ElementsAre("GET /answer HTTP/1.1\r\nHost: 127.0.0.1:" + std::to_string(server_.port()) +
+                  "\r\nUser-Agent: qel/" QEL_VERSION "\r\nAccept: */*\r\n\r\n"));
+}
+
+TEST_F(DownloadTest, KeepsACodingThatItDidNotAskFor) {
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("coded", "Content-Encoding: gzip\r\n")).back(),
+            "finished");
+  EXPECT_EQ(contentOf(destination_), "coded");
+}
+
+TEST_F(DownloadTest, DataEventsComeAsTheDataComes) {
+  server_.serve("/drip", [](Connection& connection) {
+    connection.send("HTTP/1.1 200 OK\r\nContent-Length: 5\r\n\r\n");
+    for (const char c : std::string("media")) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(20));
+      connection.send({&c, 1});
+    }
+  });
+  Recorder recorder;
+  const Download download(urlOf(server_.url("/drip")), destination_, recorder);
+  while (!recorder.ended && runEventLoopOnce()) {
+    EXPECT_TRUE(recorder.ended || !std::filesystem::exists(destination_));
+  }
+  EXPECT_THAT(recorder.events, ElementsAre("response 5", "data 5", "finished"));
+  EXPECT_GT(recorder.dataEvents, 1);
+}
+
+TEST_F(DownloadTest, WritesALargeFile) {
+  std::string body;
+  while (body.size() < 20'000'000) body += std::to_string(body.size());
+  const std::string size = std::to_string(body.size());
+  EXPECT_THAT(downloadAnswer(HTTPTestServer::response(body)),
+              ElementsAre("response " + size, "data " + size, "finished"));
+  EXPECT_TRUE(contentOf(destination_) == body);
+}
+
+TEST_F(DownloadTest, ResponseOfARedirectIsNotTold) {
+  server_.serve("/1", HTTPTestServer::redirect("/2"));
+  server_.serve("/2", HTTPTestServer::redirect("/3"));
+  server_.serve("/3", HTTPTestServer::response("media"));
+  EXPECT_THAT(download(server_.url("/1")), ElementsAre("response 5", "data 5", "finished"));
+  EXPECT_EQ(contentOf(destination_), "media");
+}
+
+TEST_F(DownloadTest, ResourcesAndDownloadsShareOneConnection) {
+  server_.serve("/feed", HTTPTestServer::response("feed"));
+  ErrorSlot error;
+  EXPECT_EQ(readResource(urlOf(server_.url("/feed")), error), "feed");
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
+  EXPECT_EQ(server_.connections(), 1);
+}
+
+TEST_F(DownloadTest, ManySmallFilesAreQuick) {
+  const auto begin = std::chrono::steady_clock::now();
+  for (int i = 0; i < 50; ++i) {
+    ASSERT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
+  }
+  // Half of what they would take if each waited for a delayed acknowledgement of 40 ms.
+  EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(1));
+  EXPECT_EQ(server_.connections(), 1);
+}
+
+TEST_F(DownloadTest, FailureLeavesTheExistingFileAlone) {
+  write(destination_, "old");
+  EXPECT_THAT(downloadAnswer("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nmedia", true),
+              ElementsAre("response 9", "data 5",
+                          "failed: transfer 18: transfer closed with 4 bytes remaining to read"));
+  server_.serve("/reset", [](Connection& connection) {
+    connection.send("HTTP/1.1 200 OK\r\n\r\nmedia");
+    connection.reset();
+  });
+  EXPECT_THAT(download(server_.url("/reset")),
+              ElementsAre("response -1", "data 5",
+                          "failed: transfer 56: Recv failure: Connection reset by peer"));
+  EXPECT_EQ(contentOf(destination_), "old");
+  EXPECT_THAT(names(), ElementsAre("media.mp3"));
+}
+
+TEST_F(DownloadTest, FailedStatusBringsNoResponse) {
+  for (const std::string status : {"204", "206", "304", "404", "500"}) {
+    const bool hasBody = status != "204" && status != "304";
+    EXPECT_THAT(
+        downloadAnswer(HTTPTestServer::response(hasBody ? "sorry" : "", "", status + " Text")),
+        ElementsAre("failed: HTTP " + status + ": HTTP status " + status));
+  }
+  EXPECT_THAT(names(), ElementsAre());
+}
+
+TEST_F(DownloadTest, RefusesRedirectsToOtherProtocols) {
+  for (const std::string protocol : {"file", "ftp"}) {
+    EXPECT_THAT(downloadAnswer(HTTPTestServer::redirect(protocol + "://localhost/etc/passwd")),
+                ElementsAre("failed: transfer 1: Protocol \"" + protocol +
+                            "\" not supported or disabled in libcurl"));
+  }
+}
+
+TEST_F(DownloadTest, EndsARedirectLoop) {
+  server_.serve("/loop", HTTPTestServer::redirect("/loop"));
+  EXPECT_THAT(download(server_.url("/loop")),
+              ElementsAre("failed: transfer 47: Maximum (20) redirects followed"));
+}
+
+TEST_F(DownloadTest, OtherSchemesFailInTheEventLoop) {
+  EXPECT_THAT(download("ftp://127.0.0.1/a"),
+              ElementsAre("failed: transfer 1: URLs of the scheme \"ftp\" are not supported"));
+}
+
+TEST_F(DownloadTest, MissingDirectoryIsAFailure) {
+  server_.serve("/media", HTTPTestServer::response("media"));
+  EXPECT_THAT(download(server_.url("/media"), directory_ + "/none/media.mp3"),
+              ElementsAre("failed: POSIX 2: No such file or directory"));
+  EXPECT_THAT(download("file:///proc/self/status", directory_ + "/none/media.mp3"),
+              ElementsAre("failed: POSIX 2: No such file or directory"));
+}
+
+TEST_F(DownloadTest, LongBodyOfAnotherStatusIsThatStatus) {
+  // Only the beginning of such a body is read.
+  EXPECT_THAT(downloadAnswer("HTTP/1.1 206 Partial Content\r\nContent-Length: 1000000\r\n\r\n" +
+                             std::string(1000000, 'x')),
+              ElementsAre("failed: HTTP 206: HTTP status 206"));
+  EXPECT_THAT(names(), ElementsAre());
+}
+
+TEST_F(DownloadTest, FileThatCannotBeReadToItsEndIsAFailure) {
+  // At its start no process has memory.
+  EXPECT_THAT(download("file:///proc/self/mem"),
+              ElementsAre("response 0", "failed: POSIX 5: Input/output error"));
+  EXPECT_THAT(names(), ElementsAre());
+}
+
+TEST_F(DownloadTest, ReadOnlyDirectoryIsAFailure) {
+  std::filesystem::permissions(
+      directory_, std::filesystem::perms::owner_read | std::filesystem::perms::owner_exec);
+  // The superuser may write everywhere, and becomes another for a moment.
+  const uid_t user = geteuid();
+  const uid_t nobody = 65534;
+  if (user == 0 && seteuid(nobody) != 0) GTEST_SKIP() << "this user may write everywhere";
+  const std::vector<std::string> events = downloadAnswer(HTTPTestServer::response("media"));
+  ASSERT_EQ(seteuid(user), 0);
+  EXPECT_THAT(events, ElementsAre("failed: POSIX 13: Permission denied"));
+}
+
+TEST_F(DownloadTest, DirectoryAtTheDestinationIsAFailure) {
+  std::filesystem::create_directory(destination_);
+  EXPECT_THAT(downloadAnswer(HTTPTestServer::response("media")),
+              ElementsAre("response 5", "data 5", "failed: POSIX 21: Is a directory"));
+  EXPECT_TRUE(std::filesystem::is_directory(destination_));
+  EXPECT_THAT(names(), ElementsAre("media.mp3"));
+}
+
+TEST_F(DownloadTest, FullDiskIsAFailure) {
+  // A limit on the size of files stands for the disk.
+  signal(SIGXFSZ, SIG_IGN);
+  rlimit limit{};
+  getrlimit(RLIMIT_FSIZE, &limit);
+  const rlimit tight{1000, limit.rlim_max};
+  setrlimit(RLIMIT_FSIZE, &tight);
+  const std::string last = downloadAnswer(HTTPTestServer::response(std::string(5000, 'x'))).back();
+  setrlimit(RLIMIT_FSIZE, &limit);
+  signal(SIGXFSZ, SIG_DFL);
+  EXPECT_EQ(last, "failed: POSIX 27: File too large");
+  EXPECT_THAT(names(), ElementsAre());
+}
+
+TEST_F(DownloadTest, CancellingLeavesNothing) {
+  server_.serve("/stalled", [](Connection& connection) {
+    connection.send("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nmedia");
+  });
+  Recorder recorder;
+  {
+    const Download download(urlOf(server_.url("/stalled")), destination_, recorder);
+    while (recorder.total < 5) ASSERT_TRUE(runEventLoopOnce());
+    EXPECT_EQ(names().size(), 1U);
+  }
+  EXPECT_THAT(recorder.events, ElementsAre("response 9", "data 5"));
+  EXPECT_THAT(names(), ElementsAre());
+  EXPECT_FALSE(runEventLoopOnce());
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
+}
+
+TEST_F(DownloadTest, ReceiverMayDestroyTheDownloadInAnyEvent) {
+  server_.serve("/good", HTTPTestServer::response("media"));
+  const std::string file = directory_ + "/source";
+  write(file, "media");
+  for (const std::string& url :
+       {server_.url("/good"), server_.url("/missing"), fileURLText(file), fileURLText("/none")}) {
+    const std::size_t eventCount = download(url).size();
+    for (std::size_t last = 1; last <= eventCount; ++last) {
+      std::filesystem::remove(destination_);
+      Recorder recorder;
+      auto download = std::make_unique<Download>(urlOf(url), destination_, recorder);
+      recorder.atEvent = [&] {
+        if (recorder.events.size() == last) download.reset();
+      };
+      while (download && runEventLoopOnce()) continue;
+      EXPECT_EQ(recorder.events.size(), last) << url;
+      EXPECT_FALSE(runEventLoopOnce());
+      EXPECT_EQ(std::filesystem::exists(destination_), recorder.events.back() == "finished");
+    }
+  }
+  EXPECT_THAT(names(), UnorderedElementsAre("source"));
+}
+
+TEST_F(DownloadTest, ReceiverMayStartTheNextDownloadInItsLastEvent) {
+  server_.serve("/1", HTTPTestServer::response("one"));
+  server_.serve("/2", HTTPTestServer::response("two"));
+  Recorder first;
+  Recorder second;
+  std::unique_ptr<Download> next;
+  const Download download(urlOf(server_.url("/1")), destination_, first);
+  first.atEvent = [&] {
+    if (!first.ended) return;
+    next = std::make_unique<Download>(urlOf(server_.url("/2")), directory_ + "/2", second);
+    while (!second.ended && runEventLoopOnce()) continue;
+  };
+  while (!first.ended && runEventLoopOnce()) continue;
+  EXPECT_THAT(second.events, ElementsAre("response 3", "data 3", "finished"));
+  EXPECT_EQ(contentOf(destination_), "one");
+  EXPECT_EQ(contentOf(directory_ + "/2"), "two");
+  EXPECT_EQ(server_.connections(), 1);
+}
+
+TEST_F(DownloadTest, CopiesAFile) {
+  const std::string source = directory_ + "/a source \u00E9";
+  write(source, "media");
+  write(destination_, "old");
+  EXPECT_THAT(download(fileURLText(source)), ElementsAre("response 5", "data 5", "finished"));
+  EXPECT_EQ(contentOf(destination_), "media");
+  EXPECT_EQ(names().size(), 2U);
+}
+
+TEST_F(DownloadTest, CopiesAnEmptyFile) {
+  write(directory_ + "/empty", "");
+  EXPECT_THAT(download(fileURLText(directory_ + "/empty")), ElementsAre("response 0", "finished"));
+  EXPECT_TRUE(std::filesystem::exists(destination_));
+}
+
+TEST_F(DownloadTest, CopiesALargeFileInSeveralEvents) {
+  std::string body;
+  while (body.size() < 5'000'000) body += std::to_string(body.size());
+  const std::string size = std::to_string(body.size());
+  write(directory_ + "/large", body);
+  Recorder recorder;
+  const Download download(urlOf(fileURLText(directory_ + "/large")), destination_, recorder);
+  while (!recorder.ended && runEventLoopOnce()) continue;
+  EXPECT_THAT(recorder.events, ElementsAre("response " + size, "data " + size, "finished"));
+  EXPECT_GE(recorder.dataEvents, 5);
+  EXPECT_TRUE(contentOf(destination_) == body);
+}
+
+TEST_F(DownloadTest, CopiesAFileOntoItself) {
+  write(destination_, "media");
+  EXPECT_EQ(download(fileURLText(destination_)).back(), "finished");
+  EXPECT_EQ(contentOf(destination_), "media");
+}
+
+TEST_F(DownloadTest, FileThatBecomesShorterIsAFailure) {
+  const std::string source = directory_ + "/source";
+  write(source, std::string(1'000'000, 'x'));
+  Recorder recorder;
+  const Download download(urlOf(fileURLText(source)), destination_, recorder);
+  while (recorder.total == 0) ASSERT_TRUE(runEventLoopOnce());
+  std::filesystem::resize_file(source, 10);
+  while (!recorder.ended && runEventLoopOnce()) continue;
+  EXPECT_EQ(recorder.events.back(), "failed: POSIX 5: The file became shorter while it was read");
+  EXPECT_THAT(names(), ElementsAre("source"));
+}
+
+TEST_F(DownloadTest, NothingButARegularFileIsCopied) {
+  const std::string fifo = directory_ + "/fifo";
+  ASSERT_EQ(mkfifo(fifo.c_str(), 0600), 0);
+  const std::vector<std::pair<std::string, std::string>> rows = {
+      {fileURLText(fifo), "failed: POSIX 22: Not a regular file"},
+      {"file:///dev/zero", "failed: POSIX 22: Not a regular file"},
+      {"file:///dev/null", "failed: POSIX 22: Not a regular file"},
+      {fileURLText(directory_), "failed: POSIX 21: Is a directory"},
+      {fileURLText(directory_ + "/none"), "failed: POSIX 2: No such file or directory"},
+      {"file:///etc/passwd%00.mp3", "failed: POSIX 22: Invalid argument"},
+  };
+  for (const auto& [url, event] : rows) EXPECT_THAT(download(url), ElementsAre(event)) << url;
+  EXPECT_THAT(names(), ElementsAre("fifo"));
+}
+
+}  // namespace
+}  // namespace platform
