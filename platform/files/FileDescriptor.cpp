@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <exception>
 #include <utility>
 
 namespace platform {
@@ -92,30 +91,22 @@ std::ptrdiff_t readSome(int descriptor, char* buffer, std::size_t capacity) {
 
 int readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit, std::string& bytes) {
   std::uint64_t length = bytes.size();
-  try {
-    // The byte beyond the expected size lets the end be seen without growing; the one beyond the
-    // limit tells a longer input from one that just fits.
-    bytes.resize(std::min(length + std::max(expectedSize + 1, kChunkSize), limit + 1));
-    for (;;) {
-      if (length == bytes.size()) {
-        bytes.resize(std::min(length * 2, limit + 1));
-      }
-      const std::ptrdiff_t count =
-          readSome(descriptor, bytes.data() + length, bytes.size() - length);
-      const int failure = count < 0 ? errno : 0;
-      if (count <= 0) {
-        bytes.resize(length);
-        return failure;
-      }
-      length += static_cast<std::uint64_t>(count);
-      if (length > limit) {
-        bytes.resize(limit);
-        return EFBIG;
-      }
+  // The byte beyond the expected size lets the end be seen without growing; the one beyond the
+  // limit tells a longer input from one that just fits.
+  bytes.resize(std::min(length + std::max(expectedSize + 1, kChunkSize), limit + 1));
+  for (;;) {
+    if (length == bytes.size()) bytes.resize(std::min(length * 2, limit + 1));
+    const std::ptrdiff_t count = readSome(descriptor, bytes.data() + length, bytes.size() - length);
+    const int failure = count < 0 ? errno : 0;
+    if (count <= 0) {
+      bytes.resize(length);
+      return failure;
     }
-  } catch (const std::exception&) {
-    bytes.resize(std::min<std::uint64_t>(length, bytes.size()));
-    return ENOMEM;
+    length += static_cast<std::uint64_t>(count);
+    if (length > limit) {
+      bytes.resize(limit);
+      return EFBIG;
+    }
   }
 }
 

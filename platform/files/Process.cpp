@@ -4,9 +4,16 @@
 #include <malloc.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <csignal>
+#include <cstdlib>
 #include <initializer_list>
+#include <new>
+
+#include "platform/files/StandardStreams.h"
+#include "platform/files/TemporaryFile.h"
+#include "platform/text/Memory.h"
 
 namespace platform {
 
@@ -24,6 +31,15 @@ void keepFreedMemory() {
 #endif
 }
 
+/// The new-handler. It runs on any thread, amid whatever asked for memory, and asks for none.
+[[noreturn]] void endForWantOfMemory() {
+  static std::atomic_flag isEnding;
+  while (isEnding.test_and_set()) ::pause();  // another thread ends the process
+  flushStandardOutput();
+  writeToStandardError("Out of memory.\n");
+  TemporaryFile::removeAllAndExit(EXIT_FAILURE);
+}
+
 }  // namespace
 
 void prepareProcess() {
@@ -36,6 +52,8 @@ void prepareProcess() {
     }
   }
   keepFreedMemory();
+  std::set_new_handler(&endForWantOfMemory);
+  Memory::serveLibraries();
 }
 
 }  // namespace platform

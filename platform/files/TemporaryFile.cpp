@@ -88,11 +88,12 @@ int moveNew(const char* from, const char* to) {
 
 }  // namespace
 
-/// The temporary files that exist at this moment, for the signal handler.
+/// The temporary files that exist at this moment, for the signal handler and the new-handler.
 class TemporaryFile::Registry {
  public:
   /// While one exists, the handler neither runs on this thread nor reads the list on another: a
-  /// library's helper threads may be given a signal as well.
+  /// library's helper threads may be given a signal as well. Nothing is allocated meanwhile: where
+  /// memory runs out, the new-handler wants the list on the very thread that holds it.
   class Hold {
    public:
     Hold() {
@@ -144,7 +145,19 @@ class TemporaryFile::Registry {
     *link = std::exchange(file.next_, nullptr);
   }
 
+  [[noreturn]] static void removeAllAndExit(int status) {
+    const Hold hold;
+    unlinkAll();
+    ::_exit(status);
+  }
+
  private:
+  static void unlinkAll() {
+    for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
+      ::unlink(file->path_.c_str());
+    }
+  }
+
   static void acquire() {
     while (busy_.test_and_set(std::memory_order_acquire)) {
     }
@@ -154,9 +167,7 @@ class TemporaryFile::Registry {
   /// is never released again: nothing is created any more.
   static void removeAllAndEnd(int signal) {
     acquire();
-    for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
-      ::unlink(file->path_.c_str());
-    }
+    unlinkAll();
     // The signal is blocked until the handler returns, and ends the process then.
     struct sigaction action {};
     action.sa_handler = SIG_DFL;
@@ -179,7 +190,7 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
     error = posixError(destination.empty() ? ENOENT : EINVAL);
     return false;
   }
-  destination_ = destination;  // before there is a file: memory may run out here
+  destination_ = destination;
   Registry::handleSignals();
   int failure = EEXIST;
   for (int attempt = 0; attempt < kCreationAttempts && failure == EEXIST; ++attempt) {
@@ -241,6 +252,10 @@ bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorS
   Registry::remove(*this);
   path_.clear();
   return true;
+}
+
+void TemporaryFile::removeAllAndExit(int status) {
+  Registry::removeAllAndExit(status);
 }
 
 void TemporaryFile::discard() {

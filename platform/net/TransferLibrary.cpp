@@ -4,6 +4,8 @@
 
 #include <type_traits>
 
+#include "platform/text/Memory.h"
+
 namespace platform {
 
 namespace {
@@ -29,7 +31,7 @@ TransferLibrary::TransferLibrary() {
     function = reinterpret_cast<std::decay_t<decltype(function)>>(dlsym(library, name));
     if (function == nullptr && !error_) error_ = loadingError();
   };
-  find(globalInit, "curl_global_init");
+  find(globalInit, "curl_global_init_mem");
   find(easyInit, "curl_easy_init");
   find(easyCleanup, "curl_easy_cleanup");
   find(easySetopt, "curl_easy_setopt");
@@ -46,6 +48,11 @@ TransferLibrary::TransferLibrary() {
   find(url, "curl_url");
   find(urlCleanup, "curl_url_cleanup");
   find(urlSet, "curl_url_set");
+  if (error_) return;
+  const CURLcode result =
+      globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
+                 &Memory::duplicate, &Memory::allocateZeroed);
+  if (result != CURLE_OK) error_ = {"transfer", result, easyStrerror(result)};
 }
 
 const TransferLibrary& TransferLibrary::instance() {

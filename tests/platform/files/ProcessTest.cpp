@@ -9,7 +9,14 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
+#include <functional>
+#include <new>
+#include <string>
+#include <thread>
+#include <vector>
 
+#include "platform/files/StandardStreams.h"
+#include "platform/files/TemporaryFile.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -76,6 +83,58 @@ TEST(ProcessTest, ClosedStandardStreamsAreOpenedOnNothing) {
               }),
               0);
   }
+}
+
+struct End {
+  int status;
+  std::string output;
+  std::string error;
+  std::vector<std::string> files;  // that stayed
+};
+
+/// The end of a process that has printed a line and writes two files when something happens to it.
+End endAfter(const std::function<void()>& happen) {
+  const TemporaryDirectory directory;
+  testing::internal::CaptureStdout();
+  testing::internal::CaptureStderr();
+  const int status = exitStatusOfChild([&] {
+    prepareProcess();
+    ErrorSlot error;
+    TemporaryFile first;
+    TemporaryFile second;
+    if (!first.create(directory / "first", error)) return 2;
+    if (!second.create(directory / "second", error)) return 3;
+    writeToStandardOutput("a line\n");
+    happen();
+    return 4;
+  });
+  return {status, testing::internal::GetCapturedStdout(), testing::internal::GetCapturedStderr(),
+          directory.names()};
+}
+
+void exhaustMemory() {
+  std::get_new_handler()();
+}
+
+void expectOneMessageAndNoFiles(const std::function<void()>& happen) {
+  const End end = endAfter(happen);
+  EXPECT_EQ(end.status, 1);
+  EXPECT_EQ(end.output, "a line\n");
+  EXPECT_EQ(end.error, "Out of memory.\n");
+  EXPECT_EQ(end.files, std::vector<std::string>());
+}
+
+TEST(ProcessTest, ExhaustedMemoryEndsIt) {
+  expectOneMessageAndNoFiles(&exhaustMemory);
+}
+
+TEST(ProcessTest, ThreadsThatExhaustMemoryEndItOnce) {
+  expectOneMessageAndNoFiles([] { std::thread(&exhaustMemory).join(); });
+  expectOneMessageAndNoFiles([] {
+    std::thread another(&exhaustMemory);
+    exhaustMemory();
+    another.join();
+  });
 }
 
 }  // namespace
