@@ -71,9 +71,7 @@ bool writeAll(int descriptor, std::string_view bytes) {
       return false;
     } else if (errno == EAGAIN) {
       // A standard stream is non-blocking where another process that shares it made it so.
-      if (!waitFor(descriptor, POLLOUT)) {
-        return false;
-      }
+      if (!waitFor(descriptor, POLLOUT)) return false;
     } else if (errno != EINTR) {
       return false;
     }

@@ -39,15 +39,9 @@ bool copyRest(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
   std::array<char, std::size_t{128} << 10U> buffer;
   for (;;) {
     const std::optional<std::size_t> count = source.read(buffer, error);
-    if (!count) {
-      return false;
-    }
-    if (*count == 0) {
-      return true;
-    }
-    if (!copy.write(std::string_view(buffer.data(), *count), error)) {
-      return false;
-    }
+    if (!count) return false;
+    if (*count == 0) return true;
+    if (!copy.write(std::string_view(buffer.data(), *count), error)) return false;
   }
 }
 
@@ -60,17 +54,13 @@ bool fileExists(const std::string& path) {
 
 bool mayBeSymbolicLink(const std::string& path) {
   struct stat status {};
-  if (::lstat(path.c_str(), &status) == 0) {
-    return S_ISLNK(status.st_mode);
-  }
+  if (::lstat(path.c_str(), &status) == 0) return S_ISLNK(status.st_mode);
   return errno != ENOENT && errno != ENOTDIR;
 }
 
 std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error) {
   const std::optional<RegularFile> file = RegularFile::open(path, error);
-  if (!file) {
-    return std::nullopt;
-  }
+  if (!file) return std::nullopt;
   // The whole is read once and then kept by us: it need not stay in the system's cache as well.
   ::posix_fadvise(file->descriptor(), 0, 0, POSIX_FADV_NOREUSE);
   std::string bytes;
@@ -116,13 +106,9 @@ bool copyFile(const std::string& source, const std::string& destination) {
   ErrorSlot error;
   std::optional<RegularFile> original = RegularFile::open(source, error);
   struct stat status {};
-  if (!original || ::lstat(destination.c_str(), &status) == 0) {
-    return false;
-  }
+  if (!original || ::lstat(destination.c_str(), &status) == 0) return false;
   TemporaryFile copy;
-  if (!copy.create(destination, error)) {
-    return false;
-  }
+  if (!copy.create(destination, error)) return false;
   copyInsideKernel(*original, copy);
   return copyRest(*original, copy, error) && copy.commitNew(error);
 }

@@ -47,9 +47,7 @@ void prepareProcess() {
   std::signal(SIGXFSZ, SIG_IGN);
   for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     // Those below it are open, so that the lowest free one, which open gives, is this one.
-    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) {
-      ::open("/dev/null", O_RDWR);
-    }
+    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) ::open("/dev/null", O_RDWR);
   }
   keepFreedMemory();
   std::set_new_handler(&endForWantOfMemory);

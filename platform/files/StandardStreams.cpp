@@ -66,9 +66,7 @@ OutputFile::OutputFile(const std::string& path, Mode mode) {
 }
 
 bool OutputFile::write(std::string_view bytes) {
-  if (descriptor_ >= 0 && writeAll(descriptor_, bytes)) {
-    return true;
-  }
+  if (descriptor_ >= 0 && writeAll(descriptor_, bytes)) return true;
   descriptor_ = -1;
   return false;
 }

@@ -72,16 +72,10 @@ int moveReplacing(const char* from, const char* to) {
 }
 
 int moveNew(const char* from, const char* to) {
-  if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) {
-    return 0;
-  }
-  if (errno != EINVAL && errno != ENOSYS) {
-    return -1;
-  }
+  if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) return 0;
+  if (errno != EINVAL && errno != ENOSYS) return -1;
   // Some file systems (NFS) cannot rename that way. A link is refused for an existing name, too.
-  if (::link(from, to) != 0) {
-    return -1;
-  }
+  if (::link(from, to) != 0) return -1;
   ::unlink(from);
   return 0;
 }
@@ -99,9 +93,7 @@ class TemporaryFile::Registry {
     Hold() {
       sigset_t signals;
       ::sigemptyset(&signals);
-      for (const int signal : kEndingSignals) {
-        ::sigaddset(&signals, signal);
-      }
+      for (const int signal : kEndingSignals) ::sigaddset(&signals, signal);
       ::pthread_sigmask(SIG_BLOCK, &signals, &previous_);
       acquire();
     }
@@ -121,15 +113,11 @@ class TemporaryFile::Registry {
   static void handleSignals() {
     struct sigaction action {};
     action.sa_handler = &Registry::removeAllAndEnd;
-    for (const int signal : kEndingSignals) {
-      ::sigaddset(&action.sa_mask, signal);
-    }
+    for (const int signal : kEndingSignals) ::sigaddset(&action.sa_mask, signal);
     for (const int signal : kEndingSignals) {
       struct sigaction current {};
       ::sigaction(signal, nullptr, &current);
-      if (current.sa_handler == SIG_DFL) {
-        ::sigaction(signal, &action, nullptr);
-      }
+      if (current.sa_handler == SIG_DFL) ::sigaction(signal, &action, nullptr);
     }
   }
 
@@ -139,9 +127,7 @@ class TemporaryFile::Registry {
   static void remove(TemporaryFile& file) {
     const Hold hold;
     TemporaryFile** link = &first_;
-    while (*link != &file) {
-      link = &(*link)->next_;
-    }
+    while (*link != &file) link = &(*link)->next_;
     *link = std::exchange(file.next_, nullptr);
   }
 
@@ -224,9 +210,7 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
 }
 
 bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
-  if (descriptor_.isOpen() && writeAll(descriptor_.get(), bytes)) {
-    return true;
-  }
+  if (descriptor_.isOpen() && writeAll(descriptor_.get(), bytes)) return true;
   error = posixError(descriptor_.isOpen() ? errno : EBADF);
   discard();
   return false;
@@ -259,9 +243,7 @@ void TemporaryFile::removeAllAndExit(int status) {
 }
 
 void TemporaryFile::discard() {
-  if (path_.empty()) {
-    return;
-  }
+  if (path_.empty()) return;
   ::unlink(path_.c_str());
   descriptor_.close();
   Registry::remove(*this);
@@ -281,23 +263,15 @@ void removeStaleTemporaryFiles(const std::string& directory) {
   // Not by <filesystem>, which ends the process where it gets no memory.
   const std::string parent = directory.empty() ? "." : directory;
   const std::unique_ptr<DIR, DirectoryCloser> entries(::opendir(parent.c_str()));
-  if (!entries) {
-    return;
-  }
+  if (!entries) return;
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string_view name = entry->d_name;
-    if (!isTemporaryFileName(name)) {
-      continue;
-    }
+    if (!isTemporaryFileName(name)) continue;
     const std::string path = std::string(parent).append("/").append(name);
     struct stat status {};
-    if (::lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
-      continue;
-    }
+    if (::lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) continue;
     const FileDescriptor file = FileDescriptor::open(path, O_RDWR | O_NONBLOCK | O_NOFOLLOW);
-    if (file.isOpen() && lock(file.get())) {
-      ::unlink(path.c_str());
-    }
+    if (file.isOpen() && lock(file.get())) ::unlink(path.c_str());
   }
 }
 

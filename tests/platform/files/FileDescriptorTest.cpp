@@ -118,9 +118,7 @@ void fill(const Pipe& pipe, bool isBlocking) {
   const std::array<char, 4096> page{};
   while (::write(pipe.writeEnd.get(), page.data(), page.size()) > 0) {
   }
-  if (isBlocking) {
-    ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, flags), 0);
-  }
+  if (isBlocking) ASSERT_EQ(::fcntl(pipe.writeEnd.get(), F_SETFL, flags), 0);
 }
 
 TEST(FileDescriptorTest, WritingGoesOnAfterASignal) {

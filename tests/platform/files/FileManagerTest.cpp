@@ -231,9 +231,7 @@ TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
     SCOPED_TRACE(refusal);
     const std::string copy = directory_ / ("copy" + std::to_string(refusal));
     EXPECT_EQ(exitStatusOfChild([&] {
-                if (!refuseSystemCall(SYS_copy_file_range, refusal)) {
-                  return 1;
-                }
+                if (!refuseSystemCall(SYS_copy_file_range, refusal)) return 1;
                 return copyFile(source, copy) ? 0 : 2;
               }),
               0);
@@ -265,9 +263,7 @@ TEST_F(FileManagerTest, CopyLeavesAloneWhatAppearsMeanwhile) {
 TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
   const std::string source = directory_.addFile("source", "content");
   EXPECT_EQ(exitStatusOfChild([&] {
-              if (!refuseSystemCall(SYS_read, EIO)) {
-                return 1;
-              }
+              if (!refuseSystemCall(SYS_read, EIO)) return 1;
               return copyFile(source, directory_ / "copy") ? 2 : 0;
             }),
             0);
@@ -277,13 +273,9 @@ TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
 TEST_F(FileManagerTest, WholeReadTellsWhyItFailed) {
   const std::string path = directory_.addFile("file", "content");
   EXPECT_EQ(exitStatusOfChild([&] {
-              if (!refuseSystemCall(SYS_read, EIO)) {
-                return 1;
-              }
+              if (!refuseSystemCall(SYS_read, EIO)) return 1;
               ErrorSlot error;
-              if (readWholeFile(path, error)) {
-                return 2;
-              }
+              if (readWholeFile(path, error)) return 2;
               return error == ErrorRecord{"POSIX", EIO, "Input/output error"} ? 0 : 3;
             }),
             0);

@@ -28,9 +28,7 @@ TEST(ProcessTest, ClosedPipeIsAFailedWrite) {
               ::signal(SIGPIPE, SIG_DFL);
               prepareProcess();
               std::array<int, 2> ends{};
-              if (::pipe(ends.data()) != 0) {
-                return 1;
-              }
+              if (::pipe(ends.data()) != 0) return 1;
               ::close(ends[0]);
               return ::write(ends[1], "x", 1) == -1 && errno == EPIPE ? 0 : 2;
             }),
@@ -67,17 +65,13 @@ TEST(ProcessTest, ClosedStandardStreamsAreOpenedOnNothing) {
                 const int file = ::open(path.c_str(), O_RDWR);
                 for (int descriptor = 0; descriptor < 3; ++descriptor) {
                   ::dup2(file, descriptor);
-                  if ((closed >> static_cast<unsigned>(descriptor) & 1U) != 0) {
-                    ::close(descriptor);
-                  }
+                  if ((closed >> static_cast<unsigned>(descriptor) & 1U) != 0) ::close(descriptor);
                 }
                 ::close(file);
                 prepareProcess();
                 for (int descriptor = 0; descriptor < 3; ++descriptor) {
                   const bool wasClosed = (closed >> static_cast<unsigned>(descriptor) & 1U) != 0;
-                  if (isOpenOnNothing(descriptor) != wasClosed) {
-                    return 1;
-                  }
+                  if (isOpenOnNothing(descriptor) != wasClosed) return 1;
                 }
                 return ::open(path.c_str(), O_RDONLY) > 2 ? 0 : 2;
               }),
