@@ -14,7 +14,6 @@
 #include "platform/text/TextHelpers.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kWorkingDirectory = ".";

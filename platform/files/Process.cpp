@@ -16,7 +16,6 @@
 #include "platform/text/Memory.h"
 
 namespace platform {
-
 namespace {
 
 /// What one stage of a run gives back, such as the bytes of a feed, the next one soon asks for. It

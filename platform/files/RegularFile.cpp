@@ -9,14 +9,12 @@
 #include "platform/files/PosixError.h"
 
 namespace platform {
-
 namespace {
 
 /// Judges what a successful stat found; fills the slot for anything but a regular file.
 bool isRegular(const struct stat& status, ErrorSlot& error) {
   if (S_ISREG(status.st_mode)) return true;
-  error = S_ISDIR(status.st_mode) ? posixError(EISDIR)
-                                  : ErrorRecord{"POSIX", EINVAL, "Not a regular file"};
+  error = S_ISDIR(status.st_mode) ? posixError(EISDIR) : posixError(EINVAL, "Not a regular file");
   return false;
 }
 

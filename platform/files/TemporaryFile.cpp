@@ -18,7 +18,6 @@
 #include "platform/files/PosixError.h"
 
 namespace platform {
-
 namespace {
 
 // The name is short, so that it fits wherever the final name does, and random, so that runs that

@@ -7,7 +7,6 @@
 #include "platform/text/Memory.h"
 
 namespace platform {
-
 namespace {
 
 /// The file of the only binary interface that the library has had since 2006.

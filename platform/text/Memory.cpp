@@ -9,7 +9,6 @@
 #include <pugixml.hpp>
 
 namespace platform {
-
 namespace {
 
 template <typename Request>

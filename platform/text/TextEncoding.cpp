@@ -10,7 +10,6 @@
 #include <utility>
 
 namespace platform {
-
 namespace {
 
 struct ConverterCloser {

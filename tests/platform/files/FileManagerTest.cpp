@@ -126,32 +126,6 @@ TEST_F(FileManagerTest, FilesOverTheLimitAreNotRead) {
   EXPECT_EQ(error_, (ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"}));
 }
 
-TEST_F(FileManagerTest, ReadingStopsAtTheLimitWhateverTheSizeSaid) {
-  const std::string content = largeContent(200000);
-  const std::string path = directory_.addFile("file", content);
-  struct Row {
-    std::uint64_t expectedSize;
-    std::uint64_t limit;
-    int result;
-  };
-  for (const auto& [expectedSize, limit, result] : std::array<Row, 8>{{
-           {200000, 200000, 0},
-           {200000, 199999, EFBIG},
-           {0, 200000, 0},
-           {0, 199999, EFBIG},
-           {5, 200001, 0},
-           {5, 100, EFBIG},
-           {5, 0, EFBIG},
-           {1000000, 500000, 0},
-       }}) {
-    SCOPED_TRACE(testing::Message() << "expected " << expectedSize << ", limit " << limit);
-    const FileDescriptor file = FileDescriptor::open(path, O_RDONLY);
-    std::string bytes;
-    EXPECT_EQ(readToEnd(file.get(), expectedSize, limit, bytes), result);
-    EXPECT_EQ(bytes, content.substr(0, limit));
-  }
-}
-
 TEST_F(FileManagerTest, CreatesAllMissingDirectories) {
   for (const char* path : {"a", "b/c/d", "e/", "f//g///", "./h", "i/../j", "k/."}) {
     SCOPED_TRACE(path);
