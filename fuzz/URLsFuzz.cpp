@@ -9,8 +9,9 @@
 #include "generators/QELNameLedger.h"
 #include "platform/files/Paths.h"
 #include "platform/net/URL.h"
+#include "platform/text/Case.h"
+#include "platform/text/Splitting.h"
 #include "platform/text/Text.h"
-#include "platform/text/TextHelpers.h"
 #include "platform/xml/XMLEscaping.h"
 
 namespace {

@@ -7,7 +7,7 @@
 #include "platform/files/TemporaryFile.h"
 #include "platform/net/URL.h"
 #include "platform/text/FormattedText.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Splitting.h"
 #include "platform/xml/XMLEscaping.h"
 
 namespace {

@@ -14,9 +14,9 @@
 #include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/plist/PropertyListWriter.h"
+#include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
 #include "platform/text/Text.h"
-#include "platform/text/TextHelpers.h"
 
 namespace {
 

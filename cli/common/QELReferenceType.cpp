@@ -1,6 +1,7 @@
 #include "cli/common/QELReferenceType.h"
 
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
+#include "platform/text/Characters.h"
 
 std::optional<platform::Text> QELReferenceType(std::optional<std::string_view> location) {
   // Made once: every record shares them.
