@@ -16,8 +16,8 @@
 #include "platform/files/Paths.h"
 #include "platform/files/StandardStreams.h"
 #include "platform/plist/PropertyListWriter.h"
+#include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
-#include "platform/text/TextHelpers.h"
 
 namespace {
 

@@ -10,8 +10,8 @@
 #include "cli/common/QELReferenceType.h"
 #include "platform/files/Paths.h"
 #include "platform/net/URL.h"
+#include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
-#include "platform/text/TextHelpers.h"
 #include "platform/time/DateFormatter.h"
 #include "platform/time/PointInTime.h"
 

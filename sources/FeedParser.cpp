@@ -6,8 +6,10 @@
 
 #include "cli/common/QELError.h"
 #include "dates/RFC822Parsing.h"
+#include "platform/text/Case.h"
+#include "platform/text/Characters.h"
+#include "platform/text/LeadingInteger.h"
 #include "platform/text/Text.h"
-#include "platform/text/TextHelpers.h"
 
 namespace {
 

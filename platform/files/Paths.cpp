@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "platform/files/PosixError.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Splitting.h"
 
 namespace platform {
 namespace {

@@ -4,7 +4,8 @@
 #include <limits>
 #include <system_error>
 
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
+#include "platform/text/Splitting.h"
 
 namespace platform {
 namespace {

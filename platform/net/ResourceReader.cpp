@@ -8,7 +8,8 @@
 
 #include "platform/net/GzipDecoder.h"
 #include "platform/net/NetworkTransfer.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
+#include "platform/text/Splitting.h"
 
 namespace platform {
 namespace {

@@ -4,13 +4,14 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "platform/text/ASCII.h"
+
 namespace platform {
 
 namespace {
 
 constexpr std::string_view kAlphabet =
     "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-constexpr std::string_view kWhitespace = " \t\r\n";
 
 constexpr std::uint8_t kForeign = 0xFF;
 constexpr std::uint8_t kIgnored = 0xFE;

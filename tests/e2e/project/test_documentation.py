@@ -204,7 +204,7 @@ def headings(document):
 
 class ManualPageTest(unittest.TestCase):
     # Where a message is made: the driver's failures, errors and progress, and the end of a process without memory.
-    MAKER = re.compile(r"\b(?:fail|fillSlot|QELError|QELProgress|writeToStandardError)\([^;]*;")
+    MAKER = re.compile(r"\b(?:fail|fillSlot|leftOut|QELError|QELProgress|writeToStandardError)\([^;]*;")
     # The texts in there that are more than a mark, such as "W", or a part of another, such as "podcast".
     MESSAGE = re.compile(r'"((?:[A-Z-]|\\")(?:[^"\\]|\\.)+)"')
     PLACE = re.compile(r"%(?:@|s|lu|0\.1f)")
