@@ -66,10 +66,6 @@ struct DirectoryCloser {
   void operator()(DIR* directory) const { ::closedir(directory); }
 };
 
-int moveReplacing(const char* from, const char* to) {
-  return ::rename(from, to);
-}
-
 int moveNew(const char* from, const char* to) {
   if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) return 0;
   if (errno != EINVAL && errno != ENOSYS) return -1;
@@ -130,19 +126,14 @@ class TemporaryFile::Registry {
     *link = std::exchange(file.next_, nullptr);
   }
 
-  [[noreturn]] static void removeAllAndExit(int status) {
-    const Hold hold;
-    unlinkAll();
-    ::_exit(status);
-  }
-
- private:
+  /// Only while the list is held.
   static void unlinkAll() {
     for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
       ::unlink(file->path_.c_str());
     }
   }
 
+ private:
   static void acquire() {
     while (busy_.test_and_set(std::memory_order_acquire)) {
     }
@@ -216,7 +207,7 @@ bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
 }
 
 bool TemporaryFile::commitReplacing(ErrorSlot& error) {
-  return commit(&moveReplacing, error);
+  return commit(&::rename, error);
 }
 
 bool TemporaryFile::commitNew(ErrorSlot& error) {
@@ -238,7 +229,9 @@ bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorS
 }
 
 void TemporaryFile::removeAllAndExit(int status) {
-  Registry::removeAllAndExit(status);
+  const Registry::Hold hold;
+  Registry::unlinkAll();
+  ::_exit(status);
 }
 
 void TemporaryFile::discard() {
@@ -259,7 +252,6 @@ bool isTemporaryFileName(std::string_view name) {
 }
 
 void removeStaleTemporaryFiles(const std::string& directory) {
-  // Not by <filesystem>, which ends the process where it gets no memory.
   const std::string parent = directory.empty() ? "." : directory;
   const std::unique_ptr<DIR, DirectoryCloser> entries(::opendir(parent.c_str()));
   if (!entries) return;

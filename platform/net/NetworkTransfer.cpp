@@ -188,14 +188,6 @@ bool NetworkTransfer::isInHeader() const {
   return firstByteTime > 0 && !begun_;
 }
 
-std::optional<std::string> NetworkTransfer::headerValue(const char* name) const {
-  curl_header* header = nullptr;
-  if (library().easyHeader(handle_.get(), name, 0, CURLH_HEADER, -1, &header) != CURLHE_OK) {
-    return std::nullopt;
-  }
-  return header->value;
-}
-
 bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
   headerSize_ += line.size();
   if (headerSize_ > kHeaderLimit) {
@@ -218,8 +210,10 @@ bool NetworkTransfer::didReceiveHeader() {
   if (status != 200) return true;
   begun_ = true;
   const std::optional<std::uint64_t> length = framing_.length();
+  curl_header* coding = nullptr;
+  library().easyHeader(handle_.get(), "Content-Encoding", 0, CURLH_HEADER, -1, &coding);
   return sink_.begin(length ? static_cast<std::int64_t>(*length) : -1,
-                     headerValue("Content-Encoding").value_or(""), error_);
+                     coding != nullptr ? coding->value : "", error_);
 }
 
 bool NetworkTransfer::didReceiveBody(std::string_view bytes) {

@@ -61,8 +61,6 @@ class NetworkTransfer {
   int status() const;
   /// Whether the end came before the body, but not before the first byte of the answer.
   bool isInHeader() const;
-  /// Of the final response so far; absent when it has no such header.
-  std::optional<std::string> headerValue(const char* name) const;
   bool didReceiveHeaderLine(std::string_view line);
   bool didReceiveHeader();
   bool didReceiveBody(std::string_view bytes);
