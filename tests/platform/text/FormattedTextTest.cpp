@@ -20,9 +20,9 @@ TEST(FormattedTextTest, InsertsTexts) {
 }
 
 TEST(FormattedTextTest, InsertsNullForAbsentTextsAndMissingArguments) {
-  const std::optional<platform::Text> absent;
+  const platform::OptionalText absent;
   EXPECT_EQ(formattedText("<%@>", {absent}), "<(null)>");
-  EXPECT_EQ(formattedText("<%@>", {std::optional<platform::Text>("x")}), "<x>");
+  EXPECT_EQ(formattedText("<%@>", {platform::OptionalText("x")}), "<x>");
   EXPECT_EQ(formattedText("%@ %s %ld %lu %0.1f", {}), "(null) (null) (null) (null) (null)");
 }
 
