@@ -3,6 +3,7 @@
 #include <dlfcn.h>
 
 #include <type_traits>
+#include <utility>
 
 #include "platform/text/Memory.h"
 
@@ -14,10 +15,14 @@ constexpr const char* kFile = "libcurl.so.4";
 
 ErrorRecord loadingError() {
   const char* const cause = dlerror();
-  return {"transfer", CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded"};
+  return transferError(CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded");
 }
 
 }  // namespace
+
+ErrorRecord transferError(CURLcode code, std::string description) {
+  return {"transfer", code, std::move(description)};
+}
 
 TransferLibrary::TransferLibrary() {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
@@ -51,7 +56,7 @@ TransferLibrary::TransferLibrary() {
   const CURLcode result =
       globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
                  &Memory::duplicate, &Memory::allocateZeroed);
-  if (result != CURLE_OK) error_ = {"transfer", result, easyStrerror(result)};
+  if (result != CURLE_OK) error_ = transferError(result, easyStrerror(result));
 }
 
 const TransferLibrary& TransferLibrary::instance() {
