@@ -3,9 +3,11 @@
 #include <dlfcn.h>
 
 #include <type_traits>
+#include <utility>
+
+#include "platform/text/Memory.h"
 
 namespace platform {
-
 namespace {
 
 /// The file of the only binary interface that the library has had since 2006.
@@ -13,10 +15,14 @@ constexpr const char* kFile = "libcurl.so.4";
 
 ErrorRecord loadingError() {
   const char* const cause = dlerror();
-  return {"transfer", CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded"};
+  return transferError(CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded");
 }
 
 }  // namespace
+
+ErrorRecord transferError(CURLcode code, std::string description) {
+  return {"transfer", code, std::move(description)};
+}
 
 TransferLibrary::TransferLibrary() {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
@@ -29,7 +35,7 @@ TransferLibrary::TransferLibrary() {
     function = reinterpret_cast<std::decay_t<decltype(function)>>(dlsym(library, name));
     if (function == nullptr && !error_) error_ = loadingError();
   };
-  find(globalInit, "curl_global_init");
+  find(globalInit, "curl_global_init_mem");
   find(easyInit, "curl_easy_init");
   find(easyCleanup, "curl_easy_cleanup");
   find(easySetopt, "curl_easy_setopt");
@@ -46,6 +52,11 @@ TransferLibrary::TransferLibrary() {
   find(url, "curl_url");
   find(urlCleanup, "curl_url_cleanup");
   find(urlSet, "curl_url_set");
+  if (error_) return;
+  const CURLcode result =
+      globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
+                 &Memory::duplicate, &Memory::allocateZeroed);
+  if (result != CURLE_OK) error_ = transferError(result, easyStrerror(result));
 }
 
 const TransferLibrary& TransferLibrary::instance() {
