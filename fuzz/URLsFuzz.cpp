@@ -69,8 +69,8 @@ void requireSafe(const std::string& name) {
 /// The names of one bundle's media and posters.
 class Bundle {
  public:
-  void add(const platform::Text& location, const std::optional<platform::Text>& referenceType) {
-    const std::optional<std::string> name = QELFileName(location, referenceType);
+  void add(const platform::Text& location, const platform::OptionalText& referenceType) {
+    const std::optional<std::string> name = QELFileName({location, referenceType});
     if (!name) return;
     const std::string base = ledger_.reserve(QELBaseName(*name));
     requireThat(bases_.insert(base).second, "a base name is given out once");

@@ -3,11 +3,11 @@
 #include <algorithm>
 #include <climits>
 #include <cstddef>
-#include <exception>
+#include <list>
+#include <mutex>
 #include <utility>
 #include <vector>
 
-#include "platform/net/PerThread.h"
 #include "platform/net/TransferLibrary.h"
 
 namespace platform {
@@ -27,7 +27,6 @@ constexpr std::uint64_t kHeaderLimit = std::uint64_t{1} * 1024 * 1024;
 
 static_assert(static_cast<int>(TransferErrorCode::kUnsupportedScheme) ==
               CURLE_UNSUPPORTED_PROTOCOL);
-static_assert(static_cast<int>(TransferErrorCode::kOutOfMemory) == CURLE_OUT_OF_MEMORY);
 static_assert(static_cast<int>(TransferErrorCode::kBadContentEncoding) ==
               CURLE_BAD_CONTENT_ENCODING);
 static_assert(static_cast<int>(TransferErrorCode::kTooLarge) == CURLE_FILESIZE_EXCEEDED);
@@ -48,10 +47,6 @@ const TransferLibrary& library() {
   return *TransferLibrary::functions();
 }
 
-ErrorRecord outOfMemory() {
-  return transferError(TransferErrorCode::kOutOfMemory, "Out of memory");
-}
-
 }  // namespace
 
 ErrorRecord transferError(TransferErrorCode code, std::string description) {
@@ -61,13 +56,24 @@ ErrorRecord transferError(TransferErrorCode code, std::string description) {
 /// The connections of one thread, and its transfers that are running.
 class NetworkTransfer::Connections {
  public:
-  static Connections& ofThisThread() { return PerThread<Connections>::value(); }
+  /// They end with the process. To end them with their thread, the C library would have to take
+  /// note of that, and aborts the process where it has no memory to.
+  static Connections& ofThisThread() {
+    library();  // what it set up ends behind the connections, as it began before them
+    static std::mutex mutex;
+    static std::list<Connections> ofAllThreads;
+    static thread_local Connections* ofThread = nullptr;
+    if (ofThread == nullptr) {
+      const std::lock_guard lock(mutex);
+      ofThread = &ofAllThreads.emplace_back();
+    }
+    return *ofThread;
+  }
 
   CURLcode add(NetworkTransfer& transfer) {
-    if (!handle_) return libraryState() == CURLE_OK ? CURLE_OUT_OF_MEMORY : libraryState();
     running_.push_back(&transfer);
     const CURLMcode code = library().multiAddHandle(handle_.get(), transfer.handle_.get());
-    return code == CURLM_OK ? CURLE_OK : CURLE_OUT_OF_MEMORY;
+    return code == CURLM_OK ? CURLE_OK : CURLE_FAILED_INIT;
   }
 
   void remove(NetworkTransfer& transfer) {
@@ -81,8 +87,7 @@ class NetworkTransfer::Connections {
     CURLMcode code = library().multiPoll(handle_.get(), nullptr, 0, INT_MAX, nullptr);
     if (code == CURLM_OK) code = library().multiPerform(handle_.get(), &count);
     if (code != CURLM_OK) {
-      const CURLcode result = code == CURLM_OUT_OF_MEMORY ? CURLE_OUT_OF_MEMORY : CURLE_FAILED_INIT;
-      while (!running_.empty()) running_.back()->end(result);
+      while (!running_.empty()) running_.back()->end(CURLE_FAILED_INIT);
       return true;
     }
     while (const CURLMsg* message = library().multiInfoRead(handle_.get(), &count)) {
@@ -100,15 +105,7 @@ class NetworkTransfer::Connections {
     void operator()(CURLM* handle) const { library().multiCleanup(handle); }
   };
 
-  // What the library sets up once costs milliseconds, which only a run with transfers pays.
-  static CURLcode libraryState() {
-    static const CURLcode state = library().globalInit(CURL_GLOBAL_DEFAULT);
-    return state;
-  }
-
-  static CURLM* newHandle() { return libraryState() == CURLE_OK ? library().multiInit() : nullptr; }
-
-  std::unique_ptr<CURLM, Closer> handle_{newHandle()};
+  std::unique_ptr<CURLM, Closer> handle_{library().multiInit()};
   std::vector<NetworkTransfer*> running_;
 };
 
@@ -141,8 +138,6 @@ NetworkTransfer::~NetworkTransfer() {
 
 int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
   handle_.reset(library().easyInit());
-  if (!handle_) return CURLE_OUT_OF_MEMORY;
-
   CURLcode result = CURLE_OK;
   const auto set = [this, &result](CURLoption option, auto value) {
     if (result == CURLE_OK) result = library().easySetopt(handle_.get(), option, value);
@@ -200,9 +195,8 @@ void NetworkTransfer::end(int resultCode) {
     error_ =
         transferError(TransferErrorCode::kTooLarge, "The page of a redirect is larger than 16 MiB");
   } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
-    // The library says the same of a line beyond its limit.
-    error_ = {"transfer", result,
-              "A line of the answer's header is too long, or memory has run out"};
+    // What the library says of a line beyond its limit.
+    error_ = {"transfer", result, "A line of the answer's header is too long"};
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
     error_ = {"transfer", result,
@@ -259,23 +253,13 @@ bool NetworkTransfer::didReceiveBody(std::string_view bytes) {
 std::size_t NetworkTransfer::headerCallback(char* bytes, std::size_t size, std::size_t count,
                                             void* self) {
   auto& transfer = *static_cast<NetworkTransfer*>(self);
-  try {
-    return transfer.didReceiveHeaderLine({bytes, size * count}) ? size * count : 0;
-  } catch (const std::exception&) {
-    transfer.error_ = outOfMemory();
-    return 0;
-  }
+  return transfer.didReceiveHeaderLine({bytes, size * count}) ? size * count : 0;
 }
 
 std::size_t NetworkTransfer::bodyCallback(char* bytes, std::size_t size, std::size_t count,
                                           void* self) {
   auto& transfer = *static_cast<NetworkTransfer*>(self);
-  try {
-    return transfer.didReceiveBody({bytes, size * count}) ? size * count : 0;
-  } catch (const std::exception&) {
-    transfer.error_ = outOfMemory();
-    return 0;
-  }
+  return transfer.didReceiveBody({bytes, size * count}) ? size * count : 0;
 }
 
 bool NetworkTransfer::runAll() {

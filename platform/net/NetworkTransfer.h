@@ -16,7 +16,6 @@ namespace platform {
 /// The codes of the domain "transfer" (those of the transfer library) that others use as well.
 enum class TransferErrorCode : std::int64_t {
   kUnsupportedScheme = 1,
-  kOutOfMemory = 27,
   kBadContentEncoding = 61,
   kTooLarge = 63,
 };
@@ -33,8 +32,7 @@ ErrorRecord transferError(TransferErrorCode code, std::string description);
 /// running transfer cancels it; not from within its sink.
 class NetworkTransfer {
  public:
-  /// Takes the answer as it comes. Returning false with an error fails the transfer. Exceptions of
-  /// the standard library may pass.
+  /// Takes the answer as it comes. Returning false with an error fails the transfer.
   class Sink {
    public:
     virtual ~Sink() = default;

@@ -7,8 +7,9 @@
 #include <type_traits>
 #include <utility>
 
-namespace platform {
+#include "platform/text/Memory.h"
 
+namespace platform {
 namespace {
 
 /// The file of the only binary interface that the library has had since 2006.
@@ -39,7 +40,7 @@ TransferLibrary::TransferLibrary() {
     function = reinterpret_cast<std::decay_t<decltype(function)>>(dlsym(library, name));
     if (function == nullptr && !error_) error_ = loadingError();
   };
-  find(globalInit, "curl_global_init");
+  find(globalInit, "curl_global_init_mem");
   find(easyInit, "curl_easy_init");
   find(easyCleanup, "curl_easy_cleanup");
   find(easySetopt, "curl_easy_setopt");
@@ -56,6 +57,11 @@ TransferLibrary::TransferLibrary() {
   find(url, "curl_url");
   find(urlCleanup, "curl_url_cleanup");
   find(urlSet, "curl_url_set");
+  if (error_) return;
+  const CURLcode result =
+      globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
+                 &Memory::duplicate, &Memory::allocateZeroed);
+  if (result != CURLE_OK) error_ = {"transfer", result, easyStrerror(result)};
 }
 
 const TransferLibrary& TransferLibrary::instance() {

@@ -8,10 +8,8 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
-#include <new>
 
 #include "platform/net/TransferLibrary.h"
-#include "platform/text/ICUMemory.h"
 
 namespace platform {
 namespace {
@@ -162,20 +160,17 @@ bool equalIgnoringCase(std::string_view left, std::string_view right) {
 /// ICU takes it as the UTF-8 that it is.
 std::optional<std::string> hostInASCII(std::string_view host) {
   if (std::all_of(host.begin(), host.end(), isASCII)) return std::string(host);
-  prepareICUMemory();
   UErrorCode status = U_ZERO_ERROR;
   const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
                       &status),
       &uidna_close);
-  requireICUMemory();
   if (U_FAILURE(status) != 0) return std::nullopt;
   std::array<char, 256> ascii{};  // a longer name is an error anyway
   UIDNAInfo info = UIDNA_INFO_INITIALIZER;
   const std::int32_t length =
       uidna_nameToASCII_UTF8(converter.get(), host.data(), static_cast<std::int32_t>(host.size()),
                              ascii.data(), static_cast<std::int32_t>(ascii.size()), &info, &status);
-  requireICUMemory();
   if (U_FAILURE(status) != 0 || info.errors != 0) return std::nullopt;
   // Some characters become ASCII ones: a full-width "/" would end the host where the text goes on.
   const std::string_view name(ascii.data(), static_cast<std::size_t>(length));
@@ -204,10 +199,7 @@ bool isAcceptedByTransferLibrary(const std::string& encodedText) {
   if (library == nullptr) return true;  // the transfer will tell what is wrong
   const std::unique_ptr<CURLU, decltype(library->urlCleanup)> handle(library->url(),
                                                                      library->urlCleanup);
-  if (handle == nullptr) throw std::bad_alloc();
-  const CURLUcode result = library->urlSet(handle.get(), CURLUPART_URL, encodedText.c_str(), 0);
-  if (result == CURLUE_OUT_OF_MEMORY) throw std::bad_alloc();
-  return result == CURLUE_OK;
+  return library->urlSet(handle.get(), CURLUPART_URL, encodedText.c_str(), 0) == CURLUE_OK;
 }
 
 }  // namespace

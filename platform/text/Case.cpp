@@ -11,7 +11,6 @@
 #include <limits>
 
 #include "platform/text/ASCII.h"
-#include "platform/text/ICUMemory.h"
 
 namespace platform {
 namespace {
@@ -22,7 +21,6 @@ using CaseMapping = void (*)(const char*, std::uint32_t, icu::StringPiece, icu::
 std::string caseMapped(std::string_view text, CaseMapping mapping) {
   // ICU counts in 32 bits and lets the result grow to three times the text.
   constexpr std::size_t kPieceLimit = std::numeric_limits<std::int32_t>::max() / 4;
-  prepareICUMemory();
   std::string result;
   result.reserve(text.size());
   icu::StringByteSink<std::string> sink(&result);
@@ -38,7 +36,6 @@ std::string caseMapped(std::string_view text, CaseMapping mapping) {
             status);
     text.remove_prefix(length);
   }
-  requireICUMemory();
   return result;
 }
 

@@ -4,7 +4,7 @@
 
 namespace platform {
 
-std::int32_t nextCharacter(std::string_view text, std::size_t& position) {
+std::int32_t nextNonASCIICharacter(std::string_view text, std::size_t& position) {
   const char* bytes = text.data();
   UChar32 character = 0;
 #pragma GCC diagnostic push

@@ -4,13 +4,20 @@
 #include <cstdint>
 #include <string_view>
 
+#include "platform/text/ASCII.h"
+
 namespace platform {
 
 /// Characters here are Unicode code points of UTF-8; a malformed sequence counts as one.
 
+/// The part of nextCharacter that few texts need.
+std::int32_t nextNonASCIICharacter(std::string_view text, std::size_t& position);
+
 /// Takes the character at `position`, which is inside the text, and moves behind it. Negative for a
 /// malformed sequence, of which as much is passed over as one replacement character stands for.
-std::int32_t nextCharacter(std::string_view text, std::size_t& position);
+inline std::int32_t nextCharacter(std::string_view text, std::size_t& position) {
+  return isASCII(text[position]) ? text[position++] : nextNonASCIICharacter(text, position);
+}
 
 std::size_t characterCount(std::string_view text);
 

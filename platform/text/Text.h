@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <memory>
+#include <optional>
 #include <ostream>
 #include <string>
 #include <string_view>
@@ -14,7 +15,12 @@ namespace platform {
 /// The texts of a podcast pass from the parser to a record to an output dictionary, and are often
 /// megabytes long; a copy of a Text is a copy of a handle. Since the characters never change, a
 /// Text that was handed out stays valid and unchanged whatever its source does later, on any
-/// thread. An absent text is a std::optional<Text> without a value, distinct from an empty Text.
+/// thread.
+///
+///     const Text title("The Long Way Round");  // copies the characters, once
+///     const Text same = title;                 // copies no character
+///     const Text key = "PodcastName"_text;     // a literal's characters are never copied
+///     if (title == "The Long Way Round") takesAView(title);  // a Text converts to string_view
 class Text {
  public:
   /// The empty text.
@@ -71,6 +77,9 @@ class Text {
   std::size_t size_ = 0;
   // NOLINTEND(modernize-avoid-c-arrays)
 };
+
+/// A text that may be absent, which is not the same as empty.
+using OptionalText = std::optional<Text>;
 
 /// The text of a literal ("title"_text): nothing is copied or counted, since literals last.
 inline Text operator""_text(const char* bytes, std::size_t size) {

@@ -216,7 +216,7 @@ class InputTest(SpecialFileTestCase):
                     self.assertEqual(self.files(), {"one.mp3": MEDIA, **posters})
 
     def test_as_standard_input(self):
-        """Standard input is read whatever it is, to its end, to an error or to the limit of the memory."""
+        """Standard input is read whatever it is, to its end, to an error or until the memory runs out."""
         whole = plistlib.dumps(PODCAST)
         reader, writer = socket.socketpair()
         writer.sendall(whole)
@@ -224,28 +224,29 @@ class InputTest(SpecialFileTestCase):
         file = tempfile.TemporaryFile()
         file.write(whole)
         file.seek(0)
-        inputs = [("a file", file.fileno(), True),
-                  ("a socket", reader.fileno(), True),
-                  ("a directory", os.open(self.directory, os.O_RDONLY), False),
-                  ("/dev/null", os.open("/dev/null", os.O_RDONLY), False),
-                  ("a file that may only be written", os.open(self.path("out"), os.O_WRONLY | os.O_CREAT), False)]
+        unusable, exhausting = '"(null)" is not a valid podcast source.\n', "Out of memory.\n"
+        inputs = [("a file", file.fileno(), None),
+                  ("a socket", reader.fileno(), None),
+                  ("a directory", os.open(self.directory, os.O_RDONLY), unusable),
+                  ("/dev/null", os.open("/dev/null", os.O_RDONLY), unusable),
+                  ("a file that may only be written", os.open(self.path("out"), os.O_WRONLY | os.O_CREAT), unusable)]
         if is_sanitized():
             print("without /dev/zero and /dev/full: sanitizers end a process whose memory runs out")
         else:
-            inputs += [("/dev/zero", os.open("/dev/zero", os.O_RDONLY), False),
-                       ("/dev/full", os.open("/dev/full", os.O_RDONLY), False)]
+            inputs += [("/dev/zero", os.open("/dev/zero", os.O_RDONLY), exhausting),
+                       ("/dev/full", os.open("/dev/full", os.O_RDONLY), exhausting)]
         limit = "unlimited" if is_sanitized() else MEMORY >> 10
         prefix = unprivileged(self.directory)
-        for name, descriptor, is_read in inputs:
+        for name, descriptor, failure in inputs:
             with self.subTest(name):
                 finished = subprocess.run(
                     ["/bin/sh", "-c", f'ulimit -v {limit} && exec "$0" "$@"', *prefix, tool(), "parsefeed", "-i"],
                     stdin=descriptor, env=environment(), capture_output=True, timeout=60, check=False)
                 result = checked((name,), finished.returncode, finished.stdout, finished.stderr)
-                if is_read:
+                if failure is None:
                     self.assertRead(result)
                 else:
-                    self.assertFails(result, '"(null)" is not a valid podcast source.\n')
+                    self.assertFails(result, failure)
             self.rows += 1
         for _, descriptor, _ in inputs[2:]:
             os.close(descriptor)

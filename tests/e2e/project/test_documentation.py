@@ -205,8 +205,8 @@ def headings(document):
 
 
 class ManualPageTest(unittest.TestCase):
-    # Where a message is made: the driver's failures, errors and progress.
-    MAKER = re.compile(r"\b(?:fail|fillSlot|QELError|QELProgress)\([^;]*;")
+    # Where a message is made: the driver's failures, errors and progress, and the end of a process without memory.
+    MAKER = re.compile(r"\b(?:fail|fillSlot|leftOut|QELError|QELProgress|writeToStandardError)\([^;]*;")
     # The texts in there that are more than a mark, such as "W", or a part of another, such as "podcast".
     MESSAGE = re.compile(r'"((?:[A-Z-]|\\")(?:[^"\\]|\\.)+)"')
     PLACE = re.compile(r"%(?:@|s|lu|0\.1f)")
@@ -214,7 +214,7 @@ class ManualPageTest(unittest.TestCase):
     def messages(self):
         """The messages of the sources, as patterns; what others say may stand before one."""
         found = set()
-        for folder in ("cli", "model", "sources", "generators"):
+        for folder in ("cli", "model", "sources", "generators", "platform/files"):
             for source in (ROOT / folder).glob("*.cpp"):
                 for maker in self.MAKER.findall(source.read_text(encoding="utf-8")):
                     found |= set(self.MESSAGE.findall(maker))

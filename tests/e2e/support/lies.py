@@ -146,7 +146,8 @@ UNFRAMED = Cause("The header does not tell where the body ends")
 TRANSFER_CODING = Cause("The body comes in a transfer coding that was not asked for")
 CONTENT_CODING = Cause("The body comes in a content coding that was not asked for")
 CUT_HEADER = Cause("The header of the answer is cut short")
-LONG_LINE = Cause("A line of the answer's header is too long, or memory has run out")
+LONG_LINE = Cause("A line of the answer's header is too long")
+OUT_OF_MEMORY = Cause("Out of memory.")
 CUT_STREAM = Cause("The compressed body is cut short")
 BAD_STREAM = Cause("The compressed body is malformed")
 EMPTY = Cause("Could not load or read the specified feed URL")
@@ -360,7 +361,7 @@ LIES = {
         Lie("a host that does not exist", At(lambda servers, path: f"http://nowhere.invalid{path}"),
             LibraryCause("Could not resolve host: nowhere.invalid")),
         Lie("an endless body; media may be of any size", endless(answer(body=b""), b"x" * (1 << 20)),
-            Cause("Out of memory"), NOT_ASKED),
+            OUT_OF_MEMORY, NOT_ASKED),
     ),
     "TLS": (
         Lie("a good certificate", tls("good")),

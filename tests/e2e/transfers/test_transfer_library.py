@@ -41,7 +41,7 @@ class TransferLibraryTest(ToolTestCase):
     def test_a_library_without_the_functions(self):
         os.symlink(other_library(), self.path(FILE))
         result = self.run_tool("parsefeed", self.web.url("/feed.xml"), env=self.env)
-        self.assertLoadFails(result, r".*undefined symbol: curl_global_init")
+        self.assertLoadFails(result, r".*undefined symbol: curl_global_init_mem")
 
     def test_remote_media_are_skipped_without_the_library(self):
         self.write(FILE, "no library")

@@ -1,3 +1,5 @@
+#include "model/QELFetcher.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdio>
@@ -14,9 +16,9 @@ namespace {
 using platform::Text;
 
 /// Fetches through the records that receive the downloads' events, and what they print of it.
-class QELFetchTest : public testing::Test {
+class QELFetcherTest : public testing::Test {
  protected:
-  QELFetchTest() : file_(directory_.addFile("file", "content")), target_(directory_ / "target") {
+  QELFetcherTest() : file_(directory_.addFile("file", "content")), target_(directory_ / "target") {
     QELShouldReportProgress = true;
     podcast_.setTitle("P");
     episode_->setTitle("E");
@@ -52,14 +54,14 @@ class QELFetchTest : public testing::Test {
   std::shared_ptr<QELEpisode> episode_ = QELEpisode::episode();
 };
 
-TEST_F(QELFetchTest, WithoutLocationNothingIsFetched) {
+TEST_F(QELFetcherTest, WithoutLocationNothingIsFetched) {
   episode_->setReferenceType("remote");
   EXPECT_EQ(saveEpisode(false), "");
   EXPECT_EQ(saveEpisodePoster(false), "");
   EXPECT_EQ(savePodcastPoster(false), "");
 }
 
-TEST_F(QELFetchTest, AnythingButRemoteIsCopied) {
+TEST_F(QELFetcherTest, AnythingButRemoteIsCopied) {
   for (const std::optional<Text>& type :
        {std::optional<Text>("local"), std::optional<Text>("Remote"), std::optional<Text>(),
         std::optional<Text>("")}) {
@@ -76,7 +78,7 @@ TEST_F(QELFetchTest, AnythingButRemoteIsCopied) {
   EXPECT_EQ(server_.connections(), 0);
 }
 
-TEST_F(QELFetchTest, CopyDoesNotOverwriteAndDownloadDoes) {
+TEST_F(QELFetcherTest, CopyDoesNotOverwriteAndDownloadDoes) {
   directory_.addFile("target", "earlier");
   episode_->setLocation(Text(file_));
   episode_->setReferenceType("local");
@@ -90,7 +92,7 @@ TEST_F(QELFetchTest, CopyDoesNotOverwriteAndDownloadDoes) {
   EXPECT_EQ(contentOf(target_), "content");
 }
 
-TEST_F(QELFetchTest, RemoteLocationThatIsNoURLFailsSilently) {
+TEST_F(QELFetcherTest, RemoteLocationThatIsNoURLFailsSilently) {
   for (const char* location : {"http://a b/", "nothing", ""}) {
     episode_->setLocation(location);
     episode_->setReferenceType("remote");
@@ -101,7 +103,7 @@ TEST_F(QELFetchTest, RemoteLocationThatIsNoURLFailsSilently) {
   }
 }
 
-TEST_F(QELFetchTest, FailedDownloadPrintsItsNoticeOnly) {
+TEST_F(QELFetcherTest, FailedDownloadPrintsItsNoticeOnly) {
   directory_.addFile("target", "earlier");
   episode_->setContentLength(7);
   episode_->setLocation(Text(server_.url("/missing")));
@@ -117,7 +119,7 @@ TEST_F(QELFetchTest, FailedDownloadPrintsItsNoticeOnly) {
   EXPECT_EQ(contentOf(target_), "earlier");
 }
 
-TEST_F(QELFetchTest, NoticeShowsTheSizeKnownBeforeAndTheCounterTheAnnouncedOne) {
+TEST_F(QELFetcherTest, NoticeShowsTheSizeKnownBeforeAndTheCounterTheAnnouncedOne) {
   server_.serve("/media", HTTPTestServer::response("12345"));
   episode_->setContentLength(77);
   episode_->setLocation(Text(server_.url("/media")));
@@ -127,7 +129,7 @@ TEST_F(QELFetchTest, NoticeShowsTheSizeKnownBeforeAndTheCounterTheAnnouncedOne) 
   EXPECT_EQ(episode_->contentLength(), 5U);
 }
 
-TEST_F(QELFetchTest, UnknownLengthsLeaveTheCounterOut) {
+TEST_F(QELFetcherTest, UnknownLengthsLeaveTheCounterOut) {
   server_.serve("/media", [](HTTPTestServer::Connection& connection) {
     connection.send("HTTP/1.1 200 OK\r\n\r\n12345");
     connection.close();
@@ -144,7 +146,7 @@ TEST_F(QELFetchTest, UnknownLengthsLeaveTheCounterOut) {
   EXPECT_EQ(episode_->contentLength(), 2U);
 }
 
-TEST_F(QELFetchTest, SizeOfAPosterReplacesTheEpisodesWithoutACounter) {
+TEST_F(QELFetcherTest, SizeOfAPosterReplacesTheEpisodesWithoutACounter) {
   server_.serve("/poster", HTTPTestServer::response("123"));
   episode_->setContentLength(77);
   episode_->setPosterLocation(Text(server_.url("/poster")));
@@ -153,7 +155,7 @@ TEST_F(QELFetchTest, SizeOfAPosterReplacesTheEpisodesWithoutACounter) {
   EXPECT_EQ(episode_->contentLength(), 3U);
 }
 
-TEST_F(QELFetchTest, PodcastPosterIsDownloaded) {
+TEST_F(QELFetcherTest, PodcastPosterIsDownloaded) {
   server_.serve("/poster", HTTPTestServer::response("123"));
   podcast_.setPosterLocation(Text(server_.url("/poster")));
   podcast_.setPosterReferenceType("remote");
