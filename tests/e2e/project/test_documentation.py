@@ -18,7 +18,8 @@ from support import ToolTestCase, environment, has_gnu_parallel, tool
 
 ROOT = Path(__file__).resolve().parents[3]
 MANUAL_PAGE = ROOT / "docs" / "qel.1"
-PAGES = [ROOT / "README.md", *sorted((ROOT / "docs").glob("*.md"))]
+INSTALLED_README = ROOT / "packaging" / "installed-readme.md"
+PAGES = [ROOT / "README.md", INSTALLED_README, *sorted((ROOT / "docs").glob("*.md"))]
 DOCUMENTS = [*PAGES, MANUAL_PAGE]
 FLEET = ROOT / "docs" / "fleet.md"
 
@@ -177,7 +178,7 @@ class DocumentationTest(ToolTestCase):
     def test_commands_work_as_typed(self):
         counts = {document.name: self.check_commands(document) for document in DOCUMENTS if document != FLEET}
         # A document without such a block would pass unread.
-        for name in ("README.md", "bundle.md", "feeds.md", "reference-file.md", MANUAL_PAGE.name):
+        for name in ("README.md", INSTALLED_README.name, "bundle.md", "feeds.md", "reference-file.md", MANUAL_PAGE.name):
             self.assertGreater(counts[name], 0, name)
 
     @unittest.skipUnless(has_gnu_parallel(), "GNU parallel is not installed")
@@ -189,7 +190,8 @@ class DocumentationTest(ToolTestCase):
         for document in [*PAGES, ROOT / "CONTRIBUTING.md"]:
             for path, heading in link.findall(document.read_text(encoding="utf-8")):
                 with self.subTest(document=document.name, link=f"{path}#{heading}"):
-                    target = (document.parent / path).resolve() if path else document
+                    folder = ROOT if document == INSTALLED_README else document.parent
+                    target = (folder / path).resolve() if path else document
                     self.assertTrue(target.exists())
                     if heading:
                         self.assertIn(heading, headings(target))
