@@ -2,7 +2,10 @@
 
 #include <dlfcn.h>
 
+#include <string>
+#include <string_view>
 #include <type_traits>
+#include <utility>
 
 #include "platform/text/Memory.h"
 
@@ -14,10 +17,21 @@ constexpr const char* kFile = "libcurl.so.4";
 
 ErrorRecord loadingError() {
   const char* const cause = dlerror();
-  return {"transfer", CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded"};
+  std::string description = cause != nullptr ? cause : "libcurl cannot be loaded";
+  // A file that was found is called by its whole path.
+  if (std::string_view(description).starts_with(kFile)) {
+    description +=
+        "; http and https need it: install the package libcurl4 (Debian, Ubuntu) or libcurl "
+        "(Fedora)";
+  }
+  return transferError(CURLE_FAILED_INIT, std::move(description));
 }
 
 }  // namespace
+
+ErrorRecord transferError(CURLcode code, std::string description) {
+  return {"transfer", code, std::move(description)};
+}
 
 TransferLibrary::TransferLibrary() {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
@@ -51,7 +65,7 @@ TransferLibrary::TransferLibrary() {
   const CURLcode result =
       globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
                  &Memory::duplicate, &Memory::allocateZeroed);
-  if (result != CURLE_OK) error_ = {"transfer", result, easyStrerror(result)};
+  if (result != CURLE_OK) error_ = transferError(result, easyStrerror(result));
 }
 
 const TransferLibrary& TransferLibrary::instance() {

@@ -7,7 +7,6 @@
 #include "platform/text/ASCII.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kAlphabet =
@@ -20,8 +19,9 @@ constexpr std::array<std::uint8_t, 256> kSextets = [] {
   std::array<std::uint8_t, 256> sextets{};
   sextets.fill(kForeign);
   for (const char c : kWhitespace) sextets[static_cast<unsigned char>(c)] = kIgnored;
-  for (std::size_t i = 0; i < kAlphabet.size(); ++i)
+  for (std::size_t i = 0; i < kAlphabet.size(); ++i) {
     sextets[static_cast<unsigned char>(kAlphabet[i])] = static_cast<std::uint8_t>(i);
+  }
   return sextets;
 }();
 
@@ -44,8 +44,9 @@ std::optional<std::string> bytesFromBase64(std::string_view text) {
     bits = bits << 6 | sextet;
     ++characters;
     // Every character but the first of a group of four completes a byte.
-    if (const std::size_t place = characters % 4; place != 1)
+    if (const std::size_t place = characters % 4; place != 1) {
       bytes += static_cast<char>(bits >> ((4 - place) % 4 * 2) & 0xFF);
+    }
   }
   if (padding > 2 || (characters + padding) % 4 != 0) return std::nullopt;
   return bytes;
