@@ -18,11 +18,10 @@ class QELSourceResolutionTest : public testing::Test {
 constexpr const char* kReferenceFile = "<plist version=\"1.0\"><dict/></plist>";
 
 TEST_F(QELSourceResolutionTest, Validation) {
-  struct Row {
+  const struct {
     std::optional<std::string_view> source;
     bool valid;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {"http://a.example/feed", true},
       {"https://a.example", true},
       {"pcast://a.example/feed", true},
@@ -42,7 +41,7 @@ TEST_F(QELSourceResolutionTest, Validation) {
       {"", true},
       {std::nullopt, false},
   };
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     EXPECT_EQ(QELValidateSource(row.source, false), row.valid) << row.source.value_or("(absent)");
   }
 }
