@@ -2,7 +2,6 @@
 
 #include <initializer_list>
 #include <memory>
-#include <new>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -10,7 +9,6 @@
 #include <vector>
 
 #include "cli/QELSourceResolution.h"
-#include "cli/common/QELError.h"
 #include "cli/common/QELProgress.h"
 #include "generators/QELBundlePodcastGenerator.h"
 #include "generators/QELFeedPodcastGenerator.h"
@@ -18,8 +16,8 @@
 #include "platform/files/Paths.h"
 #include "platform/files/StandardStreams.h"
 #include "platform/plist/PropertyListWriter.h"
+#include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
-#include "platform/text/TextHelpers.h"
 
 namespace {
 
@@ -45,28 +43,12 @@ int failToGenerate(std::string_view what, const ErrorSlot& error) {
   return fail("Could not generate %@: %s\n", {what, descriptionOf(error)});
 }
 
-/// Runs one step that can fail; running out of memory is a failure like any other.
-template <typename Step>
-bool succeeds(Step step, ErrorSlot& error) {
-  error.reset();
-  try {
-    return step();
-  } catch (const std::bad_alloc&) {
-    error = QELError(2, "Out of memory");
-    return false;
-  }
-}
-
 /// Keeps what a run has made until the process ends. That gives all memory back at once; to destroy
 /// a long podcast record by record would take a tenth of the run.
 template <typename Object>
 Object& kept(std::unique_ptr<Object> object) {
   static auto& objects = *new std::vector<std::unique_ptr<Object>>;
   return *objects.emplace_back(std::move(object));
-}
-
-bool generate(QELPodcastGenerator& generator, QELPodcastSource& source, ErrorSlot& error) {
-  return succeeds([&] { return generator.generateFromSource(source, error); }, error);
 }
 
 std::string targetPath(const QELArguments& arguments) {
@@ -93,23 +75,17 @@ int run(const QELArguments& arguments) {
 }  // namespace
 
 int QELRun(std::span<const char* const> arguments) {
-  try {
-    const QELArguments scanned = QELScanArguments(arguments);
-    if (scanned.unknownCommand) {
-      return fail("Command `%s' not recognized.\n", {scanned.unknownCommand});
-    }
-    return run(scanned);
-  } catch (const std::bad_alloc&) {
-    // Nothing is left to make a message of.
-    platform::writeToStandardError("Out of memory.\n");
-    return kFailure;
+  const QELArguments scanned = QELScanArguments(arguments);
+  if (scanned.unknownCommand) {
+    return fail("Command `%s' not recognized.\n", {scanned.unknownCommand});
   }
+  return run(scanned);
 }
 
 int QELRunCommand(const QELArguments& arguments, QELPodcastSource& source) {
   QELProgress("N", "Loading/interpreting source...");
   ErrorSlot error;
-  if (!succeeds([&] { return source.loadSourceWithError(error); }, error)) {
+  if (!source.loadSourceWithError(error)) {
     return fail("Could not load source: %s", {descriptionOf(error)});
   }
 
@@ -131,7 +107,7 @@ int QELCreateBundle(const QELArguments& arguments, QELPodcastSource& source,
   // The path is the bundle itself, exactly as it was given, whatever its extension.
   generator.setOutputPath(arguments.outputPath.value_or(platform::temporaryDirectory()));
   ErrorSlot error;
-  if (!generate(generator, source, error)) return failToGenerate("bundle", error);
+  if (!generator.generateFromSource(source, error)) return failToGenerate("bundle", error);
   QELProgress("N", "Done!");
   return kSuccess;
 }
@@ -145,7 +121,7 @@ int QELCreateFeed(const QELArguments& arguments, QELPodcastSource& source,
 
   generator.setFormat(format);
   ErrorSlot error;
-  if (!generate(generator, source, error)) return failToGenerate("feed", error);
+  if (!generator.generateFromSource(source, error)) return failToGenerate("feed", error);
   if (!generator.xmlData()) return fail("Could not generate feed: no data was produced.\n");
 
   // The line break is appended apart, behind whatever the target holds by then. The first
@@ -161,7 +137,7 @@ int QELCreateFeed(const QELArguments& arguments, QELPodcastSource& source,
 int QELParseFeed(const QELArguments& arguments, QELPodcastSource& source,
                  QELReferenceFilePodcastGenerator& generator) {
   ErrorSlot error;
-  if (!generate(generator, source, error)) return failToGenerate("reference file", error);
+  if (!generator.generateFromSource(source, error)) return failToGenerate("reference file", error);
   if (!generator.referenceData()) {
     return fail("Could not generate reference file: no data was produced.\n");
   }

@@ -8,7 +8,7 @@
 #include "platform/files/StandardStreams.h"
 #include "platform/net/URL.h"
 #include "platform/plist/PropertyListReader.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
 #include "sources/QELBundlePodcastSource.h"
 #include "sources/QELFeedPodcastSource.h"
 #include "sources/QELReferenceFilePodcastSource.h"

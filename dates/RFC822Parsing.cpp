@@ -6,7 +6,10 @@
 #include <string>
 #include <vector>
 
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
+#include "platform/text/Characters.h"
+#include "platform/text/LeadingInteger.h"
+#include "platform/text/Splitting.h"
 #include "platform/time/GregorianCalendar.h"
 
 namespace {

@@ -14,7 +14,9 @@
 #include "fuzz/PropertyListRoundTrip.h"
 #include "platform/net/URL.h"
 #include "platform/plist/PropertyListDate.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
+#include "platform/text/Characters.h"
+#include "platform/text/LeadingInteger.h"
 
 namespace {
 

@@ -9,8 +9,9 @@
 #include "generators/QELNameLedger.h"
 #include "platform/files/Paths.h"
 #include "platform/net/URL.h"
+#include "platform/text/Case.h"
+#include "platform/text/Splitting.h"
 #include "platform/text/Text.h"
-#include "platform/text/TextHelpers.h"
 #include "platform/xml/XMLEscaping.h"
 
 namespace {
@@ -22,7 +23,6 @@ bool isPrintableASCII(std::string_view text) {
 void requireSoundURL(std::string_view text) {
   const std::optional<platform::URL> url = platform::URL::parse(text);
   if (!url) return;
-  requireThat(url->text() == text, "a URL keeps its text");
   requireThat(!url->scheme().empty() && platform::lowercased(url->scheme()) == url->scheme(),
               "a scheme is in lower case");
   requireThat(isPrintableASCII(url->encodedText()) && isPrintableASCII(url->encodedPath()),
@@ -68,8 +68,8 @@ void requireSafe(const std::string& name) {
 /// The names of one bundle's media and posters.
 class Bundle {
  public:
-  void add(const platform::Text& location, const std::optional<platform::Text>& referenceType) {
-    const std::optional<std::string> name = QELFileName(location, referenceType);
+  void add(const platform::Text& location, const platform::OptionalText& referenceType) {
+    const std::optional<std::string> name = QELFileName({location, referenceType});
     if (!name) return;
     const std::string base = ledger_.reserve(QELBaseName(*name));
     requireThat(bases_.insert(base).second, "a base name is given out once");

@@ -2,12 +2,11 @@
 
 #include <cstddef>
 
-#include "cli/common/QELReferenceType.h"
 #include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/net/URL.h"
 #include "platform/text/FormattedText.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Splitting.h"
 #include "platform/xml/XMLEscaping.h"
 
 namespace {
@@ -16,14 +15,12 @@ constexpr std::size_t kLongestName = 255;  // bytes, what file systems allow
 
 }  // namespace
 
-std::optional<std::string> QELFileName(const platform::Text& location,
-                                       const std::optional<platform::Text>& referenceType) {
-  if (referenceType != kReferenceTypeRemote) {
-    return std::string(platform::lastPathComponent(location));
+std::optional<std::string> QELFileName(const QELMediaReference& reference) {
+  if (reference.url) {
+    return platform::percentDecoded(platform::lastPathComponent(reference.url->encodedPath()));
   }
-  const std::optional<platform::URL> url = platform::URL::parse(location);
-  if (!url) return std::nullopt;
-  return platform::percentDecoded(platform::lastPathComponent(url->encodedPath()));
+  if (!reference.location || reference.isRemote) return std::nullopt;
+  return std::string(platform::lastPathComponent(*reference.location));
 }
 
 bool QELNamesFile(std::string_view name) {

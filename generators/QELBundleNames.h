@@ -4,17 +4,21 @@
 #include <string>
 #include <string_view>
 
-#include "platform/text/Text.h"
+#include "model/QELMediaReference.h"
 
-/// The rules by which the files of a bundle are named after the locations that they come from. They
-/// go by texts alone; nothing here looks at the file system.
+/// The rules that decide the name of a media file or a poster of a bundle, after the location that
+/// it comes from. They go by texts alone; nothing here looks at the file system.
+///
+///     const auto name = QELFileName(reference);      // of "https://h/a%20b:1.MP3?x": "a b:1.MP3"
+///     const auto base = ledger.reserve(QELBaseName(*name));  // "a b1", or "a b1-2" when taken
+///     const auto file = QELNameWithExtension(base, platform::pathExtension(*name));  // "a b1.MP3"
+///     if (!QELNamesFile(*name) || !QELIsSaneName(file)) skip();
 
 /// The last component of a location: of the decoded path for a URL, of the path itself otherwise.
-/// Absent for a remote location that is no valid URL.
+/// Absent without a location and for a remote one that is no valid URL.
 ///
 /// A URL's component is taken before it is decoded, so that an encoded "/" belongs to the name.
-std::optional<std::string> QELFileName(const platform::Text& location,
-                                       const std::optional<platform::Text>& referenceType);
+std::optional<std::string> QELFileName(const QELMediaReference& reference);
 
 /// Whether the last component of a location names a file at all.
 bool QELNamesFile(std::string_view name);

@@ -14,9 +14,9 @@
 #include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/plist/PropertyListWriter.h"
+#include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
 #include "platform/text/Text.h"
-#include "platform/text/TextHelpers.h"
 
 namespace {
 
@@ -77,41 +77,35 @@ class BundleDirectory {
   std::string postersPath_;
 };
 
-/// A poster to fetch: the podcast's or an episode's.
-struct Poster {
-  std::optional<Text> location;
-  std::optional<Text> referenceType;
-  std::string baseName;       // of the file that it becomes
-  std::string_view subject;   // "podcast" or "episode", for the warnings
-  std::optional<Text> title;  // of the subject
-};
+/// Warns about what is left out of the bundle; absent, as what is left out is.
+template <typename... Arguments>
+std::nullopt_t leftOut(std::string_view format, const Arguments&... arguments) {
+  QELProgress("W", format, arguments...);
+  return std::nullopt;
+}
 
-/// Fetches the poster with `save`, which takes the path of the new file. The reference to it,
-/// relative to the bundle; absent without a poster and, after a warning, for one that could not be
-/// fetched.
-template <typename Save>
+/// Fetches the poster of the record, the podcast or an episode, as the warnings call it. The
+/// reference to it, relative to the bundle; absent without a poster and, after a warning, for one
+/// that could not be fetched.
+template <typename Record>
 std::optional<std::string> fetchPoster(const BundleDirectory& bundle,
-                                       const std::optional<QELPodcastSource::FileTypes>& allowed,
-                                       const Poster& poster, Save save) {
-  if (!poster.location) return std::nullopt;
-  const std::optional<std::string> name = QELFileName(*poster.location, poster.referenceType);
-  const std::string extension(name ? platform::pathExtension(*name) : "");
-  if (name && !allows(allowed, extension)) {
-    QELProgress("W", "Unsupported poster image type \"%@\" for %@ \"%@\"", extension,
-                poster.subject, poster.title);
-    return std::nullopt;
+                                       const QELPodcastSource& source, Record& record,
+                                       std::string_view baseName, std::string_view subject) {
+  const QELMediaReference reference = record.posterReference();
+  if (!reference.location) return std::nullopt;
+  const platform::OptionalText title = record.title();
+  const std::optional<std::string> name = QELFileName(reference);
+  const std::string_view extension = name ? platform::pathExtension(*name) : "";
+  if (name && !allows(source.allowedPosterFileTypes(), extension)) {
+    return leftOut("Unsupported poster image type \"%@\" for %@ \"%@\"", extension, subject, title);
   }
-  const std::string posterName = QELNameWithExtension(poster.baseName, extension);
+  const std::string posterName = QELNameWithExtension(baseName, extension);
   const std::optional<std::string> path = name ? bundle.posterPath(posterName) : std::nullopt;
   if (!path) {
-    QELProgress("W", "Could not generate sane path for poster image for %@ \"%@\"", poster.subject,
-                poster.title);
-    return std::nullopt;
+    return leftOut("Could not generate sane path for poster image for %@ \"%@\"", subject, title);
   }
-  if (!save(*path)) {
-    QELProgress("W", "Could not save or download poster image for %@ \"%@\"", poster.subject,
-                poster.title);
-    return std::nullopt;
+  if (!record.savePosterToPath(*path, reference)) {
+    return leftOut("Could not save or download poster image for %@ \"%@\"", subject, title);
   }
   return platform::joinedPath(kPostersName, posterName);
 }
@@ -134,38 +128,26 @@ void setPosterKeys(Dictionary& dictionary, const std::string& referenceKey,
 std::optional<Dictionary> fetchEpisode(const BundleDirectory& bundle,
                                        const QELPodcastSource& source, QELEpisode& episode,
                                        QELNameLedger& names) {
-  const std::optional<Text> location = episode.location();
-  const std::optional<Text> title = episode.title();
-  if (!location) {
-    QELProgress("W", "Found an episode (\"%@\") without a specified location", title);
-    return std::nullopt;
+  const QELMediaReference media = episode.mediaReference();
+  const platform::OptionalText title = episode.title();
+  if (!media.location) {
+    return leftOut("Found an episode (\"%@\") without a specified location", title);
   }
-  const std::optional<std::string> name = QELFileName(*location, episode.referenceType());
-  if (!name) {
-    QELProgress("W", "Could not generate sane path for episode \"%@\"", title);
-    return std::nullopt;
-  }
+  const std::optional<std::string> name = QELFileName(media);
+  if (!name) return leftOut("Could not generate sane path for episode \"%@\"", title);
   const std::string base = names.reserve(QELBaseName(*name));
-  const std::string extension(platform::pathExtension(*name));
+  const std::string_view extension = platform::pathExtension(*name);
   if (!allows(source.allowedEpisodeFileTypes(), extension)) {
-    QELProgress("W", "Invalid file type \"%@\" for episode \"%@\"", extension, title);
-    return std::nullopt;
+    return leftOut("Invalid file type \"%@\" for episode \"%@\"", extension, title);
   }
   const std::string mediaName = QELNameWithExtension(base, extension);
   const std::optional<std::string> path =
       QELNamesFile(*name) ? bundle.mediaPath(mediaName) : std::nullopt;
-  if (!path) {
-    QELProgress("W", "Could not generate sane path for episode \"%@\"", title);
-    return std::nullopt;
+  if (!path) return leftOut("Could not generate sane path for episode \"%@\"", title);
+  if (!episode.saveToPath(*path, media)) {
+    return leftOut("Could not save or download episode \"%@\"", title);
   }
-  if (!episode.saveToPath(*path)) {
-    QELProgress("W", "Could not save or download episode \"%@\"", title);
-    return std::nullopt;
-  }
-  const std::optional<std::string> poster = fetchPoster(
-      bundle, source.allowedPosterFileTypes(),
-      {episode.posterLocation(), episode.posterReferenceType(), base, "episode", title},
-      [&](const std::string& posterPath) { return episode.savePosterToPath(posterPath); });
+  const auto poster = fetchPoster(bundle, source, episode, base, "episode");
 
   // Only now: fetching sets the size to what the server announced.
   Dictionary entry = episode.dictionary();
@@ -193,12 +175,8 @@ bool QELBundlePodcastGenerator::generateFromSource(QELPodcastSource& source, Err
 
   Dictionary dictionary;
   QELAddPodcastKeys(QELPodcastDescriptiveKeys(), source, dictionary);
-  setPosterKeys(
-      dictionary, "PodcastPosterReference",
-      fetchPoster(bundle, source.allowedPosterFileTypes(),
-                  {source.posterLocation(), source.posterReferenceType(), "Podcast", "podcast",
-                   source.title()},
-                  [&](const std::string& path) { return source.savePosterToPath(path); }));
+  setPosterKeys(dictionary, "PodcastPosterReference",
+                fetchPoster(bundle, source, source, "Podcast", "podcast"));
 
   static const QELEpisodeList none;
   const QELEpisodeList& episodes = source.episodes() ? *source.episodes() : none;

@@ -9,124 +9,94 @@
 namespace {
 
 using platform::Dictionary;
-using platform::PointInTime;
+using platform::PropertyListValue;
 using platform::Text;
-using platform::textForKey;
 using platform::operator""_text;  // NOLINT(misc-unused-using-decls): used in literals
 
-std::optional<PointInTime> dateForKey(const Dictionary& dictionary, std::string_view key) {
-  const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);
-  return value ? value->asDate() : std::nullopt;
+/// What a field becomes by the value under its key, null where the key is missing. A value of an
+/// unexpected kind counts as missing.
+void read(const PropertyListValue* value, platform::AtomicValue<QELEpisode::OptionalText>& field) {
+  field.store(value ? value->asText() : std::nullopt);
+}
+void read(const PropertyListValue* value, platform::AtomicValue<QELEpisode::OptionalDate>& field) {
+  field.store(value ? value->asDate() : std::nullopt);
+}
+void read(const PropertyListValue* value, std::atomic<std::int64_t>& order) {
+  order = (value ? value->asSignedInteger() : std::nullopt).value_or(QELEpisode::kNoOrder);
+}
+void read(const PropertyListValue* value, std::atomic<std::uint64_t>& length) {
+  length = (value ? value->asUnsignedInteger() : std::nullopt).value_or(0);
 }
 
-std::int64_t orderForKey(const Dictionary& dictionary, std::string_view key) {
-  const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);
-  return (value ? value->asSignedInteger() : std::nullopt).value_or(QELEpisode::kNoOrder);
+/// What is written of a field; absent leaves its key out.
+template <typename Value>
+Value written(const platform::AtomicValue<Value>& field) {
+  return field.load();
 }
-
-std::uint64_t lengthForKey(const Dictionary& dictionary, std::string_view key) {
-  const platform::PropertyListValue* value = platform::valueForKey(dictionary, key);
-  return (value ? value->asUnsignedInteger() : std::nullopt).value_or(0);
+std::optional<std::int64_t> written(const std::atomic<std::int64_t>& order) {
+  const std::int64_t number = order;
+  return number >= 0 ? std::optional(number) : std::nullopt;
 }
-
-/// The stored text, or what the function derives from the location when none is stored.
-template <typename Function>
-std::optional<Text> textOrDerived(std::optional<Text> stored, Function derive,
-                                  const std::optional<Text>& location) {
-  return stored ? std::move(stored) : derive(location);
+std::optional<std::uint64_t> written(const std::atomic<std::uint64_t>& length) {
+  const std::uint64_t number = length;
+  return number != 0 ? std::optional(number) : std::nullopt;
 }
 
 }  // namespace
 
-std::shared_ptr<QELEpisode> QELEpisode::episode() {
-  return std::make_shared<QELEpisode>();
+/// The table of the fields, each with its key in an episode dictionary of a reference file and its
+/// key in a feed item dictionary, empty where feed items have none. In the order of the former, so
+/// that a dictionary is filled at its end.
+template <typename Episode, typename Visit>
+void QELEpisode::forEachField(Episode& episode, Visit visit) {
+  visit("EpisodeAdvisoryLabel"_text, "advisoryLabel", episode.advisoryLabel_);
+  visit("EpisodeAuthor"_text, "author", episode.author_);
+  visit("EpisodeCategory"_text, "category", episode.category_);
+  visit("EpisodeDate"_text, "date", episode.date_);
+  visit("EpisodeDescription"_text, "description", episode.description_);
+  visit("EpisodeFileSize"_text, "contentLength", episode.contentLength_);
+  visit("EpisodeKeywords"_text, "keywords", episode.keywords_);
+  visit("EpisodeName"_text, "title", episode.title_);
+  visit("EpisodeOrder"_text, "order", episode.orvaneOrder_);
+  visit("EpisodePosterReference"_text, "poster", episode.posterLocation_);
+  visit("EpisodePosterReferenceType"_text, "", episode.posterReferenceType_);
+  visit("EpisodeReference"_text, "url", episode.location_);
+  visit("EpisodeReferenceType"_text, "", episode.referenceType_);
+  visit("EpisodeType"_text, "contentType", episode.contentType_);
+  visit("EpisodeUUID"_text, "QELUUID", episode.uuid_);
 }
 
 std::shared_ptr<QELEpisode> QELEpisode::episodeWithDictionary(const Dictionary* dictionary) {
   auto made = episode();
-  made->initWithDictionary(dictionary);
+  made->initWithDictionary(dictionary, Keys::kOfReferenceFile);
   return made;
 }
 
 std::shared_ptr<QELEpisode> QELEpisode::episodeWithFeedDictionary(const Dictionary* dictionary) {
   auto made = episode();
-  made->initWithFeedDictionary(dictionary);
+  made->initWithDictionary(dictionary, Keys::kOfFeedItem);
   return made;
 }
 
-void QELEpisode::initWithDictionary(const Dictionary* dictionary) {
+void QELEpisode::initWithDictionary(const Dictionary* dictionary, Keys keys) {
   setOrvaneOrder(kNoOrder);
   if (!dictionary) return;
-
-  setUuid(textForKey(*dictionary, "EpisodeUUID"));
-  setTitle(textForKey(*dictionary, "EpisodeName"));
-  setAuthor(textForKey(*dictionary, "EpisodeAuthor"));
-  setDate(dateForKey(*dictionary, "EpisodeDate"));
-  setKeywords(textForKey(*dictionary, "EpisodeKeywords"));
-  setEpisodeDescription(textForKey(*dictionary, "EpisodeDescription"));
-  setCategory(textForKey(*dictionary, "EpisodeCategory"));
-  setAdvisoryLabel(textForKey(*dictionary, "EpisodeAdvisoryLabel"));
-  setOrvaneOrder(orderForKey(*dictionary, "EpisodeOrder"));
-
-  // What follows is derived from the locations, which therefore come first.
-  setLocation(textForKey(*dictionary, "EpisodeReference"));
-  setReferenceType(
-      textOrDerived(textForKey(*dictionary, "EpisodeReferenceType"), QELReferenceType, location()));
-  setContentType(textOrDerived(textForKey(*dictionary, "EpisodeType"), QELMIMEType, location()));
-  setContentLength(lengthForKey(*dictionary, "EpisodeFileSize"));
-  setPosterLocation(textForKey(*dictionary, "EpisodePosterReference"));
-  setPosterReferenceType(textOrDerived(textForKey(*dictionary, "EpisodePosterReferenceType"),
-                                       QELReferenceType, posterLocation()));
-}
-
-void QELEpisode::initWithFeedDictionary(const Dictionary* dictionary) {
-  setOrvaneOrder(kNoOrder);
-  if (!dictionary) return;
-
-  setUuid(textForKey(*dictionary, "QELUUID"));
-  setTitle(textForKey(*dictionary, "title"));
-  setAuthor(textForKey(*dictionary, "author"));
-  setDate(dateForKey(*dictionary, "date"));
-  setKeywords(textForKey(*dictionary, "keywords"));
-  setEpisodeDescription(textForKey(*dictionary, "description"));
-  setCategory(textForKey(*dictionary, "category"));
-  setAdvisoryLabel(textForKey(*dictionary, "advisoryLabel"));
-  setOrvaneOrder(orderForKey(*dictionary, "order"));
-
-  setLocation(textForKey(*dictionary, "url"));
-  setReferenceType(QELReferenceType(location()));
-  setContentType(textOrDerived(textForKey(*dictionary, "contentType"), QELMIMEType, location()));
-  setContentLength(lengthForKey(*dictionary, "contentLength"));
-  setPosterLocation(textForKey(*dictionary, "poster"));
-  setPosterReferenceType(QELReferenceType(posterLocation()));
+  forEachField(*this, [&](const Text& key, std::string_view feedKey, auto& field) {
+    const std::string_view used = keys == Keys::kOfFeedItem ? feedKey : key.view();
+    read(used.empty() ? nullptr : platform::valueForKey(*dictionary, used), field);
+  });
+  if (!referenceType()) setReferenceType(QELReferenceType(location()));
+  if (!contentType()) setContentType(QELMIMEType(location()));
+  if (!posterReferenceType()) setPosterReferenceType(QELReferenceType(posterLocation()));
 }
 
 Dictionary QELEpisode::dictionary() const {
   Dictionary dictionary;
-  // In the order of their keys, so that each goes to the end.
   constexpr std::size_t kMostEntries = 15;
   dictionary.reserve(kMostEntries);
-  const auto set = [&dictionary](const Text& key, const auto& value) {
-    if (value) dictionary.emplace(key, *value);
-  };
-
-  set("EpisodeAdvisoryLabel"_text, advisoryLabel());
-  set("EpisodeAuthor"_text, author());
-  set("EpisodeCategory"_text, category());
-  set("EpisodeDate"_text, date());
-  set("EpisodeDescription"_text, episodeDescription());
-  const std::uint64_t length = contentLength();
-  set("EpisodeFileSize"_text, length != 0 ? std::optional(length) : std::nullopt);
-  set("EpisodeKeywords"_text, keywords());
-  set("EpisodeName"_text, title());
-  const std::int64_t order = orvaneOrder();
-  set("EpisodeOrder"_text, order >= 0 ? std::optional(order) : std::nullopt);
-  set("EpisodePosterReference"_text, posterLocation());
-  set("EpisodePosterReferenceType"_text, posterReferenceType());
-  set("EpisodeReference"_text, location());
-  set("EpisodeReferenceType"_text, referenceType());
-  set("EpisodeType"_text, contentType());
-  set("EpisodeUUID"_text, uuid());
+  forEachField(*this, [&](const Text& key, std::string_view, const auto& field) {
+    if (const auto value = written(field)) dictionary.emplace(key, *value);
+  });
   dictionary.shrink_to_fit();  // there may be very many episodes with next to no entries
   return dictionary;
 }
@@ -135,25 +105,22 @@ std::string QELEpisode::description() const {
   return platform::formattedText("<%@: \"%@\">", {"QELEpisode", title()});
 }
 
-bool QELEpisode::saveToPath(const std::string& path) {
-  return QELFetchToPath(location(), referenceType(), path, *this, download_, [this] {
+bool QELEpisode::saveToPath(const std::string& path, const QELMediaReference& media) {
+  return fetchToPath(media, path, [this] {
     QELProgress("N", "Downloading episode entitled \"%@\" (%lu bytes)...", title(),
                 contentLength());
     downloadingPoster_ = false;
-    totalDownloaded_ = 0;
   });
 }
 
-bool QELEpisode::savePosterToPath(const std::string& path) {
-  return QELFetchToPath(posterLocation(), posterReferenceType(), path, *this, download_, [this] {
+bool QELEpisode::savePosterToPath(const std::string& path, const QELMediaReference& poster) {
+  return fetchToPath(poster, path, [this] {
     QELProgress("N", "Downloading poster for episode entitled \"%@\"...", title());
     downloadingPoster_ = true;
-    totalDownloaded_ = 0;
   });
 }
 
 void QELEpisode::didReceiveResponse(platform::Download& /*download*/, std::int64_t expectedLength) {
-  download_ = QELDownloadState();
   totalDownloaded_ = 0;
   // Of a poster too: the file size of a bundle's entry is that of what was fetched last.
   if (expectedLength >= 0) setContentLength(static_cast<std::uint64_t>(expectedLength));
@@ -169,13 +136,4 @@ void QELEpisode::didReceiveDataOfLength(platform::Download& /*download*/, std::u
                                                         : static_cast<double>(totalDownloaded_) /
                                                               static_cast<double>(expected) * kAll;
   QELProgress(std::nullopt, "-- %lu / %lu (%0.1f%%)", totalDownloaded_, expected, percentage);
-}
-
-void QELEpisode::downloadDidFinish(platform::Download& /*download*/) {
-  download_ = {.downloadFinished = true, .downloadSuccess = true};
-}
-
-void QELEpisode::didFailWithError(platform::Download& /*download*/,
-                                  const platform::ErrorRecord& /*error*/) {
-  download_ = {.downloadFinished = true, .downloadSuccess = false};
 }

@@ -8,11 +8,13 @@
 #include "platform/plist/PropertyListValue.h"
 #include "platform/text/Text.h"
 
-/// One text field of the podcast and its key in a reference dictionary.
+/// One text field of the podcast, its key in a reference dictionary and its key among the feed
+/// attributes of the feed parser, empty where a feed has none.
 struct QELPodcastKey {
   std::string_view key;
-  const std::optional<platform::Text>& (QELPodcastSource::*value)() const;
-  void (QELPodcastSource::*setValue)(std::optional<platform::Text>);
+  std::string_view feedKey;
+  const platform::OptionalText& (QELPodcastSource::*value)() const;
+  void (QELPodcastSource::*setValue)(platform::OptionalText);
 };
 
 /// The twelve "Podcast" keys of a reference dictionary, in the order in which they are read and

@@ -8,17 +8,8 @@ bool QELPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   return false;
 }
 
-bool QELPodcastSource::savePosterToPath(const std::string& path) {
-  return QELFetchToPath(posterLocation(), posterReferenceType(), path, *this, download_, [this] {
+bool QELPodcastSource::savePosterToPath(const std::string& path, const QELMediaReference& poster) {
+  return fetchToPath(poster, path, [this] {
     QELProgress("N", "Downloading poster for podcast entitled \"%@\"...", title());
   });
-}
-
-void QELPodcastSource::downloadDidFinish(platform::Download& /*download*/) {
-  download_ = {.downloadFinished = true, .downloadSuccess = true};
-}
-
-void QELPodcastSource::didFailWithError(platform::Download& /*download*/,
-                                        const platform::ErrorRecord& /*error*/) {
-  download_ = {.downloadFinished = true, .downloadSuccess = false};
 }

@@ -7,8 +7,8 @@
 #include <vector>
 
 #include "model/QELEpisode.h"
-#include "model/QELFetch.h"
-#include "platform/net/Download.h"
+#include "model/QELFetcher.h"
+#include "model/QELMediaReference.h"
 #include "platform/text/ErrorRecord.h"
 #include "platform/text/Text.h"
 
@@ -17,15 +17,19 @@
 ///
 /// Every field is absent at first. A missing text is absent, distinct from an empty one. Used by
 /// one thread.
-class QELPodcastSource : private platform::DownloadReceiver {
+///
+///     const std::unique_ptr<QELPodcastSource> source = initWithSourceString("show.plist");
+///     platform::ErrorSlot error;
+///     if (!source->loadSourceWithError(error)) return fail(error->description);
+///     for (const auto& episode : *source->episodes()) print(episode->title());
+class QELPodcastSource : private QELFetcher {
  public:
+  using OptionalText = platform::OptionalText;
   /// File-name extensions in lower case.
   using FileTypes = std::vector<std::string>;
 
   QELPodcastSource() = default;
   ~QELPodcastSource() override = default;
-  QELPodcastSource(const QELPodcastSource&) = delete;
-  QELPodcastSource& operator=(const QELPodcastSource&) = delete;
 
   /// Fills the fields from wherever the source's kind reads them. On failure returns false with the
   /// slot filled, the fields as they were. The base, which has nothing to read, always fails with
@@ -35,92 +39,75 @@ class QELPodcastSource : private platform::DownloadReceiver {
   /// Puts the podcast's poster at the path and returns once it is there or has failed (false). A
   /// local poster is copied, never over an existing file; a remote one is downloaded over whatever
   /// is there.
-  bool savePosterToPath(const std::string& path);
-
-  const std::optional<platform::Text>& uuid() const { return uuid_; }
-  void setUuid(std::optional<platform::Text> uuid) { uuid_ = std::move(uuid); }
-
-  /// Also names the podcast in progress lines.
-  const std::optional<platform::Text>& title() const { return title_; }
-  void setTitle(std::optional<platform::Text> title) { title_ = std::move(title); }
-
-  const std::optional<platform::Text>& author() const { return author_; }
-  void setAuthor(std::optional<platform::Text> author) { author_ = std::move(author); }
-
-  const std::optional<platform::Text>& copyright() const { return copyright_; }
-  void setCopyright(std::optional<platform::Text> copyright) { copyright_ = std::move(copyright); }
-
-  /// All keywords, in one text as the source gave it.
-  const std::optional<platform::Text>& keywords() const { return keywords_; }
-  void setKeywords(std::optional<platform::Text> keywords) { keywords_ = std::move(keywords); }
-
-  const std::optional<platform::Text>& category() const { return category_; }
-  void setCategory(std::optional<platform::Text> category) { category_ = std::move(category); }
-
-  const std::optional<platform::Text>& podcastDescription() const { return description_; }
-  void setPodcastDescription(std::optional<platform::Text> description) {
-    description_ = std::move(description);
+  bool savePosterToPath(const std::string& path) {
+    return savePosterToPath(path, posterReference());
   }
+  /// The same for the caller who already has `posterReference()`, since a name was made from it.
+  bool savePosterToPath(const std::string& path, const QELMediaReference& poster);
 
-  const std::optional<platform::Text>& advisoryLabel() const { return advisoryLabel_; }
-  void setAdvisoryLabel(std::optional<platform::Text> label) { advisoryLabel_ = std::move(label); }
+  /// Where the poster lies, by `posterLocation` and `posterReferenceType` of this moment.
+  QELMediaReference posterReference() const { return {posterLocation_, posterReferenceType_}; }
+
+  const OptionalText& uuid() const { return uuid_; }
+  void setUuid(OptionalText uuid) { uuid_ = std::move(uuid); }
+  /// Also names the podcast in progress lines.
+  const OptionalText& title() const { return title_; }
+  void setTitle(OptionalText title) { title_ = std::move(title); }
+  const OptionalText& author() const { return author_; }
+  void setAuthor(OptionalText author) { author_ = std::move(author); }
+  const OptionalText& copyright() const { return copyright_; }
+  void setCopyright(OptionalText copyright) { copyright_ = std::move(copyright); }
+  /// All keywords, in one text as the source gave it.
+  const OptionalText& keywords() const { return keywords_; }
+  void setKeywords(OptionalText keywords) { keywords_ = std::move(keywords); }
+  const OptionalText& category() const { return category_; }
+  void setCategory(OptionalText category) { category_ = std::move(category); }
+  const OptionalText& podcastDescription() const { return description_; }
+  void setPodcastDescription(OptionalText text) { description_ = std::move(text); }
+  const OptionalText& advisoryLabel() const { return advisoryLabel_; }
+  void setAdvisoryLabel(OptionalText label) { advisoryLabel_ = std::move(label); }
 
   /// "local" or "remote": the kind of `location`. Other texts can come from a reference file.
-  const std::optional<platform::Text>& referenceType() const { return referenceType_; }
-  void setReferenceType(std::optional<platform::Text> type) { referenceType_ = std::move(type); }
-
+  const OptionalText& referenceType() const { return referenceType_; }
+  void setReferenceType(OptionalText type) { referenceType_ = std::move(type); }
   /// Where the podcast came from or points to.
-  const std::optional<platform::Text>& location() const { return location_; }
-  void setLocation(std::optional<platform::Text> location) { location_ = std::move(location); }
-
+  const OptionalText& location() const { return location_; }
+  void setLocation(OptionalText location) { location_ = std::move(location); }
   /// The same pair for the podcast's poster image: a path or a URL.
-  const std::optional<platform::Text>& posterReferenceType() const { return posterReferenceType_; }
-  void setPosterReferenceType(std::optional<platform::Text> type) {
-    posterReferenceType_ = std::move(type);
-  }
-  const std::optional<platform::Text>& posterLocation() const { return posterLocation_; }
-  void setPosterLocation(std::optional<platform::Text> location) {
-    posterLocation_ = std::move(location);
-  }
+  const OptionalText& posterReferenceType() const { return posterReferenceType_; }
+  void setPosterReferenceType(OptionalText type) { posterReferenceType_ = std::move(type); }
+  const OptionalText& posterLocation() const { return posterLocation_; }
+  void setPosterLocation(OptionalText location) { posterLocation_ = std::move(location); }
 
   /// The very list that was set; null when absent.
   const std::shared_ptr<const QELEpisodeList>& episodes() const { return episodes_; }
-  void setEpisodes(std::shared_ptr<const QELEpisodeList> episodes) {
-    episodes_ = std::move(episodes);
-  }
+  void setEpisodes(std::shared_ptr<const QELEpisodeList> list) { episodes_ = std::move(list); }
 
-  /// The file types that a bundle accepts for posters; absent for all.
-  const std::optional<FileTypes>& allowedPosterFileTypes() const { return allowedPosterFileTypes_; }
+  /// The file types that a bundle accepts for posters, and for the media of episodes; absent for
+  /// all.
+  const std::optional<FileTypes>& allowedPosterFileTypes() const { return allowedPosters_; }
   void setAllowedPosterFileTypes(std::optional<FileTypes> types) {
-    allowedPosterFileTypes_ = std::move(types);
+    allowedPosters_ = std::move(types);
   }
-
-  /// The same for the media of episodes.
-  const std::optional<FileTypes>& allowedEpisodeFileTypes() const {
-    return allowedEpisodeFileTypes_;
-  }
+  const std::optional<FileTypes>& allowedEpisodeFileTypes() const { return allowedMedia_; }
   void setAllowedEpisodeFileTypes(std::optional<FileTypes> types) {
-    allowedEpisodeFileTypes_ = std::move(types);
+    allowedMedia_ = std::move(types);
   }
 
  private:
-  void downloadDidFinish(platform::Download& download) override;
-  void didFailWithError(platform::Download& download, const platform::ErrorRecord& error) override;
-
-  std::optional<platform::Text> uuid_;
-  std::optional<platform::Text> title_;
-  std::optional<platform::Text> author_;
-  std::optional<platform::Text> copyright_;
-  std::optional<platform::Text> keywords_;
-  std::optional<platform::Text> category_;
-  std::optional<platform::Text> description_;
-  std::optional<platform::Text> advisoryLabel_;
-  std::optional<platform::Text> referenceType_;
-  std::optional<platform::Text> location_;
-  std::optional<platform::Text> posterReferenceType_;
-  std::optional<platform::Text> posterLocation_;
+  OptionalText uuid_;
+  OptionalText title_;
+  OptionalText author_;
+  OptionalText copyright_;
+  OptionalText keywords_;
+  OptionalText category_;
+  OptionalText description_;
+  OptionalText advisoryLabel_;
+  OptionalText referenceType_;
+  OptionalText location_;
+  OptionalText posterReferenceType_;
+  OptionalText posterLocation_;
   std::shared_ptr<const QELEpisodeList> episodes_;
-  std::optional<FileTypes> allowedPosterFileTypes_;
-  std::optional<FileTypes> allowedEpisodeFileTypes_;
-  QELDownloadState download_;  // of the running poster download
+  std::optional<FileTypes> allowedPosters_;
+  std::optional<FileTypes> allowedMedia_;
 };

@@ -6,6 +6,7 @@
 
 #include "cli/common/QELError.h"
 #include "cli/common/QELReferenceType.h"
+#include "model/QELPodcastKeys.h"
 #include "platform/net/ResourceReader.h"
 #include "platform/plist/PropertyListValue.h"
 #include "sources/FeedParser.h"
@@ -47,23 +48,13 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
     return false;
   }
 
-  const platform::Dictionary& attributes = parser->feedAttributes();
-  const auto text = [&attributes](std::string_view key) {
-    return platform::textForKey(attributes, key);
-  };
-  setUuid(text("QELUUID"));
-  setTitle(text("title"));
-  setAuthor(text("author"));
-  setCopyright(text("copyright"));
-  setKeywords(text("keywords"));
-  setCategory(text("category"));
-  setPodcastDescription(text("description"));
-  setAdvisoryLabel(text("advisoryLabel"));
-  setLocation(text("url"));
+  for (const QELPodcastKey& field : QELPodcastKeys()) {
+    (this->*field.setValue)(field.feedKey.empty()
+                                ? std::nullopt
+                                : platform::textForKey(parser->feedAttributes(), field.feedKey));
+  }
   setReferenceType(QELReferenceType(location()));
-  setPosterLocation(text("poster"));
   setPosterReferenceType(QELReferenceType(posterLocation()));
-
   setEpisodes(std::move(episodes));
   return true;
 }

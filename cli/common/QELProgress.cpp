@@ -3,7 +3,7 @@
 #include <string>
 
 #include "platform/files/StandardStreams.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Characters.h"
 
 bool QELShouldReportProgress = false;
 

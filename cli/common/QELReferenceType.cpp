@@ -1,8 +1,9 @@
 #include "cli/common/QELReferenceType.h"
 
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Case.h"
+#include "platform/text/Characters.h"
 
-std::optional<platform::Text> QELReferenceType(std::optional<std::string_view> location) {
+platform::OptionalText QELReferenceType(std::optional<std::string_view> location) {
   // Made once: every record shares them.
   static const platform::Text local(kReferenceTypeLocal);
   static const platform::Text remote(kReferenceTypeRemote);
@@ -14,6 +15,6 @@ std::optional<platform::Text> QELReferenceType(std::optional<std::string_view> l
   return start.starts_with("http") || start.starts_with("file:") ? remote : local;
 }
 
-std::optional<platform::Text> QELMIMEType(std::optional<std::string_view> /*location*/) {
+platform::OptionalText QELMIMEType(std::optional<std::string_view> /*location*/) {
   return std::nullopt;
 }

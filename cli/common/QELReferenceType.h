@@ -14,8 +14,8 @@ inline constexpr std::string_view kReferenceTypeRemote = "remote";
 /// case, "local" for anything else, absent for an absent or empty location.
 ///
 /// File URLs count as remote because they are fetched as URLs, not copied as paths.
-std::optional<platform::Text> QELReferenceType(std::optional<std::string_view> location);
+platform::OptionalText QELReferenceType(std::optional<std::string_view> location);
 
 /// Where a media type would be derived from a location. Always absent: a type guessed from an
 /// extension would change every reference file and feed that is written.
-std::optional<platform::Text> QELMIMEType(std::optional<std::string_view> location);
+platform::OptionalText QELMIMEType(std::optional<std::string_view> location);

@@ -6,11 +6,9 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <exception>
 #include <utility>
 
 namespace platform {
-
 namespace {
 
 constexpr std::uint64_t kChunkSize = std::uint64_t{64} << 10U;
@@ -22,6 +20,12 @@ bool waitFor(int descriptor, short events) {
     count = ::poll(&request, 1, -1);
   } while (count < 0 && errno == EINTR);
   return count > 0;
+}
+
+/// Whether a call that failed can be made again: it was interrupted, or has to wait, which is done
+/// here. A standard stream is non-blocking where another process that shares it made it so.
+bool canTryAgain(int descriptor, short events) {
+  return errno == EINTR || (errno == EAGAIN && waitFor(descriptor, events));
 }
 
 }  // namespace
@@ -70,12 +74,7 @@ bool writeAll(int descriptor, std::string_view bytes) {
     } else if (count == 0) {
       errno = EIO;
       return false;
-    } else if (errno == EAGAIN) {
-      // A standard stream is non-blocking where another process that shares it made it so.
-      if (!waitFor(descriptor, POLLOUT)) {
-        return false;
-      }
-    } else if (errno != EINTR) {
+    } else if (!canTryAgain(descriptor, POLLOUT)) {
       return false;
     }
   }
@@ -86,41 +85,28 @@ std::ptrdiff_t readSome(int descriptor, char* buffer, std::size_t capacity) {
   ssize_t count = -1;
   do {
     count = ::read(descriptor, buffer, capacity);
-  } while (count < 0 && errno == EINTR);
+  } while (count < 0 && canTryAgain(descriptor, POLLIN));
   return count;
 }
 
-int readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit, std::string& bytes) {
-  std::uint64_t length = bytes.size();
-  try {
-    // The byte beyond the expected size lets the end be seen without growing; the one beyond the
-    // limit tells a longer input from one that just fits.
-    bytes.resize(std::min(length + std::max(expectedSize + 1, kChunkSize), limit + 1));
-    for (;;) {
-      if (length == bytes.size()) {
-        bytes.resize(std::min(length * 2, limit + 1));
-      }
-      const std::ptrdiff_t count =
-          readSome(descriptor, bytes.data() + length, bytes.size() - length);
-      const int failure = count < 0 ? errno : 0;
-      if (count <= 0) {
-        bytes.resize(length);
-        return failure;
-      }
-      length += static_cast<std::uint64_t>(count);
-      if (length > limit) {
-        bytes.resize(limit);
-        return EFBIG;
-      }
-    }
-  } catch (const std::exception&) {
-    bytes.resize(std::min<std::uint64_t>(length, bytes.size()));
-    return ENOMEM;
+bool readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit,
+               std::string& bytes) {
+  // The byte beyond the expected size lets the end be seen without growing; the one beyond the
+  // limit tells a longer input from one that just fits.
+  bytes.resize(std::min(std::max(expectedSize, kChunkSize - 1), limit) + 1);
+  std::uint64_t length = 0;
+  std::ptrdiff_t count = 0;
+  while (length <= limit &&
+         (count = readSome(descriptor, bytes.data() + length, bytes.size() - length)) > 0) {
+    length += static_cast<std::uint64_t>(count);
+    if (length == bytes.size()) bytes.resize(std::min(length * 2, limit + 1));
   }
-}
-
-bool waitForInput(int descriptor) {
-  return waitFor(descriptor, POLLIN);
+  if (length > limit) {
+    count = -1;
+    errno = EFBIG;
+  }
+  bytes.resize(std::min(length, limit));
+  return count == 0;
 }
 
 }  // namespace platform

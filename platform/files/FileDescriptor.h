@@ -7,8 +7,8 @@
 
 namespace platform {
 
-/// A file descriptor that is closed by its owner's destruction. For the sources of this folder
-/// only; failures are told by errno.
+/// A file descriptor that its owner's destruction closes. For the sources of this folder only: they
+/// find the cause of a failure in errno, and report it to others by an ErrorSlot.
 class FileDescriptor {
  public:
   FileDescriptor() = default;
@@ -28,26 +28,24 @@ class FileDescriptor {
   int get() const { return descriptor_; }
   /// A second descriptor of the same open file: its offset and its lock are shared.
   FileDescriptor duplicated() const;
-  /// Closes it and tells whether all that was written got through. Not open afterwards in any case.
+  /// False when what was written may not have got through. Not open afterwards in any case.
   bool close();
 
  private:
   int descriptor_ = -1;
 };
 
-/// Writes all bytes, however many calls that takes, and waits where the descriptor is non-blocking.
+// These three wait where the descriptor is non-blocking, and go on after a signal.
+
+/// Writes all bytes, however many calls that takes.
 bool writeAll(int descriptor, std::string_view bytes);
 
 /// Reads up to `capacity` bytes as soon as there are some: their number, 0 at the end, -1 on
-/// failure, which includes a non-blocking descriptor that has none yet.
+/// failure.
 std::ptrdiff_t readSome(int descriptor, char* buffer, std::size_t capacity);
 
-/// Appends all that is left of the input to `bytes`; `expectedSize` of it is a hint. 0 on success,
-/// otherwise an errno value; EFBIG tells that `bytes` would exceed `limit`. After a failure `bytes`
-/// holds what was read before it, at most `limit` bytes.
-int readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit, std::string& bytes);
-
-/// Waits until the descriptor has input or has come to its end; false when that cannot be told.
-bool waitForInput(int descriptor);
+/// Reads all that is left of the input, of which `expectedSize` is a guess. More than `limit` bytes
+/// are a failure (EFBIG). After a failure `bytes` holds what was read before it, at most `limit`.
+bool readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit, std::string& bytes);
 
 }  // namespace platform

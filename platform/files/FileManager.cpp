@@ -4,10 +4,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <array>
 #include <cerrno>
 #include <cstddef>
 #include <string_view>
+#include <vector>
 
 #include "platform/files/FileDescriptor.h"
 #include "platform/files/PosixError.h"
@@ -15,7 +15,6 @@
 #include "platform/files/TemporaryFile.h"
 
 namespace platform {
-
 namespace {
 
 bool isDirectory(const std::string& path) {
@@ -36,18 +35,12 @@ void copyInsideKernel(const RegularFile& source, const TemporaryFile& copy) {
 }
 
 bool copyRest(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
-  std::array<char, std::size_t{128} << 10U> buffer;
+  std::vector<char> buffer(std::size_t{128} << 10U);
   for (;;) {
     const std::optional<std::size_t> count = source.read(buffer, error);
-    if (!count) {
-      return false;
-    }
-    if (*count == 0) {
-      return true;
-    }
-    if (!copy.write(std::string_view(buffer.data(), *count), error)) {
-      return false;
-    }
+    if (!count) return false;
+    if (*count == 0) return true;
+    if (!copy.write(std::string_view(buffer.data(), *count), error)) return false;
   }
 }
 
@@ -60,32 +53,23 @@ bool fileExists(const std::string& path) {
 
 bool mayBeSymbolicLink(const std::string& path) {
   struct stat status {};
-  if (::lstat(path.c_str(), &status) == 0) {
-    return S_ISLNK(status.st_mode);
-  }
+  if (::lstat(path.c_str(), &status) == 0) return S_ISLNK(status.st_mode);
   return errno != ENOENT && errno != ENOTDIR;
 }
 
 std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error) {
   const std::optional<RegularFile> file = RegularFile::open(path, error);
-  if (!file) {
-    return std::nullopt;
-  }
+  if (!file) return std::nullopt;
   // The whole is read once and then kept by us: it need not stay in the system's cache as well.
   ::posix_fadvise(file->descriptor(), 0, 0, POSIX_FADV_NOREUSE);
   std::string bytes;
-  const int failure = file->size() > kWholeReadLimit
-                          ? EFBIG
-                          : readToEnd(file->descriptor(), file->size(), kWholeReadLimit, bytes);
-  if (failure == EFBIG) {
-    error = ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"};
-    return std::nullopt;
+  const bool isTooLarge = file->size() > kWholeReadLimit;
+  if (!isTooLarge && readToEnd(file->descriptor(), file->size(), kWholeReadLimit, bytes)) {
+    return bytes;
   }
-  if (failure != 0) {
-    error = posixError(failure);
-    return std::nullopt;
-  }
-  return bytes;
+  error = isTooLarge || errno == EFBIG ? posixError(EFBIG, "The file is larger than 2 GiB")
+                                       : posixError(errno);
+  return std::nullopt;
 }
 
 bool createDirectories(const std::string& path, ErrorSlot& error) {
@@ -116,13 +100,9 @@ bool copyFile(const std::string& source, const std::string& destination) {
   ErrorSlot error;
   std::optional<RegularFile> original = RegularFile::open(source, error);
   struct stat status {};
-  if (!original || ::lstat(destination.c_str(), &status) == 0) {
-    return false;
-  }
+  if (!original || ::lstat(destination.c_str(), &status) == 0) return false;
   TemporaryFile copy;
-  if (!copy.create(destination, error)) {
-    return false;
-  }
+  if (!copy.create(destination, error)) return false;
   copyInsideKernel(*original, copy);
   return copyRest(*original, copy, error) && copy.commitNew(error);
 }

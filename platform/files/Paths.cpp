@@ -11,10 +11,9 @@
 #include <vector>
 
 #include "platform/files/PosixError.h"
-#include "platform/text/TextHelpers.h"
+#include "platform/text/Splitting.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kWorkingDirectory = ".";
@@ -43,9 +42,7 @@ std::size_t extensionDot(std::string_view component) {
 /// cannot be told.
 std::string homeDirectory(const std::string& user) {
   if (user.empty()) {
-    if (const char* home = std::getenv("HOME"); home != nullptr && *home != '\0') {
-      return home;
-    }
+    if (const char* home = std::getenv("HOME"); home != nullptr && *home != '\0') return home;
   }
   const passwd* entry = user.empty() ? ::getpwuid(::getuid()) : ::getpwnam(user.c_str());
   return entry != nullptr && entry->pw_dir != nullptr ? entry->pw_dir : "";
@@ -53,9 +50,7 @@ std::string homeDirectory(const std::string& user) {
 
 /// A tilde whose home directory cannot be told is a name like any other.
 std::string withTildeExpanded(std::string_view path) {
-  if (!path.starts_with('~')) {
-    return std::string(path);
-  }
+  if (!path.starts_with('~')) return std::string(path);
   const std::size_t end = std::min(path.find('/'), path.size());
   std::string home = homeDirectory(std::string(path.substr(1, end - 1)));
   return home.empty() ? std::string(path) : home.append(path.substr(end));
@@ -81,9 +76,7 @@ std::string_view pathWithoutExtension(std::string_view path) {
 }
 
 std::string joinedPath(std::string_view parent, std::string_view child) {
-  if (parent.empty() || child.empty()) {
-    return std::string(parent.empty() ? child : parent);
-  }
+  if (parent.empty() || child.empty()) return std::string(parent.empty() ? child : parent);
   std::string joined(parent);
   joined.append("/").append(child);
   const auto isDoubledSeparator = [](char first, char second) {
@@ -102,9 +95,7 @@ std::string standardisedPath(std::string_view path) {
   const bool isAbsolute = isAbsolutePath(expanded);
   std::vector<std::string_view> kept;
   for (const std::string_view component : splitAt(expanded, '/')) {
-    if (component.empty() || component == kWorkingDirectory) {
-      continue;
-    }
+    if (component.empty() || component == kWorkingDirectory) continue;
     const bool isParent = component == kParentDirectory;
     if (isParent && !kept.empty() && kept.back() != kParentDirectory) {
       kept.pop_back();
@@ -114,14 +105,10 @@ std::string standardisedPath(std::string_view path) {
   }
   std::string result;
   for (const std::string_view component : kept) {
-    if (isAbsolute || !result.empty()) {
-      result += '/';
-    }
+    if (isAbsolute || !result.empty()) result += '/';
     result += component;
   }
-  if (result.empty() && !expanded.empty()) {
-    return isAbsolute ? "/" : std::string(kWorkingDirectory);
-  }
+  if (result.empty() && !expanded.empty()) return isAbsolute ? "/" : std::string(kWorkingDirectory);
   return result;
 }
 

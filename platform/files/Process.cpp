@@ -4,12 +4,18 @@
 #include <malloc.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <csignal>
+#include <cstdlib>
 #include <initializer_list>
+#include <new>
+
+#include "platform/files/StandardStreams.h"
+#include "platform/files/TemporaryFile.h"
+#include "platform/text/Memory.h"
 
 namespace platform {
-
 namespace {
 
 /// What one stage of a run gives back, such as the bytes of a feed, the next one soon asks for. It
@@ -24,6 +30,15 @@ void keepFreedMemory() {
 #endif
 }
 
+/// The new-handler. It runs on any thread, amid whatever asked for memory, and asks for none.
+[[noreturn]] void endForWantOfMemory() {
+  static std::atomic_flag isEnding;
+  while (isEnding.test_and_set()) ::pause();  // another thread ends the process
+  flushStandardOutput();
+  writeToStandardError("Out of memory.\n");
+  TemporaryFile::removeAllAndExit(EXIT_FAILURE);
+}
+
 }  // namespace
 
 void prepareProcess() {
@@ -31,11 +46,11 @@ void prepareProcess() {
   std::signal(SIGXFSZ, SIG_IGN);
   for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     // Those below it are open, so that the lowest free one, which open gives, is this one.
-    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) {
-      ::open("/dev/null", O_RDWR);
-    }
+    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) ::open("/dev/null", O_RDWR);
   }
   keepFreedMemory();
+  std::set_new_handler(&endForWantOfMemory);
+  Memory::serveLibraries();
 }
 
 }  // namespace platform

@@ -9,16 +9,12 @@
 #include "platform/files/PosixError.h"
 
 namespace platform {
-
 namespace {
 
 /// Judges what a successful stat found; fills the slot for anything but a regular file.
 bool isRegular(const struct stat& status, ErrorSlot& error) {
-  if (S_ISREG(status.st_mode)) {
-    return true;
-  }
-  error = S_ISDIR(status.st_mode) ? posixError(EISDIR)
-                                  : ErrorRecord{"POSIX", EINVAL, "Not a regular file"};
+  if (S_ISREG(status.st_mode)) return true;
+  error = S_ISDIR(status.st_mode) ? posixError(EISDIR) : posixError(EINVAL, "Not a regular file");
   return false;
 }
 
@@ -40,9 +36,7 @@ std::optional<RegularFile> RegularFile::open(const std::string& path, ErrorSlot&
     error = posixError(errno);
     return std::nullopt;
   }
-  if (!isRegular(status, error)) {
-    return std::nullopt;
-  }
+  if (!isRegular(status, error)) return std::nullopt;
   return RegularFile(std::move(descriptor), static_cast<std::uint64_t>(status.st_size));
 }
 

@@ -3,14 +3,12 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <cstddef>
 #include <cstdio>
 
 #include "platform/files/FileManager.h"
 
 namespace platform {
-
 namespace {
 
 ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
@@ -36,9 +34,7 @@ std::FILE* outputStream() {
 
 std::string readStandardInput() {
   std::string bytes;
-  while (readToEnd(STDIN_FILENO, 0, kWholeReadLimit, bytes) == EAGAIN &&
-         waitForInput(STDIN_FILENO)) {
-  }
+  readToEnd(STDIN_FILENO, 0, kWholeReadLimit, bytes);
   return bytes;
 }
 
@@ -66,9 +62,7 @@ OutputFile::OutputFile(const std::string& path, Mode mode) {
 }
 
 bool OutputFile::write(std::string_view bytes) {
-  if (descriptor_ >= 0 && writeAll(descriptor_, bytes)) {
-    return true;
-  }
+  if (descriptor_ >= 0 && writeAll(descriptor_, bytes)) return true;
   descriptor_ = -1;
   return false;
 }

@@ -16,16 +16,15 @@
 #include <utility>
 
 #include "platform/files/PosixError.h"
+#include "platform/text/ASCII.h"
 
 namespace platform {
-
 namespace {
 
 // The name is short, so that it fits wherever the final name does, and random, so that runs that
 // share a directory do not meet.
 constexpr std::string_view kNamePrefix = ".qel-";
 constexpr std::string_view kNameSuffix = ".part";
-constexpr std::string_view kHexDigits = "0123456789abcdef";
 constexpr std::size_t kRandomBytes = 8;
 
 constexpr int kCreationAttempts = 100;
@@ -72,35 +71,28 @@ int moveReplacing(const char* from, const char* to) {
 }
 
 int moveNew(const char* from, const char* to) {
-  if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) {
-    return 0;
-  }
-  if (errno != EINVAL && errno != ENOSYS) {
-    return -1;
-  }
+  if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) return 0;
+  if (errno != EINVAL && errno != ENOSYS) return -1;
   // Some file systems (NFS) cannot rename that way. A link is refused for an existing name, too.
-  if (::link(from, to) != 0) {
-    return -1;
-  }
+  if (::link(from, to) != 0) return -1;
   ::unlink(from);
   return 0;
 }
 
 }  // namespace
 
-/// The temporary files that exist at this moment, for the signal handler.
+/// The temporary files that exist at this moment, for the signal handler and the new-handler.
 class TemporaryFile::Registry {
  public:
   /// While one exists, the handler neither runs on this thread nor reads the list on another: a
-  /// library's helper threads may be given a signal as well.
+  /// library's helper threads may be given a signal as well. Nothing is allocated meanwhile: where
+  /// memory runs out, the new-handler wants the list on the very thread that holds it.
   class Hold {
    public:
     Hold() {
       sigset_t signals;
       ::sigemptyset(&signals);
-      for (const int signal : kEndingSignals) {
-        ::sigaddset(&signals, signal);
-      }
+      for (const int signal : kEndingSignals) ::sigaddset(&signals, signal);
       ::pthread_sigmask(SIG_BLOCK, &signals, &previous_);
       acquire();
     }
@@ -120,15 +112,11 @@ class TemporaryFile::Registry {
   static void handleSignals() {
     struct sigaction action {};
     action.sa_handler = &Registry::removeAllAndEnd;
-    for (const int signal : kEndingSignals) {
-      ::sigaddset(&action.sa_mask, signal);
-    }
+    for (const int signal : kEndingSignals) ::sigaddset(&action.sa_mask, signal);
     for (const int signal : kEndingSignals) {
       struct sigaction current {};
       ::sigaction(signal, nullptr, &current);
-      if (current.sa_handler == SIG_DFL) {
-        ::sigaction(signal, &action, nullptr);
-      }
+      if (current.sa_handler == SIG_DFL) ::sigaction(signal, &action, nullptr);
     }
   }
 
@@ -138,13 +126,23 @@ class TemporaryFile::Registry {
   static void remove(TemporaryFile& file) {
     const Hold hold;
     TemporaryFile** link = &first_;
-    while (*link != &file) {
-      link = &(*link)->next_;
-    }
+    while (*link != &file) link = &(*link)->next_;
     *link = std::exchange(file.next_, nullptr);
   }
 
+  [[noreturn]] static void removeAllAndExit(int status) {
+    const Hold hold;
+    unlinkAll();
+    ::_exit(status);
+  }
+
  private:
+  static void unlinkAll() {
+    for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
+      ::unlink(file->path_.c_str());
+    }
+  }
+
   static void acquire() {
     while (busy_.test_and_set(std::memory_order_acquire)) {
     }
@@ -154,9 +152,7 @@ class TemporaryFile::Registry {
   /// is never released again: nothing is created any more.
   static void removeAllAndEnd(int signal) {
     acquire();
-    for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
-      ::unlink(file->path_.c_str());
-    }
+    unlinkAll();
     // The signal is blocked until the handler returns, and ends the process then.
     struct sigaction action {};
     action.sa_handler = SIG_DFL;
@@ -179,7 +175,7 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
     error = posixError(destination.empty() ? ENOENT : EINVAL);
     return false;
   }
-  destination_ = destination;  // before there is a file: memory may run out here
+  destination_ = destination;
   Registry::handleSignals();
   int failure = EEXIST;
   for (int attempt = 0; attempt < kCreationAttempts && failure == EEXIST; ++attempt) {
@@ -213,9 +209,7 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
 }
 
 bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
-  if (descriptor_.isOpen() && writeAll(descriptor_.get(), bytes)) {
-    return true;
-  }
+  if (descriptor_.isOpen() && writeAll(descriptor_.get(), bytes)) return true;
   error = posixError(descriptor_.isOpen() ? errno : EBADF);
   discard();
   return false;
@@ -243,10 +237,12 @@ bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorS
   return true;
 }
 
+void TemporaryFile::removeAllAndExit(int status) {
+  Registry::removeAllAndExit(status);
+}
+
 void TemporaryFile::discard() {
-  if (path_.empty()) {
-    return;
-  }
+  if (path_.empty()) return;
   ::unlink(path_.c_str());
   descriptor_.close();
   Registry::remove(*this);
@@ -266,23 +262,15 @@ void removeStaleTemporaryFiles(const std::string& directory) {
   // Not by <filesystem>, which ends the process where it gets no memory.
   const std::string parent = directory.empty() ? "." : directory;
   const std::unique_ptr<DIR, DirectoryCloser> entries(::opendir(parent.c_str()));
-  if (!entries) {
-    return;
-  }
+  if (!entries) return;
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string_view name = entry->d_name;
-    if (!isTemporaryFileName(name)) {
-      continue;
-    }
+    if (!isTemporaryFileName(name)) continue;
     const std::string path = std::string(parent).append("/").append(name);
     struct stat status {};
-    if (::lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
-      continue;
-    }
+    if (::lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) continue;
     const FileDescriptor file = FileDescriptor::open(path, O_RDWR | O_NONBLOCK | O_NOFOLLOW);
-    if (file.isOpen() && lock(file.get())) {
-      ::unlink(path.c_str());
-    }
+    if (file.isOpen() && lock(file.get())) ::unlink(path.c_str());
   }
 }
 

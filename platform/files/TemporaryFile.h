@@ -14,6 +14,10 @@ namespace platform {
 /// Unless a commit succeeded, the destructor removes it; so does any failure, and so do SIGINT,
 /// SIGTERM and SIGHUP where they would end the process. A symbolic link at the final name is
 /// replaced, never written through. Move-only is not needed: one scope owns it.
+///
+///     TemporaryFile file;
+///     return file.create("show/one.mp3", error) && file.write(bytes, error) &&
+///            file.commitReplacing(error);
 class TemporaryFile {
  public:
   TemporaryFile() = default;
@@ -34,6 +38,10 @@ class TemporaryFile {
 
   /// The open file, -1 before `create`, after a commit and after a failure.
   int descriptor() const { return descriptor_.get(); }
+
+  /// Removes all that exist in this process and ends it, with nothing of it run any more: no
+  /// destructors, no functions registered for its end. Asks for no memory, on any thread.
+  [[noreturn]] static void removeAllAndExit(int status);
 
  private:
   class Registry;

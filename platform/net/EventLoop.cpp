@@ -1,42 +1,39 @@
 #include "platform/net/EventLoop.h"
 
-#include <algorithm>
-#include <vector>
-
 #include "platform/net/EventSource.h"
 #include "platform/net/NetworkTransfer.h"
-#include "platform/net/PerThread.h"
 
 namespace platform {
 namespace {
 
-std::vector<EventSource*>& sourcesOfThisThread() {
-  return PerThread<std::vector<EventSource*>>::value();
-}
+/// The thread's sources, the oldest first.
+constinit thread_local EventSource* firstSource = nullptr;
 
 }  // namespace
 
 EventSource::EventSource() {
-  sourcesOfThisThread().push_back(this);
+  EventSource** link = &firstSource;
+  while (*link != nullptr) link = &(*link)->next_;
+  *link = this;
 }
 
 EventSource::~EventSource() {
-  std::erase(sourcesOfThisThread(), this);
+  EventSource** link = &firstSource;
+  while (*link != this) link = &(*link)->next_;
+  *link = next_;
 }
 
 bool runEventLoopOnce() {
-  const std::vector<EventSource*>& sources = sourcesOfThisThread();
-  if (sources.empty()) return false;
-  for (;;) {
-    const auto ready = std::find_if(sources.begin(), sources.end(),
-                                    [](const EventSource* source) { return source->hasEvent(); });
-    if (ready != sources.end()) {
+  while (firstSource != nullptr) {
+    for (EventSource* source = firstSource; source != nullptr; source = source->next_) {
+      if (!source->hasEvent()) continue;
       // One event only: its receiver may destroy or make sources, and run the loop itself.
-      (*ready)->deliverEvent();
+      source->deliverEvent();
       return true;
     }
     if (!NetworkTransfer::runAll()) return false;
   }
+  return false;
 }
 
 }  // namespace platform

@@ -15,6 +15,11 @@ class EventSource {
   virtual bool hasEvent() const = 0;
   /// Delivers one event. May end the source's life.
   virtual void deliverEvent() = 0;
+
+ private:
+  friend bool runEventLoopOnce();
+
+  EventSource* next_ = nullptr;  // of its thread's
 };
 
 }  // namespace platform

@@ -1,7 +1,8 @@
 #include "platform/net/GzipDecoder.h"
 
 #include <climits>
-#include <new>
+
+#include "platform/text/Memory.h"
 
 namespace platform {
 
@@ -11,9 +12,12 @@ GzipDecoder::~GzipDecoder() {
 
 bool GzipDecoder::openMember() {
   constexpr int kGzipOnly = 16;
+  stream_.zalloc = [](void*, uInt count, uInt size) {
+    return Memory::allocate(std::size_t{count} * size);
+  };
+  stream_.zfree = [](void*, void* block) { Memory::release(block); };
   const int result = state_ == State::kUnopened ? inflateInit2(&stream_, MAX_WBITS + kGzipOnly)
                                                 : inflateReset(&stream_);
-  if (result == Z_MEM_ERROR) throw std::bad_alloc();
   if (result == Z_OK) state_ = State::kInMember;
   return result == Z_OK;
 }
@@ -34,7 +38,6 @@ bool GzipDecoder::decode(std::string_view bytes, const ByteSink& sink) {
       if (size > 0 && !sink({output_.data(), size})) return false;
     } while (result == Z_OK);
     // Z_BUF_ERROR only says that all input is used up.
-    if (result == Z_MEM_ERROR) throw std::bad_alloc();
     if (result != Z_STREAM_END && result != Z_BUF_ERROR) return false;
     if (result == Z_STREAM_END) state_ = State::kBetweenMembers;
     bytes.remove_prefix(input.size() - stream_.avail_in);

@@ -2,10 +2,14 @@
 
 #include <dlfcn.h>
 
+#include <string>
+#include <string_view>
 #include <type_traits>
+#include <utility>
+
+#include "platform/text/Memory.h"
 
 namespace platform {
-
 namespace {
 
 /// The file of the only binary interface that the library has had since 2006.
@@ -13,10 +17,21 @@ constexpr const char* kFile = "libcurl.so.4";
 
 ErrorRecord loadingError() {
   const char* const cause = dlerror();
-  return {"transfer", CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded"};
+  std::string description = cause != nullptr ? cause : "libcurl cannot be loaded";
+  // A file that was found is called by its whole path.
+  if (std::string_view(description).starts_with(kFile)) {
+    description +=
+        "; http and https need it: install the package libcurl4 (Debian, Ubuntu) or libcurl "
+        "(Fedora)";
+  }
+  return transferError(CURLE_FAILED_INIT, std::move(description));
 }
 
 }  // namespace
+
+ErrorRecord transferError(CURLcode code, std::string description) {
+  return {"transfer", code, std::move(description)};
+}
 
 TransferLibrary::TransferLibrary() {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
@@ -29,7 +44,7 @@ TransferLibrary::TransferLibrary() {
     function = reinterpret_cast<std::decay_t<decltype(function)>>(dlsym(library, name));
     if (function == nullptr && !error_) error_ = loadingError();
   };
-  find(globalInit, "curl_global_init");
+  find(globalInit, "curl_global_init_mem");
   find(easyInit, "curl_easy_init");
   find(easyCleanup, "curl_easy_cleanup");
   find(easySetopt, "curl_easy_setopt");
@@ -46,6 +61,11 @@ TransferLibrary::TransferLibrary() {
   find(url, "curl_url");
   find(urlCleanup, "curl_url_cleanup");
   find(urlSet, "curl_url_set");
+  if (error_) return;
+  const CURLcode result =
+      globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
+                 &Memory::duplicate, &Memory::allocateZeroed);
+  if (result != CURLE_OK) error_ = transferError(result, easyStrerror(result));
 }
 
 const TransferLibrary& TransferLibrary::instance() {

@@ -2,23 +2,29 @@
 
 #include <curl/curl.h>
 
+#include <string>
+
 #include "platform/text/ErrorRecord.h"
 
 namespace platform {
+
+/// The record of a failed transfer, whatever noticed it: domain "transfer", with the library's
+/// codes.
+ErrorRecord transferError(CURLcode code, std::string description);
 
 /// The functions of libcurl that we call. For the use of platform/ alone.
 ///
 /// The library is not linked but loaded when its first function is asked for: it brings some forty
 /// other libraries along, and only http and https need any of them. Loading those takes longer than
-/// the whole rest of a run that reads and writes local files.
+/// the whole rest of a run that reads and writes local files. Once loaded it is set up for use.
 class TransferLibrary {
  public:
-  /// The functions; null when the library cannot be loaded.
+  /// The functions; null when the library cannot be loaded or set up.
   static const TransferLibrary* functions() { return instance().error_ ? nullptr : &instance(); }
   /// Why there are no functions; empty when there are.
   static const ErrorSlot& error() { return instance().error_; }
 
-  decltype(&::curl_global_init) globalInit = nullptr;
+  decltype(&::curl_global_init_mem) globalInit = nullptr;
   decltype(&::curl_easy_init) easyInit = nullptr;
   decltype(&::curl_easy_cleanup) easyCleanup = nullptr;
   decltype(&::curl_easy_setopt) easySetopt = nullptr;

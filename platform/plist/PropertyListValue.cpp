@@ -6,7 +6,7 @@
 #include <limits>
 #include <type_traits>
 
-#include "platform/text/TextHelpers.h"
+#include "platform/text/LeadingInteger.h"
 
 namespace platform {
 

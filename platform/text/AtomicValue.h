@@ -1,6 +1,7 @@
 #pragma once
 
 #include <atomic>
+#include <thread>
 #include <utility>
 
 namespace platform {
@@ -32,14 +33,9 @@ class AtomicValue {
   class Guard {
    public:
     explicit Guard(std::atomic_flag& busy) : busy_(busy) {
-      while (busy_.test_and_set(std::memory_order_acquire)) {
-        busy_.wait(true, std::memory_order_relaxed);
-      }
+      while (busy_.test_and_set(std::memory_order_acquire)) std::this_thread::yield();
     }
-    ~Guard() {
-      busy_.clear(std::memory_order_release);
-      busy_.notify_one();
-    }
+    ~Guard() { busy_.clear(std::memory_order_release); }
     Guard(const Guard&) = delete;
     Guard& operator=(const Guard&) = delete;
 

@@ -7,10 +7,11 @@
 namespace platform {
 namespace {
 
-// The digits of the largest double before its point, and room for the sign, the point and one more.
+/// The digits of the largest double before its point, and room for the sign, the point and one
+/// more.
 constexpr std::size_t kLongestNumber = 320;
 
-// std::to_chars writes what printf writes in the C locale, whatever the locale of the process.
+/// std::to_chars writes what printf writes in the C locale, whatever the locale of the process.
 template <typename... Number>
 void appendNumber(std::string& result, Number... numberAndFormat) {
   std::array<char, kLongestNumber> characters;

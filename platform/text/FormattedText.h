@@ -37,6 +37,10 @@ class FormatArgument {
 /// "%s" take a text, "%ld" and "%lu" an integer, "%0.1f" a floating-point number with one decimal,
 /// "%%" is a percent sign. Surplus arguments are ignored; a placeholder without an argument inserts
 /// "(null)".
+///
+///     formattedText("%@: \"%@\"", {"Unsupported", title});  // Unsupported: "Pilot"
+///     formattedText("%lu / %lu (%0.1f%%)", {512U, 2048U, 25.0});  // 512 / 2048 (25.0%)
+///     formattedText("<%@>", {OptionalText()});  // <(null)>
 std::string formattedText(std::string_view format, std::initializer_list<FormatArgument> arguments);
 
 }  // namespace platform

@@ -1,8 +1,9 @@
 #pragma once
 
+#include <concepts>
 #include <cstddef>
 #include <memory>
-#include <ostream>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -14,7 +15,12 @@ namespace platform {
 /// The texts of a podcast pass from the parser to a record to an output dictionary, and are often
 /// megabytes long; a copy of a Text is a copy of a handle. Since the characters never change, a
 /// Text that was handed out stays valid and unchanged whatever its source does later, on any
-/// thread. An absent text is a std::optional<Text> without a value, distinct from an empty Text.
+/// thread.
+///
+///     const Text title("The Long Way Round");  // copies the characters, once
+///     const Text same = title;                 // copies no character
+///     const Text key = "PodcastName"_text;     // a literal's characters are never copied
+///     if (title == "The Long Way Round") takesAView(title);  // a Text converts to string_view
 class Text {
  public:
   /// The empty text.
@@ -43,16 +49,10 @@ class Text {
   /// The length in bytes.
   std::size_t size() const { return size_; }
 
-  friend bool operator==(const Text& left, const Text& right) {
-    return left.view() == right.view();
-  }
-  friend bool operator==(const Text& left, std::string_view right) { return left.view() == right; }
-  friend bool operator==(const Text& left, const char* right) { return left.view() == right; }
-  friend bool operator==(const Text& left, const std::string& right) {
-    return left.view() == right;
-  }
-  friend std::ostream& operator<<(std::ostream& stream, const Text& text) {
-    return stream << text.view();
+  /// Whether the characters are those of the other text, of whatever type.
+  template <std::convertible_to<std::string_view> Other>
+  friend bool operator==(const Text& left, const Other& right) {
+    return left.view() == std::string_view(right);
   }
 
  private:
@@ -71,6 +71,9 @@ class Text {
   std::size_t size_ = 0;
   // NOLINTEND(modernize-avoid-c-arrays)
 };
+
+/// A text that may be absent, which is not the same as empty.
+using OptionalText = std::optional<Text>;
 
 /// The text of a literal ("title"_text): nothing is copied or counted, since literals last.
 inline Text operator""_text(const char* bytes, std::size_t size) {

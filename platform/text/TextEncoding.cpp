@@ -9,10 +9,7 @@
 #include <memory>
 #include <utility>
 
-#include "platform/text/ICUMemory.h"
-
 namespace platform {
-
 namespace {
 
 struct ConverterCloser {
@@ -41,7 +38,10 @@ Converter openConverter(const std::string& encoding) {
   return U_SUCCESS(status) != 0 ? std::move(converter) : nullptr;
 }
 
-std::optional<std::string> converted(std::string_view bytes, std::string_view encoding) {
+}  // namespace
+
+std::optional<std::string> convertedToUTF8(std::string_view bytes, std::string_view encoding) {
+  if (!isPlausibleName(encoding)) return std::nullopt;
   const Converter from = openConverter(std::string(encoding));
   const Converter to = openConverter("UTF-8");
   if (!from || !to) return std::nullopt;
@@ -71,21 +71,12 @@ std::optional<std::string> converted(std::string_view bytes, std::string_view en
   return result;
 }
 
-}  // namespace
-
-std::optional<std::string> convertedToUTF8(std::string_view bytes, std::string_view encoding) {
-  if (!isPlausibleName(encoding)) return std::nullopt;
-  return usingICU([&] { return converted(bytes, encoding); });
-}
-
 std::optional<std::string> canonicalEncodingName(std::string_view encoding) {
   if (!isPlausibleName(encoding)) return std::nullopt;
-  return usingICU([&]() -> std::optional<std::string> {
-    UErrorCode status = U_ZERO_ERROR;
-    const char* const name = ucnv_getAlias(std::string(encoding).c_str(), 0, &status);
-    if (name == nullptr) return std::nullopt;
-    return name;
-  });
+  UErrorCode status = U_ZERO_ERROR;
+  const char* const name = ucnv_getAlias(std::string(encoding).c_str(), 0, &status);
+  if (name == nullptr) return std::nullopt;
+  return name;
 }
 
 }  // namespace platform

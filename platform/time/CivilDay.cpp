@@ -3,7 +3,6 @@
 #include <chrono>
 
 namespace platform {
-
 namespace {
 
 // After so many years, and days, the calendar repeats itself.

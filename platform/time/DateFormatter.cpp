@@ -13,7 +13,6 @@
 #include <limits>
 #include <utility>
 
-#include "platform/text/ICUMemory.h"
 #include "platform/time/TimeZone.h"
 
 namespace platform {
@@ -91,12 +90,12 @@ class DateFormatter::Implementation {
 };
 
 DateFormatter::DateFormatter(std::string_view pattern)
-    : implementation_(usingICU([&] { return std::make_unique<Implementation>(pattern); })) {}
+    : implementation_(std::make_unique<Implementation>(pattern)) {}
 
 DateFormatter::~DateFormatter() = default;
 
 std::string DateFormatter::format(PointInTime date) const {
-  return usingICU([&] { return implementation_->format(date); });
+  return implementation_->format(date);
 }
 
 }  // namespace platform

@@ -7,8 +7,6 @@
 #include <ctime>
 #include <mutex>
 
-#include "platform/text/ICUMemory.h"
-
 namespace platform {
 
 class TimeZone::Rules {
@@ -40,7 +38,6 @@ class DatabaseRules final : public TimeZone::Rules {
     std::int32_t daylight = 0;
     zone_->getOffset(static_cast<UDate>(time.count()), static_cast<UBool>(isLocalTime), standard,
                      daylight, status);
-    requireICUMemory();
     return (std::int64_t{standard} + daylight) / kMillisecondsPerSecond;
   }
 
@@ -75,7 +72,9 @@ class CLibraryRules final : public TimeZone::Rules {
 
 using SharedRules = std::shared_ptr<const TimeZone::Rules>;
 
-SharedRules newDatabaseRules(std::string_view name) {
+/// The rules of the zone of the database; null when there is none.
+SharedRules databaseRules(std::string_view name) {
+  if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
   // ICU makes a zone of any name: of "GMT+5" an offset, of an unknown one the zone Etc/Unknown.
   const icu::UnicodeString id = icu::UnicodeString::fromUTF8(icu::StringPiece(name));
   icu::UnicodeString canonicalID;
@@ -85,12 +84,6 @@ SharedRules newDatabaseRules(std::string_view name) {
   if (U_FAILURE(status) != 0 || isInDatabase == 0) return nullptr;
   return std::make_shared<const DatabaseRules>(
       std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id)));
-}
-
-/// The rules of the zone of the database; null when there is none.
-SharedRules databaseRules(std::string_view name) {
-  if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
-  return usingICU([&] { return newDatabaseRules(name); });
 }
 
 /// A text of TZ that may name a zone of the database: ":name" or a path into the database.

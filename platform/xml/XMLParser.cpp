@@ -12,6 +12,7 @@
 #include <new>
 #include <type_traits>
 
+#include "platform/text/Memory.h"
 #include "platform/text/TextEncoding.h"
 
 namespace platform {
@@ -215,8 +216,9 @@ struct XMLParser::Run {
         elementsLeft(kElementsAllowance + kElementsPerByte * document.size()),
         textLeft(kTextAllowance + kTextPerByte * document.size()) {
     // The text is UTF-8 by now, whatever its declaration says.
-    handle.reset(XML_ParserCreate("UTF-8"));
-    if (!handle) throw std::bad_alloc();
+    const XML_Memory_Handling_Suite memory = {&Memory::allocate, &Memory::reallocate,
+                                              &Memory::release};
+    handle.reset(XML_ParserCreate_MM("UTF-8", &memory, nullptr));
     XML_SetUserData(handle.get(), this);
     XML_SetElementHandler(handle.get(), startElement, endElement);
     XML_SetCharacterDataHandler(handle.get(), characters);

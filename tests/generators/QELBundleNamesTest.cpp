@@ -29,7 +29,7 @@ TEST(QELBundleNamesTest, TakesTheLastComponentOfALocation) {
       {"http://h/a%2Fb", Text("other"), "a%2Fb"},
   };
   for (const auto& row : rows) {
-    EXPECT_EQ(QELFileName(row.location, row.referenceType), row.name) << row.location;
+    EXPECT_EQ(QELFileName({Text(row.location), row.referenceType}), row.name) << row.location;
   }
 }
 

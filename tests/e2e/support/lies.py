@@ -5,7 +5,6 @@ downloads alike and have the same outcome. `python3 lies.py` prints the catalogu
 """
 
 import gzip
-import itertools
 import time
 import zlib
 from typing import Callable, NamedTuple, Union
@@ -146,7 +145,8 @@ UNFRAMED = Cause("The header does not tell where the body ends")
 TRANSFER_CODING = Cause("The body comes in a transfer coding that was not asked for")
 CONTENT_CODING = Cause("The body comes in a content coding that was not asked for")
 CUT_HEADER = Cause("The header of the answer is cut short")
-LONG_LINE = Cause("A line of the answer's header is too long, or memory has run out")
+LONG_LINE = Cause("A line of the answer's header is too long")
+OUT_OF_MEMORY = Cause("Out of memory.")
 CUT_STREAM = Cause("The compressed body is cut short")
 BAD_STREAM = Cause("The compressed body is malformed")
 EMPTY = Cause("Could not load or read the specified feed URL")
@@ -360,7 +360,7 @@ LIES = {
         Lie("a host that does not exist", At(lambda servers, path: f"http://nowhere.invalid{path}"),
             LibraryCause("Could not resolve host: nowhere.invalid")),
         Lie("an endless body; media may be of any size", endless(answer(body=b""), b"x" * (1 << 20)),
-            Cause("Out of memory"), NOT_ASKED),
+            OUT_OF_MEMORY, NOT_ASKED),
     ),
     "TLS": (
         Lie("a good certificate", tls("good")),
@@ -381,17 +381,12 @@ LIES = {
 }
 
 
-def rows():
-    """All lies, with their sections."""
-    return [(section, lie) for section, lies in LIES.items() for lie in lies]
-
-
 def table():
     """The catalogue in Markdown."""
     lines = ["| what the server does | a feed is | media and posters are |", "|---|---|---|"]
-    for section, lies in itertools.groupby(rows(), key=lambda row: row[0]):
+    for section, lies in LIES.items():
         lines.append(f"| **{section}** | | |")
-        for _, lie in lies:
+        for lie in lies:
             feed = lie.feed if lie.feed is READ else f"refused: `{lie.feed}`"
             outcome = lie.outcome
             if isinstance(outcome, bytes):

@@ -10,7 +10,6 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
-#include <limits>
 #include <string>
 #include <utility>
 
@@ -167,13 +166,36 @@ TEST(FileDescriptorTest, WriteThatTakesNothingFails) {
             0);
 }
 
-TEST(FileDescriptorTest, ReadingMoreThanMemoryHoldsFails) {
-  const Pipe pipe;
-  ASSERT_TRUE(writeAll(pipe.writeEnd.get(), "more"));
-  constexpr std::uint64_t kHuge = std::numeric_limits<std::int64_t>::max();
-  std::string bytes = "kept";
-  EXPECT_EQ(readToEnd(pipe.readEnd.get(), kHuge - 1, kHuge, bytes), ENOMEM);
-  EXPECT_EQ(bytes, "kept");
+TEST(FileDescriptorTest, ReadingStopsAtTheLimitWhateverSizeWasExpected) {
+  const TemporaryDirectory directory;
+  std::string content(200000, '\0');
+  for (std::size_t index = 0; index < content.size(); ++index) {
+    content[index] = static_cast<char>((index * 31 + index / 251) & 0xFFU);
+  }
+  const std::string path = directory.addFile("file", content);
+  struct Row {
+    std::uint64_t expectedSize;
+    std::uint64_t limit;
+    bool isRead;
+  };
+  for (const auto& [expectedSize, limit, isRead] : std::array<Row, 8>{{
+           {200000, 200000, true},
+           {200000, 199999, false},
+           {0, 200000, true},
+           {0, 199999, false},
+           {5, 200001, true},
+           {5, 100, false},
+           {5, 0, false},
+           {1000000, 500000, true},
+       }}) {
+    SCOPED_TRACE(testing::Message() << "expected " << expectedSize << ", limit " << limit);
+    const FileDescriptor file = FileDescriptor::open(path, O_RDONLY);
+    std::string bytes = "replaced";
+    errno = 0;
+    EXPECT_EQ(readToEnd(file.get(), expectedSize, limit, bytes), isRead);
+    EXPECT_EQ(errno, isRead ? 0 : EFBIG);
+    EXPECT_EQ(bytes, content.substr(0, limit));
+  }
 }
 
 }  // namespace

@@ -126,32 +126,6 @@ TEST_F(FileManagerTest, FilesOverTheLimitAreNotRead) {
   EXPECT_EQ(error_, (ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"}));
 }
 
-TEST_F(FileManagerTest, ReadingStopsAtTheLimitWhateverTheSizeSaid) {
-  const std::string content = largeContent(200000);
-  const std::string path = directory_.addFile("file", content);
-  struct Row {
-    std::uint64_t expectedSize;
-    std::uint64_t limit;
-    int result;
-  };
-  for (const auto& [expectedSize, limit, result] : std::array<Row, 8>{{
-           {200000, 200000, 0},
-           {200000, 199999, EFBIG},
-           {0, 200000, 0},
-           {0, 199999, EFBIG},
-           {5, 200001, 0},
-           {5, 100, EFBIG},
-           {5, 0, EFBIG},
-           {1000000, 500000, 0},
-       }}) {
-    SCOPED_TRACE(testing::Message() << "expected " << expectedSize << ", limit " << limit);
-    const FileDescriptor file = FileDescriptor::open(path, O_RDONLY);
-    std::string bytes;
-    EXPECT_EQ(readToEnd(file.get(), expectedSize, limit, bytes), result);
-    EXPECT_EQ(bytes, content.substr(0, limit));
-  }
-}
-
 TEST_F(FileManagerTest, CreatesAllMissingDirectories) {
   for (const char* path : {"a", "b/c/d", "e/", "f//g///", "./h", "i/../j", "k/."}) {
     SCOPED_TRACE(path);
@@ -231,9 +205,7 @@ TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
     SCOPED_TRACE(refusal);
     const std::string copy = directory_ / ("copy" + std::to_string(refusal));
     EXPECT_EQ(exitStatusOfChild([&] {
-                if (!refuseSystemCall(SYS_copy_file_range, refusal)) {
-                  return 1;
-                }
+                if (!refuseSystemCall(SYS_copy_file_range, refusal)) return 1;
                 return copyFile(source, copy) ? 0 : 2;
               }),
               0);
@@ -265,9 +237,7 @@ TEST_F(FileManagerTest, CopyLeavesAloneWhatAppearsMeanwhile) {
 TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
   const std::string source = directory_.addFile("source", "content");
   EXPECT_EQ(exitStatusOfChild([&] {
-              if (!refuseSystemCall(SYS_read, EIO)) {
-                return 1;
-              }
+              if (!refuseSystemCall(SYS_read, EIO)) return 1;
               return copyFile(source, directory_ / "copy") ? 2 : 0;
             }),
             0);
@@ -277,13 +247,9 @@ TEST_F(FileManagerTest, CopyOfWhatCannotBeReadLeavesNothing) {
 TEST_F(FileManagerTest, WholeReadTellsWhyItFailed) {
   const std::string path = directory_.addFile("file", "content");
   EXPECT_EQ(exitStatusOfChild([&] {
-              if (!refuseSystemCall(SYS_read, EIO)) {
-                return 1;
-              }
+              if (!refuseSystemCall(SYS_read, EIO)) return 1;
               ErrorSlot error;
-              if (readWholeFile(path, error)) {
-                return 2;
-              }
+              if (readWholeFile(path, error)) return 2;
               return error == ErrorRecord{"POSIX", EIO, "Input/output error"} ? 0 : 3;
             }),
             0);

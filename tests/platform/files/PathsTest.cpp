@@ -145,9 +145,7 @@ TEST(PathsTest, StandardisedPath) {
 
 TEST(PathsTest, TildeWithoutHomeIsTheUsersEntry) {
   const passwd* entry = ::getpwuid(::getuid());
-  if (entry == nullptr) {
-    GTEST_SKIP() << "this user has no entry";
-  }
+  if (entry == nullptr) GTEST_SKIP() << "this user has no entry";
   const std::string expected = standardisedPath(joinedPath(entry->pw_dir, "a"));
   for (const char* home : {static_cast<const char*>(nullptr), ""}) {
     const EnvironmentGuard guard("HOME", home);
@@ -159,9 +157,7 @@ TEST(PathsTest, TildeWithANameIsThatUsersHome) {
   const EnvironmentGuard home("HOME", "/home/u");
   EXPECT_EQ(standardisedPath("~qel-no-such-user/a/."), "~qel-no-such-user/a");
   const passwd* root = ::getpwnam("root");
-  if (root == nullptr) {
-    GTEST_SKIP() << "there is no user named root";
-  }
+  if (root == nullptr) GTEST_SKIP() << "there is no user named root";
   EXPECT_EQ(standardisedPath("~root/a"), standardisedPath(joinedPath(root->pw_dir, "a")));
 }
 
@@ -171,9 +167,7 @@ TEST(PathsTest, CurrentDirectory) {
   EXPECT_EQ(exitStatusOfChild([&] {
               std::filesystem::current_path(directory.path());
               ErrorSlot error;
-              if (currentDirectory(error) != expected || error) {
-                return 1;
-              }
+              if (currentDirectory(error) != expected || error) return 1;
               std::filesystem::remove(directory.path());
               return !currentDirectory(error) && error == posixError(ENOENT) ? 0 : 2;
             }),

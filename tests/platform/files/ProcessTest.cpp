@@ -9,7 +9,14 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
+#include <functional>
+#include <new>
+#include <string>
+#include <thread>
+#include <vector>
 
+#include "platform/files/StandardStreams.h"
+#include "platform/files/TemporaryFile.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -21,9 +28,7 @@ TEST(ProcessTest, ClosedPipeIsAFailedWrite) {
               ::signal(SIGPIPE, SIG_DFL);
               prepareProcess();
               std::array<int, 2> ends{};
-              if (::pipe(ends.data()) != 0) {
-                return 1;
-              }
+              if (::pipe(ends.data()) != 0) return 1;
               ::close(ends[0]);
               return ::write(ends[1], "x", 1) == -1 && errno == EPIPE ? 0 : 2;
             }),
@@ -60,22 +65,70 @@ TEST(ProcessTest, ClosedStandardStreamsAreOpenedOnNothing) {
                 const int file = ::open(path.c_str(), O_RDWR);
                 for (int descriptor = 0; descriptor < 3; ++descriptor) {
                   ::dup2(file, descriptor);
-                  if ((closed >> static_cast<unsigned>(descriptor) & 1U) != 0) {
-                    ::close(descriptor);
-                  }
+                  if ((closed >> static_cast<unsigned>(descriptor) & 1U) != 0) ::close(descriptor);
                 }
                 ::close(file);
                 prepareProcess();
                 for (int descriptor = 0; descriptor < 3; ++descriptor) {
                   const bool wasClosed = (closed >> static_cast<unsigned>(descriptor) & 1U) != 0;
-                  if (isOpenOnNothing(descriptor) != wasClosed) {
-                    return 1;
-                  }
+                  if (isOpenOnNothing(descriptor) != wasClosed) return 1;
                 }
                 return ::open(path.c_str(), O_RDONLY) > 2 ? 0 : 2;
               }),
               0);
   }
+}
+
+struct End {
+  int status;
+  std::string output;
+  std::string error;
+  std::vector<std::string> files;  // that stayed
+};
+
+/// The end of a process that has printed a line and writes two files when something happens to it.
+End endAfter(const std::function<void()>& happen) {
+  const TemporaryDirectory directory;
+  testing::internal::CaptureStdout();
+  testing::internal::CaptureStderr();
+  const int status = exitStatusOfChild([&] {
+    prepareProcess();
+    ErrorSlot error;
+    TemporaryFile first;
+    TemporaryFile second;
+    if (!first.create(directory / "first", error)) return 2;
+    if (!second.create(directory / "second", error)) return 3;
+    writeToStandardOutput("a line\n");
+    happen();
+    return 4;
+  });
+  return {status, testing::internal::GetCapturedStdout(), testing::internal::GetCapturedStderr(),
+          directory.names()};
+}
+
+void exhaustMemory() {
+  std::get_new_handler()();
+}
+
+void expectOneMessageAndNoFiles(const std::function<void()>& happen) {
+  const End end = endAfter(happen);
+  EXPECT_EQ(end.status, 1);
+  EXPECT_EQ(end.output, "a line\n");
+  EXPECT_EQ(end.error, "Out of memory.\n");
+  EXPECT_EQ(end.files, std::vector<std::string>());
+}
+
+TEST(ProcessTest, ExhaustedMemoryEndsIt) {
+  expectOneMessageAndNoFiles(&exhaustMemory);
+}
+
+TEST(ProcessTest, ThreadsThatExhaustMemoryEndItOnce) {
+  expectOneMessageAndNoFiles([] { std::thread(&exhaustMemory).join(); });
+  expectOneMessageAndNoFiles([] {
+    std::thread another(&exhaustMemory);
+    exhaustMemory();
+    another.join();
+  });
 }
 
 }  // namespace

@@ -51,16 +51,14 @@ void makeNonBlocking(const FileDescriptor& descriptor) {
 
 std::string allFrom(const FileDescriptor& descriptor) {
   std::string bytes;
-  EXPECT_EQ(readToEnd(descriptor.get(), 0, 1U << 30U, bytes), 0);
+  EXPECT_TRUE(readToEnd(descriptor.get(), 0, 1U << 30U, bytes));
   return bytes;
 }
 
 /// More than a pipe holds.
 std::string longText() {
   std::string text;
-  for (int line = 0; line < 60000; ++line) {
-    text += std::to_string(line) + "\n";
-  }
+  for (int line = 0; line < 60000; ++line) text += std::to_string(line) + "\n";
   return text;
 }
 
@@ -84,9 +82,7 @@ TEST_F(StandardStreamsTest, ReadsStandardInputInPiecesToItsEnd) {
   for (const bool isNonBlocking : {false, true}) {
     SCOPED_TRACE(isNonBlocking ? "non-blocking" : "blocking");
     Connection pipe = makePipe();
-    if (isNonBlocking) {
-      makeNonBlocking(pipe.readEnd);
-    }
+    if (isNonBlocking) makeNonBlocking(pipe.readEnd);
     std::thread writer([&] {
       writeAll(pipe.writeEnd.get(), text.substr(0, 10));
       ::usleep(20000);
@@ -108,9 +104,7 @@ TEST_F(StandardStreamsTest, UnreadableStandardInputIsEmpty) {
   EXPECT_EQ(exitStatusOfChild([&] {
               const FileDescriptor directory = FileDescriptor::open(directory_.path(), O_RDONLY);
               ::dup2(directory.get(), STDIN_FILENO);
-              if (!readStandardInput().empty()) {
-                return 1;
-              }
+              if (!readStandardInput().empty()) return 1;
               ::close(STDIN_FILENO);
               return readStandardInput().empty() ? 0 : 2;
             }),
@@ -123,9 +117,7 @@ TEST_F(StandardStreamsTest, StandardInputThatCannotBeWaitedForIsItsEnd) {
   ASSERT_TRUE(writeAll(pipe.writeEnd.get(), "first"));
   EXPECT_EQ(exitStatusOfChild([&] {
               ::dup2(pipe.readEnd.get(), STDIN_FILENO);
-              if (!refuseSystemCall(SYS_poll, ENOMEM)) {
-                return 1;
-              }
+              if (!refuseSystemCall(SYS_poll, ENOMEM)) return 1;
               return readStandardInput() == "first" ? 0 : 2;
             }),
             0);
@@ -273,9 +265,7 @@ TEST_F(StandardStreamsTest, StandardOutputPathServesPipesAndSockets) {
       SCOPED_TRACE(testing::Message()
                    << "socket " << isSocket << " non-blocking " << isNonBlocking);
       Connection connection = isSocket ? makeSocketPair() : makePipe();
-      if (isNonBlocking) {
-        makeNonBlocking(connection.writeEnd);
-      }
+      if (isNonBlocking) makeNonBlocking(connection.writeEnd);
       std::string received;
       std::thread reader([&] {
         ::usleep(20000);

@@ -169,16 +169,12 @@ TEST_F(TemporaryFileTest, CommitNewDoesWithoutAnExclusiveRename) {
     EXPECT_EQ(exitStatusOfChild([&] {
                 TemporaryFile file;
                 ErrorSlot error;
-                if (!refuseSystemCall(SYS_renameat2, refusal)) {
-                  return 1;
-                }
+                if (!refuseSystemCall(SYS_renameat2, refusal)) return 1;
                 if (!file.create(directory_ / name, error) || !file.write("x", error) ||
                     !file.commitNew(error)) {
                   return 2;
                 }
-                if (!file.create(directory_ / "taken", error) || file.commitNew(error)) {
-                  return 3;
-                }
+                if (!file.create(directory_ / "taken", error) || file.commitNew(error)) return 3;
                 return error && error->description == "File exists" ? 0 : 4;
               }),
               0);
@@ -192,9 +188,7 @@ TEST_F(TemporaryFileTest, DoesWithoutLocks) {
   EXPECT_EQ(exitStatusOfChild([&] {
               TemporaryFile file;
               ErrorSlot error;
-              if (!refuseSystemCall(SYS_flock, ENOLCK)) {
-                return 1;
-              }
+              if (!refuseSystemCall(SYS_flock, ENOLCK)) return 1;
               return file.create(directory_ / "a", error) && file.commitNew(error) ? 0 : 2;
             }),
             0);
@@ -209,9 +203,7 @@ TEST_F(TemporaryFileTest, FailedCloseFailsTheCommit) {
               if (!file.create(directory_ / "a", error) || !refuseSystemCall(SYS_close, EIO)) {
                 return 1;
               }
-              if (file.commitReplacing(error) || !error) {
-                return 2;
-              }
+              if (file.commitReplacing(error) || !error) return 2;
               return error->description == "Input/output error" ? 0 : 3;
             }),
             0);
@@ -311,9 +303,7 @@ TEST_F(TemporaryFileTest, ShortWriteFailsAndRemovesTheFile) {
             error->description != "File too large") {
           return 2;
         }
-        if (file.descriptor() != -1 || !directory_.names().empty()) {
-          return 3;
-        }
+        if (file.descriptor() != -1 || !directory_.names().empty()) return 3;
         error.reset();
         return !file.write("x", error) && error && !file.commitNew(error) ? 0 : 4;
       }),
@@ -376,17 +366,11 @@ TEST_F(TemporaryFileTest, SignalsAtAnyMomentLeaveNothing) {
       for (;;) {
         TemporaryFile file;
         ErrorSlot error;
-        if (!file.create(directory_ / "a", error) || !file.write("x", error)) {
-          ::_exit(1);
-        }
-        if (!file.commitReplacing(error)) {
-          ::_exit(2);
-        }
+        if (!file.create(directory_ / "a", error) || !file.write("x", error)) ::_exit(1);
+        if (!file.commitReplacing(error)) ::_exit(2);
       }
     }
-    while (!std::filesystem::exists(directory_ / "a")) {
-      std::this_thread::yield();
-    }
+    while (!std::filesystem::exists(directory_ / "a")) std::this_thread::yield();
     ::usleep(static_cast<useconds_t>(round * 37));
     ::kill(child, SIGTERM);
     int status = 0;
@@ -404,9 +388,7 @@ TEST_F(TemporaryFileTest, IgnoredSignalsStayIgnored) {
                 ::signal(signal, SIG_IGN);
                 TemporaryFile file;
                 ErrorSlot error;
-                if (!file.create(directory_ / "a", error)) {
-                  return 1;
-                }
+                if (!file.create(directory_ / "a", error)) return 1;
                 ::raise(signal);
                 return file.commitNew(error) ? 0 : 2;
               }),
@@ -420,9 +402,7 @@ TEST_F(TemporaryFileTest, StaleFilesOfAKilledRunAreRemoved) {
   const int status = statusOfChild([&] {
     TemporaryFile file;
     ErrorSlot error;
-    if (file.create(directory_ / "a", error)) {
-      ::raise(SIGKILL);
-    }
+    if (file.create(directory_ / "a", error)) ::raise(SIGKILL);
     return 1;
   });
   ASSERT_TRUE(WIFSIGNALED(status));
@@ -444,9 +424,7 @@ TEST_F(TemporaryFileTest, OnlyHiddenFilesOfOursAreStale) {
       ".qel-0123456789abcde.part",  ".qel-0123456789abcdeff.part",    ".qel-0123456789ABCDEF.part",
       "qel-0123456789abcdef.part",  ".qel-0123456789abcdef.part.mp3", "x.qel-0123456789abcdef.part",
   };
-  for (const char* name : others) {
-    directory_.addFile(name, "kept");
-  }
+  for (const char* name : others) directory_.addFile(name, "kept");
   std::filesystem::create_directory(directory_ / ".qel-0000000000000001.part");
   std::filesystem::create_symlink("elsewhere", directory_ / ".qel-0000000000000002.part");
   ASSERT_EQ(::mkfifo((directory_ / ".qel-0000000000000003.part").c_str(), 0600), 0);
@@ -492,17 +470,13 @@ TEST_F(TemporaryFileTest, StaleFilesThatCannotBeOpenedStay) {
 TEST_F(TemporaryFileTest, NewFilesSurviveAConcurrentRemover) {
   const pid_t remover = ::fork();
   if (remover == 0) {
-    for (;;) {
-      removeStaleTemporaryFiles(directory_.path());
-    }
+    for (;;) removeStaleTemporaryFiles(directory_.path());
   }
   int committed = 0;
   for (int round = 0; round < 3000; ++round) {
     TemporaryFile file;
     ErrorSlot error;
-    if (file.create(directory_ / "a", error) && file.commitReplacing(error)) {
-      ++committed;
-    }
+    if (file.create(directory_ / "a", error) && file.commitReplacing(error)) ++committed;
   }
   ::kill(remover, SIGKILL);
   ::waitpid(remover, nullptr, 0);

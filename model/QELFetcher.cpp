@@ -1,0 +1,27 @@
+#include "model/QELFetcher.h"
+
+#include "platform/files/FileManager.h"
+#include "platform/net/EventLoop.h"
+
+bool QELFetcher::fetchToPath(const QELMediaReference& reference, const std::string& path,
+                             const std::function<void()>& willDownload) {
+  if (!reference.location) return false;
+  if (!reference.isRemote) return platform::copyFile(reference.location->string(), path);
+  if (!reference.url) return false;
+
+  willDownload();
+  downloadFinished_ = downloadSuccess_ = false;
+  const platform::Download download(*reference.url, path, *this);
+  while (!downloadFinished_ && platform::runEventLoopOnce()) {
+  }
+  return downloadSuccess_;
+}
+
+void QELFetcher::downloadDidFinish(platform::Download& /*download*/) {
+  downloadFinished_ = downloadSuccess_ = true;
+}
+
+void QELFetcher::didFailWithError(platform::Download& /*download*/,
+                                  const platform::ErrorRecord& /*error*/) {
+  downloadFinished_ = true;
+}

@@ -1,0 +1,35 @@
+#pragma once
+
+#include <functional>
+#include <string>
+
+#include "model/QELMediaReference.h"
+#include "platform/net/Download.h"
+
+/// A record that fetches what it refers to: it starts the download, receives its events and waits
+/// for its end.
+///
+/// What counts as a failed transfer is decided by platform/net: see Download.h.
+class QELFetcher : protected platform::DownloadReceiver {
+ public:
+  QELFetcher(const QELFetcher&) = delete;
+  QELFetcher& operator=(const QELFetcher&) = delete;
+
+ protected:
+  QELFetcher() = default;
+  ~QELFetcher() override = default;
+
+  /// Puts what the reference leads to at the path, and returns once it is there or has failed
+  /// (false). A path is copied, never over an existing file; a URL is downloaded over whatever is
+  /// there, and its events come in between. A missing location and a remote one that is no valid
+  /// URL fail at once; `willDownload` is called before a download.
+  bool fetchToPath(const QELMediaReference& reference, const std::string& path,
+                   const std::function<void()>& willDownload);
+
+ private:
+  void downloadDidFinish(platform::Download& download) final;
+  void didFailWithError(platform::Download& download, const platform::ErrorRecord& error) final;
+
+  bool downloadFinished_ = false;  // ended, well or badly
+  bool downloadSuccess_ = false;   // ended well
+};

@@ -1,0 +1,52 @@
+#include "platform/text/Characters.h"
+
+#include <unicode/utf8.h>
+
+namespace platform {
+
+std::int32_t nextNonASCIICharacter(std::string_view text, std::size_t& position) {
+  const char* bytes = text.data();
+  UChar32 character = 0;
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wconversion"  // within the macro
+  U8_NEXT(bytes, position, text.size(), character);
+#pragma GCC diagnostic pop
+  return character;
+}
+
+std::size_t characterCount(std::string_view text) {
+  std::size_t count = 0;
+  for (std::size_t position = 0; position < text.size(); ++count) nextCharacter(text, position);
+  return count;
+}
+
+std::string_view firstCharacters(std::string_view text, std::size_t count) {
+  std::size_t position = 0;
+  for (; count > 0 && position < text.size(); --count) nextCharacter(text, position);
+  return text.substr(0, position);
+}
+
+std::size_t utf16Length(std::string_view text) {
+  std::size_t length = 0;
+  for (std::size_t position = 0; position < text.size();) {
+    length += nextCharacter(text, position) > 0xFFFF ? 2 : 1;
+  }
+  return length;
+}
+
+bool isHorizontalWhitespace(std::int32_t character) {
+  switch (character) {
+    case '\t':
+    case ' ':
+    case 0x00A0:
+    case 0x1680:
+    case 0x202F:
+    case 0x205F:
+    case 0x3000:
+      return true;
+    default:
+      return character >= 0x2000 && character <= 0x200A;
+  }
+}
+
+}  // namespace platform

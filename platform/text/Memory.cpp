@@ -1,0 +1,60 @@
+#include "platform/text/Memory.h"
+
+#include <unicode/uclean.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <new>
+
+namespace platform {
+namespace {
+
+template <typename Request>
+void* insist(Request request) {
+  void* block = request();
+  while (block == nullptr) {
+    const std::new_handler handler = std::get_new_handler();
+    if (handler == nullptr) return nullptr;
+    handler();
+    block = request();
+  }
+  return block;
+}
+
+// The null pointer that may stand for an empty block is none of a refusal.
+std::size_t atLeastOne(std::size_t size) {
+  return std::max<std::size_t>(size, 1);
+}
+
+}  // namespace
+
+void* Memory::allocate(std::size_t size) {
+  return insist([=] { return std::malloc(atLeastOne(size)); });
+}
+
+void* Memory::allocateZeroed(std::size_t count, std::size_t size) {
+  return insist([=] { return std::calloc(atLeastOne(count), atLeastOne(size)); });
+}
+
+void* Memory::reallocate(void* block, std::size_t size) {
+  return insist([=] { return std::realloc(block, atLeastOne(size)); });
+}
+
+char* Memory::duplicate(const char* text) {
+  return static_cast<char*>(insist([=] { return ::strdup(text); }));
+}
+
+void Memory::release(void* block) {
+  std::free(block);
+}
+
+void Memory::serveLibraries() {
+  UErrorCode status = U_ZERO_ERROR;
+  u_setMemoryFunctions(
+      nullptr, [](const void*, std::size_t size) { return allocate(size); },
+      [](const void*, void* block, std::size_t size) { return reallocate(block, size); },
+      [](const void*, void* block) { release(block); }, &status);
+}
+
+}  // namespace platform

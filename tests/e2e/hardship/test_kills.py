@@ -1,0 +1,244 @@
+"""Runs are interrupted at any moment, also by signals that nobody can catch. What has a final name stays whole.
+
+A killed run may leave hidden files, which the next run removes.
+"""
+
+import os
+import random
+import re
+import shutil
+import signal
+import subprocess
+import time
+import unittest
+
+from bundle_support import contents, digests, eventually, hidden
+from interruption import ENDING_SIGNALS, InterruptionTestCase, expect_signals
+from support import soaking, start
+
+
+class RandomMomentTest(InterruptionTestCase):
+    """Signals that end the tool, the one that it ignores and the one that nobody can handle, anywhere in a run."""
+
+    SIGNALS = (*ENDING_SIGNALS, signal.SIGPIPE, signal.SIGKILL)
+    TURNS = 40 if soaking() else 3  # for each signal
+    OLD = b"the output of an earlier run"
+
+    def assertInterruptible(self, arguments, prepare, judge):
+        """Runs the tool once, and then again and again with a signal. `prepare` is called before each run and `judge`,
+        with the number of the signal that ended it or None, behind it."""
+        prepare()
+        began = time.monotonic()
+        self.assertEqual(self.run_tool(*arguments).status, 0)
+        duration = time.monotonic() - began
+        judge(None)
+        seed = random.SystemRandom().randrange(1 << 32)
+        moments = random.Random(seed)
+        ended = 0
+        for turn in range(self.TURNS):
+            for number in self.SIGNALS:
+                with self.subTest(seed=seed, turn=turn, signal=number):
+                    prepare()
+                    process = start(*arguments, stdout=subprocess.DEVNULL, cwd=self.directory,
+                                    preexec_fn=expect_signals)
+                    time.sleep(moments.uniform(0, duration))
+                    process.send_signal(number)
+                    process.wait(timeout=60)
+                    self.assertIn(process.returncode, (0, -number))
+                    judge(number if process.returncode else None)
+                    ended += process.returncode != 0
+        print(f"{self._testMethodName}, {arguments[0]} of {os.path.basename(arguments[1])}: "
+              f"{self.TURNS * len(self.SIGNALS)} signals, of which {ended} ended it", flush=True)
+
+    def assertFileIsWritten(self, command, source):
+        expected = self.run_tool(command, source).stdout
+        date = re.search(rb"<pubDate>[^<]*</pubDate>", expected)  # of the generation, and as long as any other
+
+        def undated(content):
+            first, last = date.span() if date else (0, 0)
+            return content[:first] + b"?" * len(content[first:last]) + content[last:]
+
+        def prepare():
+            self.write("out", self.OLD)
+            self.listing = sorted(path.name for path in self.directory.iterdir())
+
+        def judge(number):
+            content = self.path("out").read_bytes()
+            if number is None:
+                self.assertEqual(undated(content), undated(expected))
+            elif content != self.OLD:  # it is written in place, so it may be cut, but it is never anything else
+                self.assertNotEqual(number, signal.SIGPIPE)
+                self.assertTrue(undated(expected).startswith(undated(content)))
+            self.assertEqual(sorted(path.name for path in self.directory.iterdir()), self.listing)
+
+        self.assertInterruptible((command, source, "-d", "out"), prepare, judge)
+
+    def test_writing_a_file(self):
+        text = "Night & Walks 🚶 " * 100
+        podcast = {"PodcastName": "Show", "Episodes": [{"EpisodeName": f"{number} {text}"} for number in range(1500)]}
+        source = self.reference(podcast)
+        feed = self.run_tool("createfeed", source).stdout
+        for command, kind in (("parsefeed", str(source)), ("parsefeed", self.server().serve("/feed", feed)),
+                              ("createfeed", str(source)), ("createfeed", self.feed(feed))):
+            self.assertFileIsWritten(command, kind)
+
+    def assertBundleIsFilled(self, show, files, earlier):
+        """The run fills a bundle, in which the earlier files stand, with all of the files. After the signal each of
+        them is whole or missing, and the next run completes them."""
+        source = self.reference(show, name="show.plist")
+
+        def prepare():
+            shutil.rmtree(self.bundle, ignore_errors=True)
+            self.bundle.mkdir()
+            for path, content in earlier.items():
+                (self.bundle / path).write_bytes(content)
+
+        def judge(number):
+            found = self.files()
+            left = [path for path in found if os.path.basename(path).startswith(".")]
+            if number != signal.SIGKILL:
+                self.assertEqual(left, [])
+            for path in found.keys() - left:
+                self.assertIn(digests(found)[path], (digests(files)[path], digests(earlier).get(path)), path)
+            self.assertLessEqual(earlier.keys(), found.keys())
+            if number is None:
+                self.assertEqual(found.keys(), files.keys())
+            if number == signal.SIGPIPE:
+                self.assertEqual(found.keys(), earlier.keys())
+            if number is None or (self.bundle / "Info.plist").exists():
+                self.assertEqual(self.references(), list(files))
+            if number in (signal.SIGKILL, signal.SIGTERM):
+                self.assertEqual(self.create(source).status, 0)
+                self.assertEqual(digests(self.files()), digests(files))
+                if earlier:  # a copy never takes the place of what is there
+                    self.assertEqual(self.references(), list(files))
+
+        self.assertInterruptible(("createbundle", source, "-d", self.bundle), prepare, judge)
+
+    def media_files(self):
+        return {f"{number}.mp3": random.Random(number).randbytes(200_000) for number in range(10)}
+
+    def test_filling_a_bundle_with_downloads(self):
+        web = self.server()
+        files = self.media_files()
+        self.assertBundleIsFilled({"Episodes": [{"EpisodeReference": web.serve(f"/{name}", content)}
+                                                for name, content in files.items()]}, files,
+                                  earlier={"0.mp3": files["0.mp3"], "7.mp3": b"another 7"})
+
+    def test_filling_a_bundle_with_copies(self):
+        files = self.media_files()
+        self.assertBundleIsFilled({"Episodes": [{"EpisodeReference": self.media(name, content)}
+                                                for name, content in files.items()]}, files, earlier={})
+
+
+class KillTest(InterruptionTestCase):
+    """A kill at any moment leaves whole files, and hidden ones that the next run clears away."""
+
+    EPISODES = 20
+    ROUNDS = 80 if soaking() else 10
+    KILLS = 3  # in a round, before the run that may finish
+
+    def setUp(self):
+        super().setUp()
+        web = self.server()
+        self.contents_by_name = {}
+        episodes = []
+        for number in range(self.EPISODES):
+            media = random.Random(number).randbytes(20_000 + 20_000 * (number % 5))
+            poster = random.Random(-number).randbytes(3000)
+            name = f"{number}.mp3"
+            if number % 4 == 3:
+                url = self.write(name, media).as_uri()
+            elif number % 4 == 1:
+                url = web.dripping(f"/{name}", media, pause=0.003, piece=len(media) // 4)
+            elif number % 4 == 2:
+                url = web.chunked(f"/{name}", [media[:5000], media[5000:]])
+            else:
+                url = web.serve(f"/{name}", media)
+            episodes.append({"EpisodeName": str(number), "EpisodeReference": url,
+                             "EpisodePosterReference": web.serve(f"/{number}.jpg", poster)})
+            self.contents_by_name[name] = media
+            self.contents_by_name[f"Posters/{number}.jpg"] = poster
+        cover = random.Random(100).randbytes(9000)
+        self.contents_by_name["Posters/Podcast.png"] = cover
+        self.show = {"PodcastName": "Night Walks", "PodcastPosterReference": web.serve("/cover.png", cover),
+                     "PodcastPosterReferenceType": "remote", "Episodes": episodes}
+
+    def assertWhole(self):
+        """Every file under a final name is one of the show's, to the last byte, and so is Info.plist."""
+        found = self.files() if self.bundle.exists() else {}
+        for path, content in found.items():
+            if not os.path.basename(path).startswith("."):
+                self.assertTrue(content == self.contents_by_name[path], f"{path} is not whole")
+        if (self.bundle / "Info.plist").exists():
+            self.assertComplete(self.info())
+
+    def assertComplete(self, info):
+        self.assertEqual([episode["EpisodeReference"] for episode in info["Episodes"]],
+                         [f"{number}.mp3" for number in range(self.EPISODES)])
+        self.assertEqual([episode["EpisodePosterReference"] for episode in info["Episodes"]],
+                         [f"Posters/{number}.jpg" for number in range(self.EPISODES)])
+
+    def test_kills_at_random_moments(self):
+        source = self.reference(self.show)
+        began = time.monotonic()
+        self.assertWarns(self.create(source))
+        duration = time.monotonic() - began
+        complete = digests(contents(self.bundle))
+        self.assertEqual(digests(self.files()), digests(self.contents_by_name))
+        seed = random.SystemRandom().randrange(1 << 32)
+        moments = random.Random(seed)
+        left_behind = killed = 0
+        for round_number in range(self.ROUNDS):
+            if round_number % 3 == 0:  # sometimes nothing is there yet
+                for path in self.files():
+                    (self.bundle / path).unlink()
+                (self.bundle / "Info.plist").unlink()
+            for _ in range(self.KILLS):
+                process = self.begin(source, stdout=subprocess.DEVNULL)
+                time.sleep(moments.uniform(0, duration))
+                process.kill()
+                process.communicate(timeout=60)
+                with self.subTest(seed=seed, round=round_number):
+                    self.assertIn(process.returncode, (0, -signal.SIGKILL))
+                    self.assertWhole()
+                killed += process.returncode != 0
+                left_behind += len(hidden(self.bundle))
+            with self.subTest(seed=seed, round=round_number, moment="after"):
+                self.assertWarns(self.create(source))
+                self.assertEqual(digests(contents(self.bundle)), complete)
+        print(f"{self.ROUNDS * self.KILLS} kills, of which {killed} met a run and {left_behind} a file half written; "
+              f"{self.ROUNDS} runs to the end", flush=True)
+        self.assertGreater(left_behind, 0, "no kill met a file half written")
+
+    def test_hidden_files_of_a_killed_run_are_cleared_away(self):
+        url, gate = self.held(self.server(), "/one.mp3", b"half of it")
+        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
+        gate.reached()
+        eventually(lambda: hidden(self.bundle))
+        process.kill()
+        process.communicate(timeout=60)
+        name, = hidden(self.bundle)
+        for folder in ("Posters", ".."):
+            (self.bundle / folder / name).write_bytes(b"half of it")
+        (self.bundle / ".qel-notes.part").write_bytes(b"mine")
+        self.assertRuns(self.create({}), "Fetching 0 episodes")
+        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", ".qel-notes.part"})
+        self.assertTrue(self.path(name).exists())
+
+    def test_a_run_beside_this_one_keeps_its_hidden_file(self):
+        web = self.server()
+        url, gate = self.held(web, "/one.mp3", b"first", b"later")
+        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
+        gate.reached()
+        eventually(lambda: hidden(self.bundle))
+        source = self.reference({"Episodes": [{"EpisodeReference": web.serve("/two.mp3", b"two")}]}, name="two.plist")
+        self.assertWarns(self.create(source))
+        gate.open()
+        process.communicate(timeout=60)
+        self.assertEqual(process.returncode, 0)
+        self.assertEqual(self.files(), {"one.mp3": b"firstlater", "two.mp3": b"two"})
+
+
+if __name__ == "__main__":
+    unittest.main()

@@ -1,0 +1,55 @@
+#include "platform/text/Case.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace {
+
+TEST(CaseTest, MapsByUnicode) {
+  const struct {
+    std::string_view text, lower, upper;
+  } rows[] = {
+      {"", "", ""},
+      {"MP3", "mp3", "MP3"},
+      {"@AZ[`az{ 09", "@az[`az{ 09", "@AZ[`AZ{ 09"},
+      {"Äpfel", "äpfel", "ÄPFEL"},
+      {"straße", "straße", "STRASSE"},
+      {"ΟΔΟΣ ΟΔΟΣ", "οδος οδος", "ΟΔΟΣ ΟΔΟΣ"},
+      {"Ж€😀", "ж€😀", "Ж€😀"},
+      {"ﬁ", "ﬁ", "FI"},
+      // The Turkish mapping of I belongs to a locale, not to this function.
+      {"Iı", "iı", "II"},
+      {"İ", "i̇", "İ"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(platform::lowercased(row.text), row.lower) << row.text;
+    EXPECT_EQ(platform::uppercased(row.text), row.upper) << row.text;
+  }
+}
+
+TEST(CaseTest, KeepsNUL) {
+  EXPECT_EQ(platform::lowercased(std::string_view("A\0B", 3)), std::string_view("a\0b", 3));
+  EXPECT_EQ(platform::uppercased(std::string_view("ä\0b", 4)), std::string_view("Ä\0B", 4));
+}
+
+TEST(CaseTest, KeepsMalformedSequences) {
+  const std::string_view malformed[] = {"\xFF", "\xC3", "\x80", "\xE2\x82", "\xF0\x9F\x98"};
+  for (const std::string_view sequence : malformed) {
+    const std::string text = std::string("A").append(sequence).append("B");
+    EXPECT_EQ(platform::lowercased(text), std::string("a").append(sequence).append("b"));
+    EXPECT_EQ(platform::uppercased(sequence), sequence);
+  }
+}
+
+TEST(CaseTest, TakesEveryTwoBytesWithoutFault) {
+  for (int first = 0; first < 256; ++first) {
+    for (int second = 0; second < 256; ++second) {
+      const std::string text = {static_cast<char>(first), static_cast<char>(second)};
+      EXPECT_FALSE(platform::lowercased(text).empty());
+      EXPECT_FALSE(platform::uppercased(text).empty());
+    }
+  }
+}
+
+}  // namespace

@@ -1,0 +1,50 @@
+#include "platform/text/Characters.h"
+
+#include <gtest/gtest.h>
+
+#include <limits>
+#include <string>
+
+namespace {
+
+TEST(CharactersTest, LengthsAndFirstCharacters) {
+  const struct {
+    std::string_view text;
+    std::size_t units, characters;
+    std::string_view firstTwo;
+  } rows[] = {
+      {"", 0, 0, ""},
+      {"a", 1, 1, "a"},
+      {"abc", 3, 3, "ab"},
+      {"äöü", 3, 3, "äö"},
+      {"€uro", 4, 4, "€u"},
+      {"😀a😀", 5, 3, "😀a"},
+      {"\uFFFF\U00010000b", 4, 3, "\uFFFF\U00010000"},
+      // Each malformed sequence counts as the one replacement character that stands for it.
+      {"\xFFxy", 3, 3, "\xFFx"},
+      {"x\xE2\x82", 2, 2, "x\xE2\x82"},
+      {"\xF0\x9F\x98", 1, 1, "\xF0\x9F\x98"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(platform::utf16Length(row.text), row.units) << testing::PrintToString(row.text);
+    EXPECT_EQ(platform::characterCount(row.text), row.characters)
+        << testing::PrintToString(row.text);
+    EXPECT_EQ(platform::firstCharacters(row.text, 2), row.firstTwo)
+        << testing::PrintToString(row.text);
+  }
+  EXPECT_EQ(platform::firstCharacters("abc", 0), "");
+  EXPECT_EQ(platform::firstCharacters("abc", std::numeric_limits<std::size_t>::max()), "abc");
+}
+
+TEST(CharactersTest, TakesEveryTwoBytesWithoutFault) {
+  for (int first = 0; first < 256; ++first) {
+    for (int second = 0; second < 256; ++second) {
+      const std::string text = {static_cast<char>(first), static_cast<char>(second)};
+      const std::size_t characters = platform::characterCount(text);
+      EXPECT_TRUE(characters == 1 || characters == 2);
+      EXPECT_EQ(platform::firstCharacters(text, characters), text);
+    }
+  }
+}
+
+}  // namespace
