@@ -97,7 +97,7 @@ TEST(QELEpisodeTest, EachKeyFillsItsField) {
   }
   for (const Dictionary& item : {Dictionary{{"date", kDate}}, Dictionary{{"", "x"}}}) {
     EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&item)->date().has_value(),
-              item.contains("date"));
+              platform::valueForKey(item, "date") != nullptr);
     EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&item)->referenceType(), std::nullopt);
   }
 }
