@@ -75,6 +75,7 @@ TEST(FileDescriptorTest, MoveToItselfKeepsItOpen) {
 }
 
 TEST(FileDescriptorTest, ClosingTellsAFailedClose) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   FileDescriptor none;
   EXPECT_TRUE(none.close());
   EXPECT_EQ(exitStatusOfChild([] {
@@ -146,10 +147,11 @@ TEST(FileDescriptorTest, WaitingToWriteGoesOnAfterASignal) {
 }
 
 TEST(FileDescriptorTest, WritingFailsWhereTheWaitFails) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   EXPECT_EQ(exitStatusOfChild([] {
               const Pipe pipe;
               ::fcntl(pipe.writeEnd.get(), F_SETFL, O_NONBLOCK);
-              if (!refuseSystemCall(SYS_poll, ENOMEM)) return 1;
+              if (!refuseSystemCall(kPollCall, ENOMEM)) return 1;
               if (writeAll(pipe.writeEnd.get(), std::string(std::size_t{1} << 20U, 'x'))) return 2;
               return errno == ENOMEM ? 0 : 3;
             }),
@@ -157,6 +159,7 @@ TEST(FileDescriptorTest, WritingFailsWhereTheWaitFails) {
 }
 
 TEST(FileDescriptorTest, WriteThatTakesNothingFails) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   EXPECT_EQ(exitStatusOfChild([] {
               const Pipe pipe;
               if (!refuseSystemCall(SYS_write, 0)) return 1;

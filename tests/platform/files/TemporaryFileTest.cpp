@@ -163,6 +163,7 @@ TEST_F(TemporaryFileTest, CommitNewRefusesWhateverExists) {
 }
 
 TEST_F(TemporaryFileTest, CommitNewDoesWithoutAnExclusiveRename) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   directory_.addFile("taken", "kept");
   for (const int refusal : {EINVAL, ENOSYS}) {
     const std::string name = "new" + std::to_string(refusal);
@@ -185,6 +186,7 @@ TEST_F(TemporaryFileTest, CommitNewDoesWithoutAnExclusiveRename) {
 }
 
 TEST_F(TemporaryFileTest, DoesWithoutLocks) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   EXPECT_EQ(exitStatusOfChild([&] {
               TemporaryFile file;
               ErrorSlot error;
@@ -196,6 +198,7 @@ TEST_F(TemporaryFileTest, DoesWithoutLocks) {
 }
 
 TEST_F(TemporaryFileTest, FailedCloseFailsTheCommit) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   directory_.addFile("a", "kept");
   EXPECT_EQ(exitStatusOfChild([&] {
               TemporaryFile file;
