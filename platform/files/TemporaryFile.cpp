@@ -16,6 +16,7 @@
 #include <utility>
 
 #include "platform/files/PosixError.h"
+#include "platform/text/ASCII.h"
 
 namespace platform {
 namespace {
@@ -24,7 +25,6 @@ namespace {
 // share a directory do not meet.
 constexpr std::string_view kNamePrefix = ".qel-";
 constexpr std::string_view kNameSuffix = ".part";
-constexpr std::string_view kHexDigits = "0123456789abcdef";
 constexpr std::size_t kRandomBytes = 8;
 
 constexpr int kCreationAttempts = 100;

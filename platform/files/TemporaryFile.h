@@ -14,6 +14,10 @@ namespace platform {
 /// Unless a commit succeeded, the destructor removes it; so does any failure, and so do SIGINT,
 /// SIGTERM and SIGHUP where they would end the process. A symbolic link at the final name is
 /// replaced, never written through. Move-only is not needed: one scope owns it.
+///
+///     TemporaryFile file;
+///     return file.create("show/one.mp3", error) && file.write(bytes, error) &&
+///            file.commitReplacing(error);
 class TemporaryFile {
  public:
   TemporaryFile() = default;

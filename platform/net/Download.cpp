@@ -1,6 +1,5 @@
 #include "platform/net/Download.h"
 
-#include <cerrno>
 #include <cstddef>
 #include <optional>
 #include <string_view>
@@ -124,7 +123,7 @@ class Download::FileDownload final : public Transfer {
     if (!length) return false;
     if (*length == 0) {
       if (copiedLength_ < source_->size()) {
-        error = ErrorRecord{"POSIX", EIO, "The file became shorter while it was read"};
+        error = transferError(CURLE_PARTIAL_FILE, "The file became shorter while it was read");
       }
       return false;
     }

@@ -34,6 +34,9 @@ class DownloadReceiver {
 /// once they are all there. http and https: a final status of 200 is success and nothing else is;
 /// at most 20 redirects, to http and https only; the body is asked for as it is (no compression).
 /// file: regular files only. No retry and no time-out. Destroying a running download cancels it.
+///
+///     const Download download(*URL::parse("https://example.org/one.mp3"), "one.mp3", receiver);
+///     while (!receiver.hasEnded() && runEventLoopOnce()) continue;  // which tells the receiver
 class Download {
  public:
   /// Starts the transfer; its events come from runEventLoopOnce(). The receiver must outlive it.

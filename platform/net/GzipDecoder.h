@@ -2,9 +2,9 @@
 
 #include <zlib.h>
 
-#include <array>
 #include <cstddef>
 #include <string_view>
+#include <vector>
 
 #include "platform/text/ByteSink.h"
 
@@ -32,7 +32,7 @@ class GzipDecoder {
 
   z_stream stream_{};
   State state_ = State::kUnopened;
-  std::array<char, std::size_t{64} * 1024> output_{};
+  std::vector<char> output_ = std::vector<char>(std::size_t{64} << 10U);
 };
 
 }  // namespace platform

@@ -4,6 +4,7 @@
 #include <limits>
 #include <system_error>
 
+#include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
 #include "platform/text/Splitting.h"
 
@@ -17,14 +18,6 @@ constexpr std::string_view kUnknownCoding =
     "The body comes in a transfer coding that was not asked for";
 constexpr std::string_view kBrokenField = "The header does not tell where the body ends";
 
-constexpr std::string_view kWhiteSpace = " \t\r\n";
-
-std::string_view trimmed(std::string_view text) {
-  const std::size_t first = text.find_first_not_of(kWhiteSpace);
-  if (first == std::string_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kWhiteSpace) - first + 1);
-}
-
 }  // namespace
 
 void MessageFraming::takeLine(std::string_view line) {
@@ -33,7 +26,7 @@ void MessageFraming::takeLine(std::string_view line) {
     return;
   }
   if (trimmed(line).empty()) return;
-  if (kWhiteSpace.find(line.front()) != std::string_view::npos) {
+  if (kWhitespace.find(line.front()) != std::string_view::npos) {
     // A field's second line, which servers must not send and few clients read alike.
     if (field_ != Field::kOther) fault_ = kBrokenField;
     return;

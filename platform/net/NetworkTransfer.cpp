@@ -2,13 +2,10 @@
 
 #include <algorithm>
 #include <climits>
-#include <cstddef>
 #include <list>
 #include <mutex>
 #include <utility>
 #include <vector>
-
-#include "platform/net/TransferLibrary.h"
 
 namespace platform {
 namespace {
@@ -24,12 +21,6 @@ constexpr std::uint64_t kIgnoredBodyLimit = std::uint64_t{64} * 1024;
 constexpr std::int64_t kRedirectPageLimit = std::int64_t{16} * 1024 * 1024;
 /// Of all answers of a transfer together; honest ones have a few KiB.
 constexpr std::uint64_t kHeaderLimit = std::uint64_t{1} * 1024 * 1024;
-
-static_assert(static_cast<int>(TransferErrorCode::kUnsupportedScheme) ==
-              CURLE_UNSUPPORTED_PROTOCOL);
-static_assert(static_cast<int>(TransferErrorCode::kBadContentEncoding) ==
-              CURLE_BAD_CONTENT_ENCODING);
-static_assert(static_cast<int>(TransferErrorCode::kTooLarge) == CURLE_FILESIZE_EXCEEDED);
 
 /// The library quotes what servers sent; none of that may steer a terminal or break the encoding.
 std::string shownText(std::string_view text) {
@@ -48,10 +39,6 @@ const TransferLibrary& library() {
 }
 
 }  // namespace
-
-ErrorRecord transferError(TransferErrorCode code, std::string description) {
-  return {"transfer", static_cast<std::int64_t>(code), std::move(description)};
-}
 
 /// The connections of one thread, and its transfers that are running.
 class NetworkTransfer::Connections {
@@ -109,14 +96,14 @@ class NetworkTransfer::Connections {
   std::vector<NetworkTransfer*> running_;
 };
 
-void NetworkTransfer::HandleCloser::operator()(void* handle) const {
+void NetworkTransfer::HandleCloser::operator()(CURL* handle) const {
   library().easyCleanup(handle);
 }
 
 NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink)
     : sink_(sink) {
   if (url.scheme() != "http" && url.scheme() != "https") {
-    error_ = transferError(TransferErrorCode::kUnsupportedScheme,
+    error_ = transferError(CURLE_UNSUPPORTED_PROTOCOL,
                            "URLs of the scheme \"" + url.scheme() + "\" are not supported");
     ended_ = true;
     return;
@@ -127,7 +114,7 @@ NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, S
     return;
   }
   Connections& connections = Connections::ofThisThread();
-  int result = configure(url, acceptedEncoding);
+  CURLcode result = configure(url, acceptedEncoding);
   if (result == CURLE_OK) result = connections.add(*this);
   if (result != CURLE_OK) end(result);
 }
@@ -136,13 +123,20 @@ NetworkTransfer::~NetworkTransfer() {
   if (!ended_) Connections::ofThisThread().remove(*this);
 }
 
-int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
+template <bool (NetworkTransfer::*didReceive)(std::string_view)>
+std::size_t NetworkTransfer::callback(char* bytes, std::size_t size, std::size_t count,
+                                      void* transfer) {
+  const bool isTaken =
+      (static_cast<NetworkTransfer*>(transfer)->*didReceive)({bytes, size * count});
+  return isTaken ? size * count : 0;
+}
+
+CURLcode NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
   handle_.reset(library().easyInit());
   CURLcode result = CURLE_OK;
   const auto set = [this, &result](CURLoption option, auto value) {
     if (result == CURLE_OK) result = library().easySetopt(handle_.get(), option, value);
   };
-  static_assert(sizeof(errorText_) >= CURL_ERROR_SIZE);
   set(CURLOPT_PRIVATE, static_cast<void*>(this));
   set(CURLOPT_ERRORBUFFER, errorText_.data());
   set(CURLOPT_URL, url.encodedText().c_str());
@@ -159,9 +153,9 @@ int NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
   set(CURLOPT_NOSIGNAL, 1L);
   set(CURLOPT_CONNECTTIMEOUT, kNoConnectTimeout);
   set(CURLOPT_BUFFERSIZE, kReceiveBufferSize);
-  set(CURLOPT_HEADERFUNCTION, &NetworkTransfer::headerCallback);
+  set(CURLOPT_HEADERFUNCTION, &callback<&NetworkTransfer::didReceiveHeaderLine>);
   set(CURLOPT_HEADERDATA, static_cast<void*>(this));
-  set(CURLOPT_WRITEFUNCTION, &NetworkTransfer::bodyCallback);
+  set(CURLOPT_WRITEFUNCTION, &callback<&NetworkTransfer::didReceiveBody>);
   set(CURLOPT_WRITEDATA, static_cast<void*>(this));
   const curl_xferinfo_callback progressCallback = [](void* self, curl_off_t, curl_off_t bodySize,
                                                      curl_off_t, curl_off_t) {
@@ -180,27 +174,25 @@ int NetworkTransfer::status() const {
   return static_cast<int>(status);
 }
 
-void NetworkTransfer::end(int resultCode) {
+void NetworkTransfer::end(CURLcode result) {
   Connections::ofThisThread().remove(*this);
   ended_ = true;
   if (error_) return;
-  const auto result = static_cast<CURLcode>(resultCode);
   // A failed status is the cause, however its page ended.
   const bool hasFailedStatus = !begun_ && (result == CURLE_OK || status() >= 400);
   if (!begun_ && result == CURLE_OK && status() == 200) {
-    error_ = {"transfer", CURLE_PARTIAL_FILE, "The header of the answer is cut short"};
+    error_ = transferError(CURLE_PARTIAL_FILE, "The header of the answer is cut short");
   } else if (hasFailedStatus || ignoredSize_ > kIgnoredBodyLimit) {
     error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
   } else if (result == CURLE_ABORTED_BY_CALLBACK) {
-    error_ =
-        transferError(TransferErrorCode::kTooLarge, "The page of a redirect is larger than 16 MiB");
+    error_ = transferError(CURLE_FILESIZE_EXCEEDED, "The page of a redirect is larger than 16 MiB");
   } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
     // What the library says of a line beyond its limit.
-    error_ = {"transfer", result, "A line of the answer's header is too long"};
+    error_ = transferError(result, "A line of the answer's header is too long");
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
-    error_ = {"transfer", result,
-              shownText(detail.empty() ? library().easyStrerror(result) : detail)};
+    error_ =
+        transferError(result, shownText(detail.empty() ? library().easyStrerror(result) : detail));
   }
 }
 
@@ -221,7 +213,7 @@ std::optional<std::string> NetworkTransfer::headerValue(const char* name) const 
 bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
   headerSize_ += line.size();
   if (headerSize_ > kHeaderLimit) {
-    error_ = transferError(TransferErrorCode::kTooLarge, "The header is longer than 1 MiB");
+    error_ = transferError(CURLE_FILESIZE_EXCEEDED, "The header is longer than 1 MiB");
     return false;
   }
   if (begun_) return true;  // behind the body
@@ -234,7 +226,7 @@ bool NetworkTransfer::didReceiveHeader() {
   const int status = this->status();
   const bool hasBody = status >= 200 && status != 204 && status != 304;
   if (hasBody && !framing_.fault().empty()) {
-    if (status < 400) error_ = {"transfer", CURLE_PARTIAL_FILE, std::string(framing_.fault())};
+    if (status < 400) error_ = transferError(CURLE_PARTIAL_FILE, std::string(framing_.fault()));
     return false;
   }
   if (status != 200) return true;
@@ -248,18 +240,6 @@ bool NetworkTransfer::didReceiveBody(std::string_view bytes) {
   if (begun_) return sink_.take(bytes, error_);
   ignoredSize_ += bytes.size();
   return ignoredSize_ <= kIgnoredBodyLimit;
-}
-
-std::size_t NetworkTransfer::headerCallback(char* bytes, std::size_t size, std::size_t count,
-                                            void* self) {
-  auto& transfer = *static_cast<NetworkTransfer*>(self);
-  return transfer.didReceiveHeaderLine({bytes, size * count}) ? size * count : 0;
-}
-
-std::size_t NetworkTransfer::bodyCallback(char* bytes, std::size_t size, std::size_t count,
-                                          void* self) {
-  auto& transfer = *static_cast<NetworkTransfer*>(self);
-  return transfer.didReceiveBody({bytes, size * count}) ? size * count : 0;
 }
 
 bool NetworkTransfer::runAll() {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -8,20 +9,11 @@
 #include <string_view>
 
 #include "platform/net/MessageFraming.h"
+#include "platform/net/TransferLibrary.h"
 #include "platform/net/URL.h"
 #include "platform/text/ErrorRecord.h"
 
 namespace platform {
-
-/// The codes of the domain "transfer" (those of the transfer library) that others use as well.
-enum class TransferErrorCode : std::int64_t {
-  kUnsupportedScheme = 1,
-  kBadContentEncoding = 61,
-  kTooLarge = 63,
-};
-
-/// A new error record of the domain "transfer".
-ErrorRecord transferError(TransferErrorCode code, std::string description);
 
 /// One http or https request and its answer. For the use of platform/ alone.
 ///
@@ -61,11 +53,11 @@ class NetworkTransfer {
  private:
   class Connections;
   struct HandleCloser {
-    void operator()(void* handle) const;
+    void operator()(CURL* handle) const;
   };
 
-  int configure(const URL& url, const char* acceptedEncoding);
-  void end(int resultCode);
+  CURLcode configure(const URL& url, const char* acceptedEncoding);
+  void end(CURLcode result);
   int status() const;
   /// Whether the end came before the body, but not before the first byte of the answer.
   bool isInHeader() const;
@@ -74,8 +66,10 @@ class NetworkTransfer {
   bool didReceiveHeaderLine(std::string_view line);
   bool didReceiveHeader();
   bool didReceiveBody(std::string_view bytes);
-  static std::size_t headerCallback(char* bytes, std::size_t size, std::size_t count, void* self);
-  static std::size_t bodyCallback(char* bytes, std::size_t size, std::size_t count, void* self);
+  /// What the library calls with bytes for one of these two; another size than theirs ends the
+  /// transfer.
+  template <bool (NetworkTransfer::*didReceive)(std::string_view)>
+  static std::size_t callback(char* bytes, std::size_t size, std::size_t count, void* transfer);
 
   Sink& sink_;
   ErrorSlot error_;
@@ -84,8 +78,8 @@ class NetworkTransfer {
   MessageFraming framing_;
   std::uint64_t headerSize_ = 0;   // of all answers so far, trailers included
   std::uint64_t ignoredSize_ = 0;  // of the body of another status
-  std::array<char, 256> errorText_{};
-  std::unique_ptr<void, HandleCloser> handle_;
+  std::array<char, CURL_ERROR_SIZE> errorText_{};
+  std::unique_ptr<CURL, HandleCloser> handle_;
 };
 
 }  // namespace platform

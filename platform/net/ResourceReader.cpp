@@ -46,8 +46,7 @@ class BodyCollector : public NetworkTransfer::Sink {
     const auto sink = [this, &error](std::string_view piece) { return append(piece, error); };
     if (decoder_->decode(bytes, sink)) return true;
     if (!error) {
-      error =
-          transferError(TransferErrorCode::kBadContentEncoding, "The compressed body is malformed");
+      error = transferError(CURLE_BAD_CONTENT_ENCODING, "The compressed body is malformed");
     }
     return false;
   }
@@ -55,8 +54,7 @@ class BodyCollector : public NetworkTransfer::Sink {
   /// The body once all bytes have come.
   std::optional<std::string> finish(ErrorSlot& error) {
     if (decoder_ && !decoder_->isWhole()) {
-      error =
-          transferError(TransferErrorCode::kBadContentEncoding, "The compressed body is cut short");
+      error = transferError(CURLE_BAD_CONTENT_ENCODING, "The compressed body is cut short");
       return std::nullopt;
     }
     return std::move(body_);
@@ -71,7 +69,7 @@ class BodyCollector : public NetworkTransfer::Sink {
       const bool isGzip = isOneOf(piece, {"gzip", "x-gzip"});
       if ((isGzip && decoder_) ||
           isOneOf(piece, {"br", "compress", "x-compress", "deflate", "zstd"})) {
-        error = transferError(TransferErrorCode::kBadContentEncoding,
+        error = transferError(CURLE_BAD_CONTENT_ENCODING,
                               "The body comes in a content coding that was not asked for");
         return false;
       }
@@ -84,7 +82,7 @@ class BodyCollector : public NetworkTransfer::Sink {
     if (bytes.size() > limit_ - body_.size()) return failAsTooLarge(error);
     const std::uint64_t size = body_.size() + bytes.size();
     if (size > kAnyRatioSize && size / kLargestRatio > receivedSize_) {
-      error = transferError(TransferErrorCode::kTooLarge,
+      error = transferError(CURLE_FILESIZE_EXCEEDED,
                             "The body is more than 100 times as large as its compressed form");
       return false;
     }
@@ -93,7 +91,7 @@ class BodyCollector : public NetworkTransfer::Sink {
   }
 
   bool failAsTooLarge(ErrorSlot& error) const {
-    error = transferError(TransferErrorCode::kTooLarge,
+    error = transferError(CURLE_FILESIZE_EXCEEDED,
                           "The resource is larger than " + std::to_string(limit_) + " bytes");
     return false;
   }

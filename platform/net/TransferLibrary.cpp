@@ -24,10 +24,14 @@ ErrorRecord loadingError() {
         "; http and https need it: install the package libcurl4 (Debian, Ubuntu) or libcurl "
         "(Fedora)";
   }
-  return {"transfer", CURLE_FAILED_INIT, std::move(description)};
+  return transferError(CURLE_FAILED_INIT, std::move(description));
 }
 
 }  // namespace
+
+ErrorRecord transferError(CURLcode code, std::string description) {
+  return {"transfer", code, std::move(description)};
+}
 
 TransferLibrary::TransferLibrary() {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
@@ -61,7 +65,7 @@ TransferLibrary::TransferLibrary() {
   const CURLcode result =
       globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,
                  &Memory::duplicate, &Memory::allocateZeroed);
-  if (result != CURLE_OK) error_ = {"transfer", result, easyStrerror(result)};
+  if (result != CURLE_OK) error_ = transferError(result, easyStrerror(result));
 }
 
 const TransferLibrary& TransferLibrary::instance() {

@@ -2,9 +2,15 @@
 
 #include <curl/curl.h>
 
+#include <string>
+
 #include "platform/text/ErrorRecord.h"
 
 namespace platform {
+
+/// The record of a failed transfer, whatever noticed it: domain "transfer", with the library's
+/// codes.
+ErrorRecord transferError(CURLcode code, std::string description);
 
 /// The functions of libcurl that we call. For the use of platform/ alone.
 ///

@@ -1,7 +1,6 @@
 #include "platform/net/URL.h"
 
 #include <unicode/uidna.h>
-#include <unicode/utf8.h>
 
 #include <algorithm>
 #include <array>
@@ -10,68 +9,37 @@
 #include <memory>
 
 #include "platform/net/TransferLibrary.h"
+#include "platform/text/ASCII.h"
+#include "platform/text/Case.h"
+#include "platform/text/Characters.h"
 
 namespace platform {
 namespace {
 
-constexpr std::string_view kHexDigits = "0123456789ABCDEF";
-
-bool isDigit(char c) {
-  return c >= '0' && c <= '9';
-}
-bool isASCIILetter(char c) {
-  return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
-}
-bool isASCII(char c) {
-  return static_cast<unsigned char>(c) < 0x80;
-}
-char lowercasedASCII(char c) {
-  return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-}
-
-/// 0 to 15, or -1 for anything but a hexadecimal digit.
-int hexValue(char c) {
-  if (isDigit(c)) return c - '0';
-  const char lower = lowercasedASCII(c);
-  return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
-}
-
 bool isPercentTriplet(std::string_view text, std::size_t at) {
-  return at + 2 < text.size() && text[at] == '%' && hexValue(text[at + 1]) >= 0 &&
-         hexValue(text[at + 2]) >= 0;
+  return at + 2 < text.size() && text[at] == '%' && hexDigitValue(text[at + 1]) >= 0 &&
+         hexDigitValue(text[at + 2]) >= 0;
 }
 
 void appendPercentEncoded(std::string& output, char c) {
   const auto byte = static_cast<unsigned char>(c);
   output += '%';
-  output += kHexDigits[byte >> 4U];
-  output += kHexDigits[byte & 0xFU];
+  output += kCapitalHexDigits[byte >> 4U];
+  output += kCapitalHexDigits[byte & 0xFU];
 }
 
-/// Well-formed UTF-8 without the control characters of Unicode's second block.
-bool isAcceptableUTF8(std::string_view text) {
-  if (text.size() > INT32_MAX) return false;
-  const auto* bytes = reinterpret_cast<const std::uint8_t*>(text.data());
-  const auto length = static_cast<std::int32_t>(text.size());
-  for (std::int32_t i = 0; i < length;) {
-    UChar32 character = 0;
-    U8_NEXT(bytes, i, length, character);
-    if (character < 0 || (character >= 0x80 && character < 0xA0)) return false;
-  }
-  return true;
-}
-
-/// Only characters that RFC 3986 knows (or non-ASCII ones), and a "%" only where it encodes.
+/// Only characters that RFC 3986 knows, and those of well-formed UTF-8 that are no control
+/// characters; a "%" only where it encodes.
 bool hasAcceptableCharacters(std::string_view text) {
   constexpr std::string_view kRefused = "<>\"{}|\\^`";
-  for (std::size_t i = 0; i < text.size(); ++i) {
-    const char c = text[i];
-    if ((isASCII(c) && c <= ' ') || c == '\x7F' || kRefused.find(c) != std::string_view::npos) {
-      return false;
-    }
-    if (c == '%' && !isPercentTriplet(text, i)) return false;
+  for (std::size_t position = 0; position < text.size();) {
+    const char byte = text[position];
+    if (kRefused.find(byte) != std::string_view::npos) return false;
+    if (byte == '%' && !isPercentTriplet(text, position)) return false;
+    const std::int32_t character = nextCharacter(text, position);
+    if (character <= ' ' || (character >= 0x7F && character < 0xA0)) return false;
   }
-  return isAcceptableUTF8(text);
+  return true;
 }
 
 /// The components of a URL by RFC 3986, appendix B. The views point into the text.
@@ -100,7 +68,7 @@ std::optional<Components> componentsOf(std::string_view text) {
 
 bool isScheme(std::string_view text) {
   return isASCIILetter(text.front()) && std::all_of(text.begin(), text.end(), [](char c) {
-           return isASCIILetter(c) || isDigit(c) || c == '+' || c == '-' || c == '.';
+           return isASCIILetter(c) || isASCIIDigit(c) || c == '+' || c == '-' || c == '.';
          });
 }
 
@@ -133,7 +101,7 @@ bool isPort(std::string_view text) {
   if (text.front() != ':') return false;
   unsigned number = 0;
   for (const char c : text.substr(1)) {
-    if (!isDigit(c)) return false;
+    if (!isASCIIDigit(c)) return false;
     number = number * 10 + static_cast<unsigned>(c - '0');
     if (number > 65535) return false;
   }
@@ -150,16 +118,11 @@ bool isWellFormed(const Authority& authority) {
          host.find('@') == std::string_view::npos && isPort(authority.port);
 }
 
-bool equalIgnoringCase(std::string_view left, std::string_view right) {
-  return std::equal(left.begin(), left.end(), right.begin(), right.end(),
-                    [](char a, char b) { return lowercasedASCII(a) == lowercasedASCII(b); });
-}
-
 /// The host in the ASCII form that the domain name system knows ("bücher.example" gives
 /// "xn--bcher-kva.example"). The transfer library would take the host's encoding from the locale,
 /// ICU takes it as the UTF-8 that it is.
 std::optional<std::string> hostInASCII(std::string_view host) {
-  if (std::all_of(host.begin(), host.end(), isASCII)) return std::string(host);
+  if (isASCII(host)) return std::string(host);
   UErrorCode status = U_ZERO_ERROR;
   const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
@@ -217,9 +180,7 @@ std::optional<URL> URL::parse(std::string_view text) {
   }
 
   URL url;
-  url.text_ = text;
-  url.scheme_ = components->scheme;
-  std::transform(url.scheme_.begin(), url.scheme_.end(), url.scheme_.begin(), lowercasedASCII);
+  url.scheme_ = lowercased(components->scheme);
   url.encodedPath_ = nonASCIIEncoded(components->path);
   url.encodedText_ = std::string(components->scheme) + ":";
 
@@ -234,8 +195,8 @@ std::optional<URL> URL::parse(std::string_view text) {
   url.encodedText_ += url.encodedPath_ + nonASCIIEncoded(tail);
 
   if (url.scheme_ == "file") {
-    const std::string_view host = components->authority.value_or("");
-    if (!host.empty() && !equalIgnoringCase(host, "localhost")) return std::nullopt;
+    const std::string host = lowercased(components->authority.value_or(""));
+    if (!host.empty() && host != "localhost") return std::nullopt;
     if (url.encodedPath_.empty() || url.encodedPath_.front() != '/') return std::nullopt;
   } else if (url.scheme_ == "http" || url.scheme_ == "https") {
     if (authority->host.empty() || !isAcceptedByTransferLibrary(url.encodedText_)) {
@@ -254,7 +215,7 @@ std::string percentDecoded(std::string_view text) {
   decoded.reserve(text.size());
   for (std::size_t i = 0; i < text.size(); ++i) {
     if (isPercentTriplet(text, i)) {
-      decoded += static_cast<char>(hexValue(text[i + 1]) * 16 + hexValue(text[i + 2]));
+      decoded += static_cast<char>(hexDigitValue(text[i + 1]) * 16 + hexDigitValue(text[i + 2]));
       i += 2;
     } else {
       decoded += text[i];
@@ -268,7 +229,7 @@ std::string fileURLText(std::string_view absolutePath) {
   std::string text = "file://";
   text.reserve(text.size() + absolutePath.size());
   for (const char c : absolutePath) {
-    if (isASCIILetter(c) || isDigit(c) || kAllowedMarks.find(c) != std::string_view::npos) {
+    if (isASCIILetter(c) || isASCIIDigit(c) || kAllowedMarks.find(c) != std::string_view::npos) {
       text += c;
     } else {
       appendPercentEncoded(text, c);

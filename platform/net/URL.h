@@ -13,12 +13,15 @@ namespace platform {
 /// an http or https URL without "//" and a host, a file: URL with a host other than none or
 /// localhost or with a relative path. Non-ASCII characters (of valid UTF-8) are accepted and count
 /// as percent-encoded, those of the host as its internationalised name. Any other scheme is valid.
+///
+///     const std::optional<URL> url = URL::parse("https://bücher.example/a%20b.mp3?x=1");
+///     if (!url) return;    // not one that could be fetched
+///     url->encodedText();  // "https://xn--bcher-kva.example/a%20b.mp3?x=1"
+///     url->path();         // "/a b.mp3"
 class URL {
  public:
   static std::optional<URL> parse(std::string_view text);
 
-  /// The URL as it was given.
-  const std::string& text() const { return text_; }
   /// The URL as it is sent: non-ASCII characters percent-encoded, a host with such characters in
   /// its ASCII form ("xn--...").
   const std::string& encodedText() const { return encodedText_; }
@@ -29,10 +32,7 @@ class URL {
   /// The path percent-decoded; may hold any byte, NUL included.
   std::string path() const;
 
-  friend bool operator==(const URL& left, const URL& right) { return left.text_ == right.text_; }
-
  private:
-  std::string text_;
   std::string encodedText_;
   std::string scheme_;
   std::string encodedPath_;

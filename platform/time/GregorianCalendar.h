@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <utility>
 
 #include "platform/time/PointInTime.h"
 #include "platform/time/TimeZone.h"
@@ -25,10 +26,7 @@ struct DateComponents {
 /// before its introduction included, as they do for the dates of ISO 8601.
 class GregorianCalendar {
  public:
-  /// In the local time zone.
-  GregorianCalendar() : zone_(TimeZone::local()) {}
-
-  void setTimeZone(const TimeZone& zone) { zone_ = zone; }
+  explicit GregorianCalendar(TimeZone zone = TimeZone::local()) : zone_(std::move(zone)) {}
 
   /// The point in time of the components; absent when it lies outside what the calendar can count,
   /// some five million years before and after now.

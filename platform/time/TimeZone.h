@@ -16,6 +16,10 @@ namespace platform {
 /// A time zone: a fixed offset from GMT, or a zone with its daylight-saving rules, of the time-zone
 /// database or of TZ. A handle that is cheap to copy and may be shared by threads; zones are made
 /// once and reused.
+///
+///     const std::optional<TimeZone> zone = TimeZone::named("America/New_York");
+///     if (!zone) return;     // the database does not have it
+///     zone->offsetAt(date);  // -18000 in winter, -14400 in summer
 class TimeZone {
  public:
   /// A zone always `seconds` ahead of GMT (behind, when negative).

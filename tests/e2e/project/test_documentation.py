@@ -196,6 +196,20 @@ class DocumentationTest(ToolTestCase):
                     if heading:
                         self.assertIn(heading, headings(target))
 
+    def test_the_tests_that_hold_the_promises_exist(self):
+        text = (ROOT / "docs" / "reliability.md").read_text(encoding="utf-8")
+        tests = set(re.findall(r"`(test_\w+)(?:\.(\w+))?(?:\.(\w+))?`", text))
+        suites = set(re.findall(r"`(?:fuzz\.(\w+)|(\w+)Test)`", text))
+        self.assertTrue(tests and suites)
+        for module, case, method in tests:
+            with self.subTest(module=module, case=case, method=method):
+                (file,) = (ROOT / "tests" / "e2e").glob(f"*/{module}.py")
+                self.assertRegex(file.read_text(encoding="utf-8"), rf"(?s)class {case}\b.*def {method}\b")
+        for target, unit in suites:
+            with self.subTest(fuzz=target, unit=unit):
+                pattern = f"fuzz/{target}Fuzz.cpp" if target else f"tests/**/{unit}Test.cpp"
+                self.assertEqual(len(list(ROOT.glob(pattern))), 1)
+
 
 def headings(document):
     """The anchors of a document's headings."""

@@ -159,11 +159,10 @@ TEST(GregorianCalendarTest, ExtremesOfEveryFieldAreTakenWithoutFault) {
 
 TEST(GregorianCalendarTest, ZoneOfTheComponentsGoesBeforeThatOfTheCalendar) {
   const EnvironmentGuard guard("TZ", "Europe/Berlin");
-  GregorianCalendar calendar;
   DateComponents fields = components(2007, 6, 5, 12);
   fields.timeZone.reset();
-  EXPECT_EQ(calendar.dateFromComponents(fields), instant(1181037600));
-  calendar.setTimeZone(*TimeZone::named("America/Los_Angeles"));
+  EXPECT_EQ(GregorianCalendar().dateFromComponents(fields), instant(1181037600));
+  const GregorianCalendar calendar(*TimeZone::named("America/Los_Angeles"));
   EXPECT_EQ(calendar.dateFromComponents(fields), instant(1181070000));
   fields.timeZone = TimeZone::withOffset(9540);
   EXPECT_EQ(calendar.dateFromComponents(fields), instant(1181035260));
@@ -196,9 +195,8 @@ TEST(GregorianCalendarTest, CurrentYearIsThatOfItsZone) {
     return static_cast<int>(
         std::chrono::year_month_day(std::chrono::floor<std::chrono::days>(time)).year());
   };
-  GregorianCalendar calendar;
   for (const std::int64_t offset : {std::int64_t{0}, std::int64_t{366} * 86400}) {
-    calendar.setTimeZone(TimeZone::withOffset(offset));
+    const GregorianCalendar calendar(TimeZone::withOffset(offset));
     const auto before = yearOf(std::chrono::system_clock::now() + seconds(offset));
     const std::int64_t year = calendar.currentYear();
     const auto after = yearOf(std::chrono::system_clock::now() + seconds(offset));
