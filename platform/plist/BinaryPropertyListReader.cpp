@@ -10,7 +10,6 @@
 #include "platform/text/TextEncoding.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kHeader = "bplist00";

@@ -10,7 +10,6 @@
 #include "platform/time/CivilDay.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::int64_t kSecondsOfDay = 86400;

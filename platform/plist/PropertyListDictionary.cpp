@@ -7,7 +7,6 @@
 #include "platform/plist/PropertyListValue.h"
 
 namespace platform {
-
 namespace {
 
 using Entry = PropertyListDictionary::Entry;

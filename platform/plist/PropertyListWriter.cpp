@@ -11,7 +11,6 @@
 #include "platform/xml/XMLWriter.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::size_t kBufferSize = std::size_t{1} << 20;

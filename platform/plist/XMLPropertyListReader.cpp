@@ -13,7 +13,6 @@
 #include "platform/text/FormattedText.h"
 
 namespace platform {
-
 namespace {
 
 /// The number that the whole text is; absent for anything else and for one out of range.

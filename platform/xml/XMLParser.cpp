@@ -13,7 +13,6 @@
 #include "platform/xml/ExpansionBudget.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";

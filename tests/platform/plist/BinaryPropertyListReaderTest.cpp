@@ -264,8 +264,9 @@ TEST(BinaryPropertyListReaderTest, RefusesSharedObjectsThatExplode) {
   const auto a = dictionaries.addText("a");
   const auto b = dictionaries.addText("b");
   inner = a;
-  for (int level = 0; level < 40; ++level)
+  for (int level = 0; level < 40; ++level) {
     inner = dictionaries.addDictionary({a, b}, {inner, inner});
+  }
   EXPECT_EQ(readOutcome(dictionaries.bytes(inner)), tooLarge);
 
   BinaryPropertyList data(2);
@@ -286,8 +287,9 @@ TEST(BinaryPropertyListReaderTest, RefusesOverlappingTextsThatExplode) {
   constexpr std::size_t kTexts = 20000;
   constexpr std::size_t kSize = 10;
   std::string objects;
-  for (std::size_t i = 0; i < kTexts; ++i)
+  for (std::size_t i = 0; i < kTexts; ++i) {
     objects += "\x5F\x13" + bigEndian((kTexts - 1 - i) * kSize, 8);
+  }
   std::string array = "\xAF\x12" + bigEndian(kTexts, 4);
   for (std::size_t i = 0; i < kTexts; ++i) array += bigEndian(i, 4);
   std::string table;

@@ -125,5 +125,4 @@ TEST(DocumentEncodingTest, TheParserReadsEveryEncoding) {
 }
 
 }  // namespace
-
 }  // namespace platform

@@ -332,5 +332,4 @@ TEST(XMLParserTest, AbortEndsTheParseAtThePlaceOfTheEvent) {
 }
 
 }  // namespace
-
 }  // namespace platform

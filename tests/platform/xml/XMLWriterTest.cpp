@@ -182,5 +182,4 @@ TEST(XMLWriterTest, TakesAQuarterMillionChildrenOfOneElement) {
 }
 
 }  // namespace
-
 }  // namespace platform
