@@ -36,8 +36,8 @@ class ContentsReader : private platform::XMLParserEvents {
   static Contents read(const std::string& document) {
     ContentsReader reader;
     platform::XMLParser parser(document, reader);
-    platform::ErrorSlot error;
-    requireThat(parser.parse(error), "a document that was written is well-formed");
+    std::optional<platform::XMLFault> fault;
+    requireThat(parser.parse(fault), "a document that was written is well-formed");
     return reader.contents_;
   }
 

@@ -60,7 +60,11 @@ std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::st
 }
 
 bool FeedParser::parseWithError(platform::ErrorSlot& error) {
-  if (!feedParser_.parse(error)) return false;
+  std::optional<platform::XMLFault> fault;
+  if (!feedParser_.parse(fault)) {
+    error = fault->record();
+    return false;
+  }
   if (feedType_ == "rss" || feedType_ == "atom") return true;
   error = QELError(3, "The feed was neither RSS nor Atom");
   return false;

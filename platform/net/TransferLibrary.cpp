@@ -2,6 +2,9 @@
 
 #include <dlfcn.h>
 
+#include <algorithm>
+#include <string>
+#include <string_view>
 #include <type_traits>
 #include <utility>
 
@@ -15,13 +18,23 @@ constexpr const char* kFile = "libcurl.so.4";
 
 ErrorRecord loadingError() {
   const char* const cause = dlerror();
-  return transferError(CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded");
+  std::string description = cause != nullptr ? cause : "libcurl cannot be loaded";
+  // A file that was found is called by its whole path.
+  if (std::string_view(description).starts_with(kFile)) {
+    description +=
+        "; http and https need it: install the package libcurl4 (Debian, Ubuntu) or libcurl "
+        "(Fedora)";
+  }
+  return transferError(CURLE_FAILED_INIT, std::move(description));
 }
 
 }  // namespace
 
-ErrorRecord transferError(CURLcode code, std::string description) {
-  return {"transfer", code, std::move(description)};
+ErrorRecord transferError(CURLcode code, std::string_view description) {
+  std::string shown(description.substr(0, description.find_last_not_of(".\r\n") + 1));
+  std::replace_if(
+      shown.begin(), shown.end(), [](char c) { return c < ' ' || c > '~'; }, '?');
+  return {"transfer", code, std::move(shown)};
 }
 
 TransferLibrary::TransferLibrary() {

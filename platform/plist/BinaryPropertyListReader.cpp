@@ -6,11 +6,10 @@
 #include <cmath>
 #include <utility>
 
-#include "platform/text/FormattedText.h"
+#include "platform/text/ASCII.h"
 #include "platform/text/TextEncoding.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kHeader = "bplist00";
@@ -53,23 +52,18 @@ enum class BinaryPropertyListReader::Kind : unsigned {
 BinaryPropertyListReader::BinaryPropertyListReader(std::string_view bytes)
     : bytes_(bytes), memoryLeft_(kMemoryAllowance + kMemoryPerByte * bytes.size()) {}
 
-std::optional<PropertyListValue> BinaryPropertyListReader::read(ErrorSlot& error) {
+std::optional<PropertyListValue> BinaryPropertyListReader::read(
+    std::optional<PropertyListFault>& fault) {
   bool succeeded = readTrailer();
   while (succeeded && !levels_.empty()) succeeded = readNextPart();
-  if (!succeeded) {
-    error = std::move(error_);
-    return std::nullopt;
-  }
-  return builder_.takeRoot();
+  if (succeeded) return builder_.takeRoot();
+  fault = std::move(fault_);
+  return std::nullopt;
 }
 
 bool BinaryPropertyListReader::readTrailer() {
-  const auto malformed = [this](std::string description) {
-    return fail(PropertyListFault::kMalformed, std::move(description));
-  };
-  if (!bytes_.starts_with(kHeader))
-    return malformed("a binary property list of an unknown version");
-  if (bytes_.size() < kHeader.size() + kTrailerSize) return malformed("a cut binary property list");
+  if (!bytes_.starts_with(kHeader)) return fail("a binary property list of an unknown version");
+  if (bytes_.size() < kHeader.size() + kTrailerSize) return fail("a cut binary property list");
 
   const std::size_t tableEnd = bytes_.size() - kTrailerSize;
   offsetWidth_ = unsignedAt(tableEnd + 6, 1);
@@ -80,8 +74,9 @@ bool BinaryPropertyListReader::readTrailer() {
 
   const auto isWidth = [](std::size_t width) { return width >= 1 && width <= kWidestInteger; };
   if (!isWidth(offsetWidth_) || !isWidth(referenceWidth_) || tableOffset < kHeader.size() ||
-      tableOffset > tableEnd || objectCount_ > (tableEnd - tableOffset) / offsetWidth_)
-    return malformed("a binary property list with a malformed trailer");
+      tableOffset > tableEnd || objectCount_ > (tableEnd - tableOffset) / offsetWidth_) {
+    return fail("a binary property list with a malformed trailer");
+  }
   tableOffset_ = tableOffset;
 
   // There are no more objects than bytes, so this is always there.
@@ -113,7 +108,7 @@ bool BinaryPropertyListReader::readKey(std::uint64_t number) {
   const auto object = objectAt(number);
   if (!object) return false;
   const auto key = text(number, *object);
-  if (!key) return failAtObject(number, "is a key but no text");
+  if (!key) return fail("a key that is no text", number);
   builder_.setKey(*key);
   return true;
 }
@@ -131,20 +126,18 @@ bool BinaryPropertyListReader::readObject(std::uint64_t number) {
       break;
   }
   auto value = scalar(number, *object);
-  if (!value) return failAtObject(number, "is cut or of an unknown kind");
+  if (!value) return fail("an object that is cut or of an unknown kind", number);
   builder_.add(std::move(*value));
   return true;
 }
 
 bool BinaryPropertyListReader::openContainer(std::uint64_t number, const Object& object) {
   const bool isDictionary = object.kind == Kind::kDictionary;
-  if (isOpen_[number]) return failAtObject(number, "contains itself");
-  if (levels_.size() >= kPropertyListDepthLimit)
-    return fail(PropertyListFault::kTooLarge,
-                formattedText("arrays and dictionaries nested deeper than %ld levels",
-                              {kPropertyListDepthLimit}));
-  if (!holds(object, object.size, isDictionary ? 2 * referenceWidth_ : referenceWidth_))
-    return failAtObject(number, "is cut");
+  if (isOpen_[number]) return fail("an array or dictionary that contains itself", number);
+  if (levels_.size() >= kPropertyListDepthLimit) return fail(kPropertyListTooDeep, number);
+  if (!holds(object, object.size, isDictionary ? 2 * referenceWidth_ : referenceWidth_)) {
+    return fail("an array or dictionary that is cut", number);
+  }
   if (!spend(object.size * (isDictionary ? kMemoryOfEntry : kMemoryOfElement))) return false;
 
   if (isDictionary) {
@@ -163,12 +156,12 @@ bool BinaryPropertyListReader::openContainer(std::uint64_t number, const Object&
 std::optional<BinaryPropertyListReader::Object> BinaryPropertyListReader::objectAt(
     std::uint64_t number) {
   if (number >= objectCount_) {
-    failAtObject(number, "does not exist");
+    fail("an object that does not exist", number);
     return std::nullopt;
   }
   const std::uint64_t offset = unsignedAt(tableOffset_ + number * offsetWidth_, offsetWidth_);
   if (offset < kHeader.size() || offset >= tableOffset_) {
-    failAtObject(number, "lies outside the objects");
+    fail("an object that lies outside of the objects", number);
     return std::nullopt;
   }
   const std::uint64_t marker = unsignedAt(offset, 1);
@@ -182,7 +175,7 @@ std::optional<BinaryPropertyListReader::Object> BinaryPropertyListReader::object
     const std::size_t width = std::size_t{1} << (countMarker & 0x3);
     // Counts of 1, 2, 4 and 8 bytes: markers 0x10 to 0x13.
     if (countMarker >> 2 != 0x10 >> 2 || !holds(count, 1, width)) {
-      failAtObject(number, "has a malformed count");
+      fail("an object with a malformed count", number);
       return std::nullopt;
     }
     object.size = unsignedAt(count.content, width);
@@ -213,8 +206,9 @@ std::optional<PropertyListValue> BinaryPropertyListReader::scalar(std::uint64_t 
 
 std::optional<PropertyListValue> BinaryPropertyListReader::integer(const Object& object) const {
   if (object.size > 4 || !holds(object, 1, std::size_t{1} << object.size)) return std::nullopt;
-  if (object.size < 3)
+  if (object.size < 3) {
     return PropertyListValue(unsignedAt(object.content, std::size_t{1} << object.size));
+  }
   // Shorter integers have no sign; those of 8 bytes have one, and those of 16 bytes hold both what
   // is negative and what exceeds the 8.
   const std::uint64_t first = unsignedAt(object.content, 8);
@@ -231,8 +225,9 @@ std::optional<PropertyListValue> BinaryPropertyListReader::real(const Object& ob
     const auto bits = static_cast<std::uint32_t>(unsignedAt(object.content, 4));
     return PropertyListValue(static_cast<double>(std::bit_cast<float>(bits)));
   }
-  if (object.size == 3 && holds(object, 1, 8))
+  if (object.size == 3 && holds(object, 1, 8)) {
     return PropertyListValue(std::bit_cast<double>(unsignedAt(object.content, 8)));
+  }
   return std::nullopt;
 }
 
@@ -254,8 +249,9 @@ std::optional<PropertyListValue> BinaryPropertyListReader::data(const Object& ob
 
 std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const Object& object) {
   const bool isUTF16 = object.kind == Kind::kTextUTF16;
-  if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8)
+  if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8) {
     return std::nullopt;
+  }
   Text& text = texts_[number];
   if (!text.empty()) {
     if (!spend(text.size())) return std::nullopt;
@@ -267,10 +263,7 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
       bytes_.substr(object.content, isUTF16 ? 2 * object.size : object.size);
   // Objects may overlap, so that even unshared texts can exceed the bytes by any factor.
   if (!spend(encoded.size())) return std::nullopt;
-  const bool isPlain = !isUTF16 && std::ranges::all_of(encoded, [](char c) {
-    return static_cast<unsigned char>(c) < 0x80;
-  });
-  if (isPlain) {
+  if (!isUTF16 && isASCII(encoded)) {
     text = Text(encoded);
   } else {
     const std::string_view encoding = isUTF16                           ? "UTF-16BE"
@@ -278,8 +271,9 @@ std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const O
                                                                         : "UTF-8";
     auto converted = convertedToUTF8(encoded, encoding);
     if (!converted) return std::nullopt;
-    if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size()))
+    if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size())) {
       return std::nullopt;
+    }
     text = Text(*converted);
   }
   return text;
@@ -293,30 +287,23 @@ bool BinaryPropertyListReader::holds(const Object& object, std::uint64_t count,
 
 std::uint64_t BinaryPropertyListReader::unsignedAt(std::size_t offset, std::size_t width) const {
   std::uint64_t number = 0;
-  for (const char byte : bytes_.substr(offset, width))
+  for (const char byte : bytes_.substr(offset, width)) {
     number = number << 8 | static_cast<unsigned char>(byte);
+  }
   return number;
 }
 
 bool BinaryPropertyListReader::spend(std::uint64_t memory) {
-  if (memory > memoryLeft_)
-    return fail(PropertyListFault::kTooLarge,
-                "a binary property list whose shared objects make it too large");
+  if (memory > memoryLeft_) {
+    return fail("a binary property list whose shared objects make it too large");
+  }
   memoryLeft_ -= memory;
   return true;
 }
 
-bool BinaryPropertyListReader::fail(PropertyListFault fault, std::string description) {
-  if (!error_)
-    error_ = ErrorRecord{.domain = std::string(kPropertyListErrorDomain),
-                         .code = static_cast<std::int64_t>(fault),
-                         .description = std::move(description)};
+bool BinaryPropertyListReader::fail(std::string description, std::optional<std::uint64_t> object) {
+  if (!fault_) fault_ = PropertyListFault{.description = std::move(description), .object = object};
   return false;
-}
-
-bool BinaryPropertyListReader::failAtObject(std::uint64_t number, std::string_view fault) {
-  return fail(PropertyListFault::kMalformed,
-              formattedText("object %lu of a binary property list %@", {number, fault}));
 }
 
 }  // namespace platform

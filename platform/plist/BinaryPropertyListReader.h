@@ -10,7 +10,6 @@
 #include "platform/plist/PropertyListBuilder.h"
 #include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListValue.h"
-#include "platform/text/ErrorRecord.h"
 #include "platform/text/Text.h"
 
 namespace platform {
@@ -26,9 +25,8 @@ class BinaryPropertyListReader {
   /// The bytes are not copied: they must outlive the reader.
   explicit BinaryPropertyListReader(std::string_view bytes);
 
-  /// Called once at most. Absent, with the slot filled, for bytes that are no such list; lets
-  /// std::bad_alloc through.
-  std::optional<PropertyListValue> read(ErrorSlot& error);
+  /// Called once at most. Absent, with the fault, for bytes that are no such list.
+  std::optional<PropertyListValue> read(std::optional<PropertyListFault>& fault);
 
  private:
   enum class Kind : unsigned;
@@ -67,9 +65,8 @@ class BinaryPropertyListReader {
   bool holds(const Object& object, std::uint64_t count, std::size_t width) const;
   std::uint64_t unsignedAt(std::size_t offset, std::size_t width) const;
   bool spend(std::uint64_t memory);
-  /// Keeps the first fault that is told; returns false.
-  bool fail(PropertyListFault fault, std::string description);
-  bool failAtObject(std::uint64_t number, std::string_view fault);
+  /// Keeps the first fault that is told, of the object if one is named; returns false.
+  bool fail(std::string description, std::optional<std::uint64_t> object = std::nullopt);
 
   std::string_view bytes_;
   std::size_t tableOffset_ = 0;  // where the objects end
@@ -82,7 +79,7 @@ class BinaryPropertyListReader {
   std::vector<bool> isOpen_;  // by object number: whether it is one of the levels
   std::vector<Text> texts_;   // by object number: read once, then shared
   std::uint64_t memoryLeft_;
-  ErrorSlot error_;
+  std::optional<PropertyListFault> fault_;
 };
 
 }  // namespace platform

@@ -1,8 +1,5 @@
 #include "platform/plist/PropertyListWriter.h"
 
-#include <array>
-#include <charconv>
-#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <string>
@@ -11,11 +8,9 @@
 #include <vector>
 
 #include "platform/plist/PropertyListDate.h"
-#include "platform/text/Base64.h"
 #include "platform/xml/XMLWriter.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::size_t kBufferSize = std::size_t{1} << 20;
@@ -26,6 +21,13 @@ constexpr std::string_view kHead =
     "<plist version=\"1.0\">\n";
 constexpr std::string_view kTail = "</plist>\n";
 
+/// Whether a podcast has values of this kind.
+bool isWritten(const PropertyListValue& value) {
+  const PropertyListValue::Storage& held = value.storage();
+  return !std::holds_alternative<double>(held) && !std::holds_alternative<bool>(held) &&
+         !std::holds_alternative<PropertyListValue::Data>(held);
+}
+
 /// Writes one list. The open containers stand on a stack of its own, so that no nesting can exhaust
 /// the stack of the thread.
 class Writer {
@@ -33,7 +35,7 @@ class Writer {
   explicit Writer(const ByteSink& sink) : sink_(sink) {}
 
   bool write(const Dictionary& root) {
-    // The root's value stands no deeper than the root: it begins a document of its own.
+    // It is not indented inside of "plist", so it is what the XML writer takes for the root.
     output_ += kHead;
     open(xml_.appendRoot("dict"), root);
     bool accepted = true;
@@ -73,6 +75,7 @@ class Writer {
       return;
     }
     const auto& [key, value] = *level.next++;
+    if (!isWritten(value)) return;
     level.element.appendChild("key", key);
     writeVariant(level.element, value);
   }
@@ -89,23 +92,7 @@ class Writer {
     parent.appendChild("integer", std::to_string(number));
   }
   void write(XMLElement parent, PointInTime date) {
-    std::string text;
-    appendPropertyListDate(text, date);
-    parent.appendChild("date", text);
-  }
-  void write(XMLElement parent, bool flag) { parent.appendChild(flag ? "true" : "false"); }
-  void write(XMLElement parent, double number) {
-    std::array<char, 32> digits{};
-    const auto result = std::to_chars(digits.data(), digits.data() + digits.size(), number);
-    std::string_view text(digits.data(), result.ptr);
-    if (std::isnan(number)) text = "nan";
-    if (std::isinf(number)) text = number < 0 ? "-infinity" : "+infinity";
-    parent.appendChild("real", text);
-  }
-  void write(XMLElement parent, const PropertyListValue::Data& data) {
-    std::string text;
-    appendBase64(text, data.bytes);
-    parent.appendChild("data", text);
+    parent.appendChild("date", propertyListDate(date));
   }
   void write(XMLElement parent, const PropertyListValue::Array& array) {
     open(parent.appendChild("array"), array);
@@ -113,6 +100,7 @@ class Writer {
   void write(XMLElement parent, const Dictionary& dictionary) {
     open(parent.appendChild("dict"), dictionary);
   }
+  void write(XMLElement /*parent*/, const auto& /*other*/) {}
 
   template <typename Container>
   void open(XMLElement element, const Container& container) {

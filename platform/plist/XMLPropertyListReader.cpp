@@ -8,20 +8,12 @@
 #include <utility>
 
 #include "platform/plist/PropertyListDate.h"
+#include "platform/text/ASCII.h"
 #include "platform/text/Base64.h"
 #include "platform/text/FormattedText.h"
 
 namespace platform {
-
 namespace {
-
-constexpr std::string_view kWhitespace = " \t\r\n";
-
-std::string_view trimmed(std::string_view text) {
-  const std::size_t first = text.find_first_not_of(kWhitespace);
-  if (first == std::string_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kWhitespace) - first + 1);
-}
 
 /// The number that the whole text is; absent for anything else and for one out of range.
 template <typename Number, typename... Format>
@@ -96,14 +88,19 @@ std::optional<XMLPropertyListReader::Element> XMLPropertyListReader::elementName
       {"data", Element::kData},
       {"plist", Element::kPlist},
   }};
-  for (const auto& [elementName, element] : kElements)
+  for (const auto& [elementName, element] : kElements) {
     if (elementName == name) return element;
+  }
   return std::nullopt;
 }
 
-std::optional<PropertyListValue> XMLPropertyListReader::read(ErrorSlot& error) {
-  if (!parser_.parse(error)) return std::nullopt;
-  return builder_.takeRoot();
+std::optional<PropertyListValue> XMLPropertyListReader::read(
+    std::optional<PropertyListFault>& fault) {
+  std::optional<XMLFault> found;
+  if (parser_.parse(found)) return builder_.takeRoot();
+  fault =
+      PropertyListFault{.description = std::move(found->description), .position = found->position};
+  return std::nullopt;
 }
 
 void XMLPropertyListReader::didStartElement(const XMLName& name,
@@ -111,13 +108,14 @@ void XMLPropertyListReader::didStartElement(const XMLName& name,
   const auto element = elementNamed(name.qualified);
   const bool isList = element == Element::kPlist;
   if (!isInsideList_ && !isList) {
-    fail("a document whose root element is not \"plist\"");
+    parser_.abort("a document whose root element is not \"plist\"");
   } else if (!isInsideList_) {
     isInsideList_ = true;
   } else if (!element || isList) {
-    fail(formattedText("an unexpected element \"%@\"", {name.qualified}));
+    parser_.abort(formattedText("an unexpected element \"%@\"", {name.qualified}));
   } else if (scalar_) {
-    fail(formattedText("an element \"%@\" inside of a value that holds text", {name.qualified}));
+    parser_.abort(
+        formattedText("an element \"%@\" inside of a value that holds text", {name.qualified}));
   } else if (element == Element::kKey) {
     startKey();
   } else {
@@ -131,7 +129,7 @@ void XMLPropertyListReader::didEndElement(const XMLName& /*name*/) {
   } else if (builder_.depth() > 0) {
     endContainer();
   } else if (!builder_.hasRoot()) {
-    fail("a property list without a value");
+    parser_.abort("a property list without a value");
   }
 }
 
@@ -140,15 +138,15 @@ void XMLPropertyListReader::foundCharacters(std::string_view text) {
   if (holdsText) {
     text_ += text;
   } else if (!trimmed(text).empty()) {
-    fail("text outside of a value that holds text");
+    parser_.abort("text outside of a value that holds text");
   }
 }
 
 void XMLPropertyListReader::startKey() {
   if (!builder_.isInDictionary()) {
-    fail("a key outside of a dictionary");
+    parser_.abort("a key outside of a dictionary");
   } else if (builder_.hasPendingKey()) {
-    fail("a key without a value in a dictionary");
+    parser_.abort("a key without a value in a dictionary");
   } else {
     startScalar(Element::kKey);
   }
@@ -157,15 +155,13 @@ void XMLPropertyListReader::startKey() {
 void XMLPropertyListReader::startValue(Element element) {
   const bool isContainer = element == Element::kArray || element == Element::kDict;
   if (builder_.hasRoot()) {
-    fail("a second value in a property list");
+    parser_.abort("a second value in a property list");
   } else if (builder_.isInDictionary() && !builder_.hasPendingKey()) {
-    fail("a value without a key in a dictionary");
+    parser_.abort("a value without a key in a dictionary");
   } else if (!isContainer) {
     startScalar(element);
   } else if (builder_.depth() == kPropertyListDepthLimit) {
-    fail(formattedText("arrays and dictionaries nested deeper than %ld levels",
-                       {kPropertyListDepthLimit}),
-         PropertyListFault::kTooLarge);
+    parser_.abort(kPropertyListTooDeep);
   } else if (element == Element::kArray) {
     builder_.beginArray();
   } else {
@@ -180,7 +176,7 @@ void XMLPropertyListReader::startScalar(Element element) {
 
 void XMLPropertyListReader::endContainer() {
   if (builder_.hasPendingKey()) {
-    fail("a key without a value in a dictionary");
+    parser_.abort("a key without a value in a dictionary");
   } else {
     builder_.end();
   }
@@ -222,14 +218,8 @@ void XMLPropertyListReader::addUnlessAbsent(std::optional<Value> value,
   if (value) {
     builder_.add(std::move(*value));
   } else {
-    fail(faultIfAbsent);
+    parser_.abort(std::string(faultIfAbsent));
   }
-}
-
-void XMLPropertyListReader::fail(std::string_view description, PropertyListFault fault) {
-  parser_.abort({.domain = std::string(kPropertyListErrorDomain),
-                 .code = static_cast<std::int64_t>(fault),
-                 .description = formattedText("%@ at %@", {description, parser_.position()})});
 }
 
 }  // namespace platform

@@ -8,7 +8,6 @@
 #include "platform/plist/PropertyListBuilder.h"
 #include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListValue.h"
-#include "platform/text/ErrorRecord.h"
 #include "platform/xml/XMLParser.h"
 
 namespace platform {
@@ -18,9 +17,8 @@ class XMLPropertyListReader final : private XMLParserEvents {
  public:
   explicit XMLPropertyListReader(std::string bytes) : parser_(std::move(bytes), *this) {}
 
-  /// Called once at most. Absent, with the slot filled, for bytes that are no such list; lets
-  /// std::bad_alloc through.
-  std::optional<PropertyListValue> read(ErrorSlot& error);
+  /// Called once at most. Absent, with the fault, for bytes that are no such list.
+  std::optional<PropertyListValue> read(std::optional<PropertyListFault>& fault);
 
  private:
   enum class Element;
@@ -37,9 +35,6 @@ class XMLPropertyListReader final : private XMLParserEvents {
   void endScalar();
   template <typename Value>
   void addUnlessAbsent(std::optional<Value> value, std::string_view faultIfAbsent);
-
-  /// Ends the parse with the fault and the place of the current event.
-  void fail(std::string_view description, PropertyListFault fault = PropertyListFault::kMalformed);
 
   XMLParser parser_;
   PropertyListBuilder builder_;

@@ -27,19 +27,6 @@ constexpr std::array<std::uint8_t, 256> kSextets = [] {
 
 }  // namespace
 
-void appendBase64(std::string& output, std::string_view bytes) {
-  for (std::size_t i = 0; i < bytes.size(); i += 3) {
-    const std::string_view group = bytes.substr(i, 3);
-    std::uint32_t bits = 0;
-    for (std::size_t j = 0; j < 3; ++j) {
-      bits = bits << 8 | (j < group.size() ? static_cast<unsigned char>(group[j]) : 0U);
-    }
-    for (std::size_t j = 0; j < 4; ++j) {
-      output += j <= group.size() ? kAlphabet[bits >> (18 - 6 * j) & 0x3F] : '=';
-    }
-  }
-}
-
 std::optional<std::string> bytesFromBase64(std::string_view text) {
   std::string bytes;
   bytes.reserve(text.size() / 4 * 3);

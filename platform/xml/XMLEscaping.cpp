@@ -5,7 +5,6 @@
 #include <cstddef>
 
 namespace platform {
-
 namespace {
 
 // What becomes of each byte: itself, a reference, nothing, or what the character shows that it

@@ -81,7 +81,8 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
     EXPECT_EQ(error, std::nullopt);
     const auto bytes = platform::readWholeFile((bundlePath() / "Info.plist").string(), error);
     if (!bytes) return {};
-    const auto value = platform::readPropertyList(*bytes, error);
+    std::optional<platform::PropertyListFault> fault;
+    const auto value = platform::readPropertyList(*bytes, fault);
     return value && value->asDictionary() ? *value->asDictionary() : Dictionary();
   }
 
@@ -91,7 +92,7 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
     const PropertyListValue* episodes = platform::valueForKey(dictionary, "Episodes");
     if (!episodes) return names;
     for (const PropertyListValue& entry : *episodes->asArray()) {
-      names.push_back(entry.asDictionary()->at("EpisodeReference").asText()->string());
+      names.push_back(platform::textForKey(*entry.asDictionary(), "EpisodeReference")->string());
     }
     return names;
   }
@@ -318,9 +319,9 @@ TEST_F(QELBundlePodcastGeneratorTest, EpisodePosterThatFailsLeavesTheEpisode) {
   addEpisode(media("3.mp3"), "Three", Text("/nowhere/p.png"));
   const Dictionary dictionary = generate();
   EXPECT_EQ(references(dictionary), (std::vector<std::string>{"1.mp3", "2.mp3", "3.mp3"}));
-  for (const PropertyListValue& entry : *dictionary.at("Episodes").asArray()) {
-    EXPECT_FALSE(entry.asDictionary()->contains("EpisodePosterReference"));
-    EXPECT_FALSE(entry.asDictionary()->contains("EpisodePosterReferenceType"));
+  for (const PropertyListValue& entry : *platform::valueForKey(dictionary, "Episodes")->asArray()) {
+    EXPECT_EQ(platform::valueForKey(*entry.asDictionary(), "EpisodePosterReference"), nullptr);
+    EXPECT_EQ(platform::valueForKey(*entry.asDictionary(), "EpisodePosterReferenceType"), nullptr);
   }
   EXPECT_EQ(printed,
             "[N] Fetching 3 episodes\n[N] Fetching episode 1...\n"

@@ -97,7 +97,7 @@ TEST(QELEpisodeTest, EachKeyFillsItsField) {
   }
   for (const Dictionary& item : {Dictionary{{"date", kDate}}, Dictionary{{"", "x"}}}) {
     EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&item)->date().has_value(),
-              item.contains("date"));
+              platform::valueForKey(item, "date") != nullptr);
     EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&item)->referenceType(), std::nullopt);
   }
 }
@@ -117,12 +117,12 @@ TEST(QELEpisodeTest, DictionaryHoldsEveryFieldAndReadsBack) {
   const Dictionary dictionary = episode->dictionary();
   EXPECT_EQ(dictionary.size(), std::size(kTextFields) + 3);
   for (const TextField& field : kTextFields) {
-    EXPECT_EQ(dictionary.at(field.referenceKey),
+    EXPECT_EQ(*platform::valueForKey(dictionary, field.referenceKey),
               PropertyListValue(std::string("value of ") + field.referenceKey));
   }
-  EXPECT_EQ(dictionary.at("EpisodeDate"), PropertyListValue(kDate));
-  EXPECT_EQ(dictionary.at("EpisodeOrder"), PropertyListValue(std::int64_t{7}));
-  EXPECT_EQ(dictionary.at("EpisodeFileSize"),
+  EXPECT_EQ(*platform::valueForKey(dictionary, "EpisodeDate"), PropertyListValue(kDate));
+  EXPECT_EQ(*platform::valueForKey(dictionary, "EpisodeOrder"), PropertyListValue(std::int64_t{7}));
+  EXPECT_EQ(*platform::valueForKey(dictionary, "EpisodeFileSize"),
             PropertyListValue(std::uint64_t{18446744073709551615U}));
 
   const auto again = QELEpisode::episodeWithDictionary(&dictionary);

@@ -275,11 +275,17 @@ TEST(FeedParserTest, DocumentWithoutRssIsRefused) {
 }
 
 TEST(FeedParserTest, TypeThatIsSetFromOutsideDecides) {
-  const auto parser = FeedParser::parserWithFeedData("<feed><title>a</title></feed>");
-  parser->setFeedType("atom");
-  platform::ErrorSlot error;
-  EXPECT_TRUE(parser->parseWithError(error));
-  EXPECT_EQ(parser->feedAttributes(), Dictionary());
+  for (const std::string type : {"atom", "opml"}) {
+    const auto parser = FeedParser::parserWithFeedData("<feed><title>a</title></feed>");
+    parser->setFeedType(type);
+    platform::ErrorSlot error;
+    EXPECT_EQ(parser->parseWithError(error), type == "atom") << type;
+    if (type != "atom") {
+      EXPECT_EQ(error,
+                (platform::ErrorRecord{"QELDomain", 3, "The feed was neither RSS nor Atom"}));
+    }
+    EXPECT_EQ(parser->feedAttributes(), Dictionary()) << type;
+  }
 }
 
 TEST(FeedParserTest, MalformedXMLFailsWithTheParsersRecord) {

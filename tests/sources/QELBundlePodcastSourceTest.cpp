@@ -134,6 +134,19 @@ TEST_F(QELBundlePodcastSourceTest, LocationsAreRebasedAndEpisodePostersAreNot) {
   EXPECT_EQ(episodes[2]->referenceType(), "remote");
 }
 
+TEST_F(QELBundlePodcastSourceTest, LoadingAgainRebasesTheSameEpisodesAgain) {
+  const std::string path =
+      bundle({{"PodcastPosterReference", "p.jpg"},
+              {"Episodes", PropertyListValue::Array{Dictionary{{"EpisodeReference", "a.mp3"}}}}});
+  const auto source = loaded(path);
+  const auto episodes = source->episodes();
+  platform::ErrorSlot error;
+  EXPECT_TRUE(source->loadSourceWithError(error));
+  EXPECT_EQ(source->episodes(), episodes);
+  EXPECT_EQ(episodes->at(0)->location(), platform::Text(path + path + "/a.mp3"));
+  EXPECT_EQ(source->posterLocation(), platform::Text(path + "/p.jpg"));
+}
+
 TEST_F(QELBundlePodcastSourceTest, RemotePosterIsJoinedLikeAPath) {
   const std::string path = bundle({{"PodcastPosterReference", "http://a.example/p.jpg"},
                                    {"PodcastPosterReferenceType", "remote"}});

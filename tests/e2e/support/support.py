@@ -25,6 +25,7 @@ ORVANE = "{https://orvane.example/ns/podcast-1.0}"
 QEL_NAMESPACE = "{https://qel.example/ns/1.0}"
 
 LOADING = b"[N] Loading/interpreting source...\n"
+NO_FEED = "Could not load source: The feed was neither RSS nor Atom"
 
 # A sanitizer that finds a fault ends the tool with this status, which the tool itself never uses.
 SANITIZER_STATUS = 99
@@ -280,6 +281,15 @@ class ToolTestCase(unittest.TestCase):
         """Exit status 1, exactly the message on standard error and exactly stdout on standard output."""
         expected = message if isinstance(message, bytes) else message.encode()
         self.assertEqual(result, Result(1, stdout, expected))
+
+    def assertInvalidSource(self, source, **options):
+        """The source begins like a URL and is none."""
+        self.assertFails(self.run_tool("parsefeed", source, **options), f'"{source}" is not a valid podcast source.\n')
+
+    def assertNoSource(self, source, **options):
+        """The source names neither a reference file nor a bundle."""
+        self.assertFails(self.run_tool("parsefeed", source, **options),
+                         f'Could not initialize podcast source with string "{source}".\n')
 
     def assertLoadFails(self, result, pattern=r".+", stdout=b""):
         """A failed load whose description, one that is not the tool's own, matches the whole pattern."""

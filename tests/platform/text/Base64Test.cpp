@@ -6,7 +6,7 @@ namespace {
 
 using namespace std::string_literals;
 
-TEST(Base64Test, BytesBecomeTextAndBack) {
+TEST(Base64Test, TextStandsForBytes) {
   const struct {
     std::string bytes, text;
   } rows[] = {
@@ -20,9 +20,6 @@ TEST(Base64Test, BytesBecomeTextAndBack) {
       {"\xFB\xFF\xBF", "+/+/"},
   };
   for (const auto& row : rows) {
-    std::string text = ">";
-    platform::appendBase64(text, row.bytes);
-    EXPECT_EQ(text, ">" + row.text);
     EXPECT_EQ(platform::bytesFromBase64(row.text), row.bytes) << row.text;
   }
 }
