@@ -1,10 +1,8 @@
 #include "platform/net/NetworkTransfer.h"
 
-#include <algorithm>
 #include <climits>
 #include <list>
 #include <mutex>
-#include <utility>
 #include <vector>
 
 namespace platform {
@@ -21,17 +19,6 @@ constexpr std::uint64_t kIgnoredBodyLimit = std::uint64_t{64} * 1024;
 constexpr std::int64_t kRedirectPageLimit = std::int64_t{16} * 1024 * 1024;
 /// Of all answers of a transfer together; honest ones have a few KiB.
 constexpr std::uint64_t kHeaderLimit = std::uint64_t{1} * 1024 * 1024;
-
-/// The library quotes what servers sent; none of that may steer a terminal or break the encoding.
-std::string shownText(std::string_view text) {
-  while (!text.empty() && (text.back() == '\n' || text.back() == '\r' || text.back() == '.')) {
-    text.remove_suffix(1);
-  }
-  std::string shown(text);
-  std::replace_if(
-      shown.begin(), shown.end(), [](char c) { return c < ' ' || c > '~'; }, '?');
-  return shown;
-}
 
 /// Only called for a transfer, which is not begun without the library.
 const TransferLibrary& library() {
@@ -65,7 +52,7 @@ class NetworkTransfer::Connections {
 
   void remove(NetworkTransfer& transfer) {
     library().multiRemoveHandle(handle_.get(), transfer.handle_.get());
-    running_.erase(std::remove(running_.begin(), running_.end(), &transfer), running_.end());
+    std::erase(running_, &transfer);
   }
 
   bool run() {
@@ -191,8 +178,7 @@ void NetworkTransfer::end(CURLcode result) {
     error_ = transferError(result, "A line of the answer's header is too long");
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
-    error_ =
-        transferError(result, shownText(detail.empty() ? library().easyStrerror(result) : detail));
+    error_ = transferError(result, detail.empty() ? library().easyStrerror(result) : detail);
   }
 }
 
@@ -226,7 +212,7 @@ bool NetworkTransfer::didReceiveHeader() {
   const int status = this->status();
   const bool hasBody = status >= 200 && status != 204 && status != 304;
   if (hasBody && !framing_.fault().empty()) {
-    if (status < 400) error_ = transferError(CURLE_PARTIAL_FILE, std::string(framing_.fault()));
+    if (status < 400) error_ = transferError(CURLE_PARTIAL_FILE, framing_.fault());
     return false;
   }
   if (status != 200) return true;

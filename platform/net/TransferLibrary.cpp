@@ -2,6 +2,7 @@
 
 #include <dlfcn.h>
 
+#include <algorithm>
 #include <string>
 #include <string_view>
 #include <type_traits>
@@ -29,8 +30,11 @@ ErrorRecord loadingError() {
 
 }  // namespace
 
-ErrorRecord transferError(CURLcode code, std::string description) {
-  return {"transfer", code, std::move(description)};
+ErrorRecord transferError(CURLcode code, std::string_view description) {
+  std::string shown(description.substr(0, description.find_last_not_of(".\r\n") + 1));
+  std::replace_if(
+      shown.begin(), shown.end(), [](char c) { return c < ' ' || c > '~'; }, '?');
+  return {"transfer", code, std::move(shown)};
 }
 
 TransferLibrary::TransferLibrary() {

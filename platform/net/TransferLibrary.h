@@ -2,7 +2,7 @@
 
 #include <curl/curl.h>
 
-#include <string>
+#include <string_view>
 
 #include "platform/text/ErrorRecord.h"
 
@@ -10,7 +10,10 @@ namespace platform {
 
 /// The record of a failed transfer, whatever noticed it: domain "transfer", with the library's
 /// codes.
-ErrorRecord transferError(CURLcode code, std::string description);
+///
+/// The library's descriptions quote what servers sent, and some end like sentences. None of that
+/// may steer a terminal or break the encoding: anything but printable ASCII is shown as "?".
+ErrorRecord transferError(CURLcode code, std::string_view description);
 
 /// The functions of libcurl that we call. For the use of platform/ alone.
 ///

@@ -78,3 +78,8 @@ inline int exitStatusOfChild(const std::function<int()>& run) {
   const int status = statusOfChild(run);
   return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
+
+/// Whether the condition holds in such a child.
+inline bool holdsInChild(const std::function<bool()>& condition) {
+  return exitStatusOfChild([&] { return condition() ? 0 : 1; }) == 0;
+}

@@ -61,6 +61,8 @@ class InfoTest(BundleTestCase):
                 ("0, which is unknown", nothing, None, None),
                 ("of a poster", sound, face, 3),
                 ("of the poster of a copy", self.media("a.mp3"), face, 3),
+                ("of a poster that breaks off", sound, web.truncated("/cut.jpg", b"123", missing=997), 1000),
+                ("0, of a poster", sound, web.serve("/empty.jpg", b""), None),
                 ("none, of a poster in chunks", sound, web.chunked("/chunks.jpg", [b"123"]), 5),
                 ("none, of a copied poster", sound, self.media("a.jpg", b"123"), 5),
                 ("none, of a page that says what is missing", sound, web.url("/missing.jpg"), 5)):
@@ -106,6 +108,24 @@ class LeftOutTest(BundleTestCase):
         self.assertEqual(self.info(), {"PodcastName": "Show", "Episodes": entries})
         self.assertEqual(set(self.files()), {*names, "Posters/good-4.PNG"})
         self.assertEqual(web.requests, [])
+
+    def test_a_type_is_looked_at_before_a_path(self):
+        """Names that no file can have, of types that are not allowed."""
+        long = "x" * 255
+        show = {"PodcastName": "Show", "PodcastPosterReference": f"/c.{long}", "AllowedPosterTypes": ["png"],
+                "AllowedEpisodeTypes": ["mp3"],
+                "Episodes": [{"EpisodeName": "Nameless", "EpisodeReference": "http://h/"},
+                             {"EpisodeName": "One", "EpisodeReference": self.media("a.mp3"),
+                              "EpisodePosterReference": f"/a.{long}"}]}
+        self.assertWarns(self.create(show), f'Unsupported poster image type "{long}" for podcast "Show"',
+                         'Invalid file type "" for episode "Nameless"',
+                         f'Unsupported poster image type "{long}" for episode "One"')
+
+    def test_an_empty_poster_location_is_one(self):
+        self.assertWarns(self.create({"PodcastName": "Show", "PodcastPosterReference": "", "Episodes": [
+            {"EpisodeName": "One", "EpisodeReference": self.media("a.mp3"), "EpisodePosterReference": ""}]}),
+            'Could not save or download poster image for podcast "Show"',
+            'Could not save or download poster image for episode "One"')
 
     def test_posters_of_the_podcast(self):
         for location, kind, failure in (("http://[/c.jpg", "remote", "generate sane path for"),

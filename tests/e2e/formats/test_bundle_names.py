@@ -140,11 +140,19 @@ class PosterNameTest(BundleTestCase):
                                (web.serve("/", b"media"), "one."),
                                (web.serve("/face.jpg%2F..%2F..%2F..%2Fescaped.gif", b"media"), "one.gif")):
             with self.subTest(location):
-                shutil.rmtree(self.bundle, ignore_errors=True)
-                self.assertWarns(self.create_episodes({"EpisodeReference": self.media("one.mp3"),
-                                                       "EpisodePosterReference": location}))
-                self.assertEqual(self.info()["Episodes"][0]["EpisodePosterReference"], f"Posters/{name}")
-                self.assertEqual(self.files(), {"one.mp3": b"media", f"Posters/{name}": b"media"})
+                self.assertPoster({"EpisodePosterReference": location}, name)
+
+    def test_the_stored_type_tells_a_path_from_a_url(self):
+        self.write("file:face.jpg?size=3.png", b"media")
+        self.assertPoster({"EpisodePosterReference": "file:face.jpg?size=3.png", "EpisodePosterReferenceType": "local"},
+                          "one.png")
+
+    def assertPoster(self, poster, name):
+        """The poster of an episode gets the name."""
+        shutil.rmtree(self.bundle, ignore_errors=True)
+        self.assertWarns(self.create_episodes({"EpisodeReference": self.media("one.mp3"), **poster}))
+        self.assertEqual(self.info()["Episodes"][0]["EpisodePosterReference"], f"Posters/{name}")
+        self.assertEqual(self.files(), {"one.mp3": b"media", f"Posters/{name}": b"media"})
 
     def test_extensions_that_no_file_can_have(self):
         web = self.server()

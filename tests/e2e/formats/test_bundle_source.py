@@ -59,6 +59,13 @@ class LoadingTest(BundleSourceTestCase):
             "Episodes": [{"EpisodeReference": f"{bundle}/../a b%20.mp3", "EpisodeReferenceType": "local", **poster},
                          untouched]})
 
+    def test_an_empty_location_is_one(self):
+        bundle = self.make({"PodcastPosterReference": "", "Episodes": [{"EpisodeReference": ""}]})
+        self.assertEqual(self.parsefeed(bundle), {
+            "PodcastReference": bundle, "PodcastReferenceType": "local",
+            "PodcastPosterReference": bundle, "PodcastPosterReferenceType": "local",
+            "Episodes": [{"EpisodeReference": bundle, "EpisodeReferenceType": "local"}]})
+
     def test_a_poster_type_without_poster_is_dropped(self):
         bundle = self.make({"PodcastPosterReferenceType": "remote"})
         self.assertEqual(self.parsefeed(bundle), {"PodcastReference": bundle, "PodcastReferenceType": "local"})
@@ -118,6 +125,10 @@ class RoundTripTest(BundleSourceTestCase):
         moved = self.path("elsewhere/moved.podcast")
         moved.parent.mkdir()
         self.bundle.rename(moved)
+        media = [str(moved / name) for name in ("a b#ü%.mp3", "a b#ü%-2.m4a")]
+        self.assertEqual([episode["EpisodeReference"] for episode in self.parsefeed(moved)["Episodes"]], media)
+        self.assertEqual([unquote(urlsplit(enclosure.get("url")).path)
+                          for enclosure in self.createfeed(moved).iter("enclosure")], media)
         self.assertWarns(self.run_tool("createbundle", "elsewhere/moved.podcast", "-d", self.bundle),
                          'Could not save or download poster image for episode "One"')
         self.assertEqual(self.files(), {path: content for path, content in self.made.items()

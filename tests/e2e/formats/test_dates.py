@@ -5,6 +5,7 @@ zones that the environment names.
 """
 
 import datetime
+import struct
 import unittest
 
 from support import ToolTestCase, element, item, rss
@@ -45,6 +46,17 @@ class ReadingTest(ToolTestCase):
         texts = ["05 Jun 2007 12:00 UTC", "05 Jun 2007 12:00 BST", "05 Jun 2007 12:00 ", "05 Jun 2007 12:00 GMT\n"]
         for zone, hour in (("UTC", 12), ("Asia/Tokyo", 3), (LOS_ANGELES, 19), (CENTRAL_EUROPE, 10)):
             self.assertDates([(text, at(2007, 6, 5, hour)) for text in texts], zone)
+
+    def test_two_digit_years_end_with_the_year_of_the_local_time(self):
+        """In a zone where the clocks are 366 days ahead that is the next one."""
+        offset = struct.pack(">i", 366 * 86400)
+        zone = self.write("zone", b"TZif" + bytes(16 + 4 * 4) + struct.pack(">II", 1, 4) + offset + bytes(2) + b"XXX\0")
+        before = datetime.datetime.now(datetime.timezone.utc)
+        for days in (0, 366):
+            year = (before + datetime.timedelta(days=days)).year
+            self.assertDates([(f"05 Jun {year % 100} 10:00 GMT", at(year, 6, 5, 10)),
+                              (f"05 Jun {year % 100 + 1} 10:00 GMT", at(year - 99, 6, 5, 10))],
+                             f":{zone}" if days else "UTC")
 
     def test_the_later_date_wins_and_a_rejected_one_changes_nothing(self):
         episode = self.episode_of("<pubDate>05 Jun 2007 10:00 GMT</pubDate><pubDate>06 Jun 2007 10:00 GMT</pubDate>"

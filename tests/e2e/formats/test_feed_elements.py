@@ -107,6 +107,7 @@ class ElementTest(ElementTestCase):
             ("<image><url>a.png</url></image><image><url>b.png</url></image>", A),
             ("<orvane:image><url>a.png</url></orvane:image>", A),
             ("<x:image><group><x:url>a.png</x:url></group></x:image>", A),
+            ("<image>\n  <url>a.png</url>\n</image>", A),
             ("<image/><url>a.png</url>", {}),
             ("<image><orvane:image/><url>a.png</url></image>", {}),
             ("<title>feed</title><image><title>image</title><description>d</description></image>",
@@ -132,7 +133,16 @@ class ElementTest(ElementTestCase):
             ("<guid>7</guid><qel:order>3</qel:order>", {"EpisodeOrder": 73}),
             ("<guid>urn:7</guid><qel:order>3</qel:order>", {"EpisodeOrder": 0}),
             ("<guid>7</guid><title>t</title><qel:order>-3</qel:order>", {"EpisodeName": "t"}),
-            (f"<title>t</title><qel:order>{'9' * 400}</qel:order>", {"EpisodeName": "t", "EpisodeOrder": 2**63 - 1}))
+            (f"<title>t</title><qel:order>{'9' * 400}</qel:order>", {"EpisodeName": "t", "EpisodeOrder": 2**63 - 1}),
+            ("<pubDate>7</pubDate><qel:order>8</qel:order>", {"EpisodeOrder": 8}),
+            ("<url>7</url><qel:order>9</qel:order>", {"EpisodeOrder": 9}),
+            ("<qel:order>1</qel:order><qel:order>2</qel:order>", {"EpisodeOrder": 2}))
+
+    def test_items_and_images_empty_no_text(self):
+        self.assertPodcasts(("<a>1</a><item><qel:order>2</qel:order><a>3</a></item>"
+                             "<item><qel:order>4</qel:order></item>"
+                             "<a>5</a><image><a>6</a></image><item><qel:order>7</qel:order></item>",
+                             {"Episodes": [{"EpisodeOrder": 12}, {"EpisodeOrder": 34}, {"EpisodeOrder": 567}]}))
 
 
 class DocumentTest(ElementTestCase):

@@ -1,4 +1,4 @@
-"""Runs are interrupted by people, by shutdowns and by readers that go away, at moments that matter.
+"""Runs are interrupted at each of their stages: by people, by shutdowns and by readers that go away.
 
 A signal that asks the tool to end leaves nothing behind but finished files.
 """

@@ -196,6 +196,13 @@ class DocumentationTest(ToolTestCase):
                     if heading:
                         self.assertIn(heading, headings(target))
 
+    def test_sources_that_are_named_exist(self):
+        for document in (ROOT / "CONTRIBUTING.md", *PAGES):
+            for name in re.findall(r"`([a-z]+/[\w/-]+\.(?:h|cpp|cmake|py))`", document.read_text(encoding="utf-8")):
+                if "NAME" not in name:
+                    with self.subTest(f"{document.name}: {name}"):
+                        self.assertTrue((ROOT / name).exists())
+
     def test_the_tests_that_hold_the_promises_exist(self):
         text = (ROOT / "docs" / "reliability.md").read_text(encoding="utf-8")
         tests = set(re.findall(r"`(test_\w+)(?:\.(\w+))?(?:\.(\w+))?`", text))

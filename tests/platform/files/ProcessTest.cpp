@@ -24,29 +24,25 @@ namespace platform {
 namespace {
 
 TEST(ProcessTest, ClosedPipeIsAFailedWrite) {
-  EXPECT_EQ(exitStatusOfChild([] {
-              ::signal(SIGPIPE, SIG_DFL);
-              prepareProcess();
-              std::array<int, 2> ends{};
-              if (::pipe(ends.data()) != 0) return 1;
-              ::close(ends[0]);
-              return ::write(ends[1], "x", 1) == -1 && errno == EPIPE ? 0 : 2;
-            }),
-            0);
+  EXPECT_TRUE(holdsInChild([] {
+    ::signal(SIGPIPE, SIG_DFL);
+    prepareProcess();
+    std::array<int, 2> ends{};
+    return ::pipe(ends.data()) == 0 && ::close(ends[0]) == 0 && ::write(ends[1], "x", 1) == -1 &&
+           errno == EPIPE;
+  }));
 }
 
 TEST(ProcessTest, FileBeyondTheLimitIsAFailedWrite) {
   const TemporaryDirectory directory;
   const std::string path = directory.addFile("file", "");
-  EXPECT_EQ(exitStatusOfChild([&] {
-              ::signal(SIGXFSZ, SIG_DFL);
-              prepareProcess();
-              const rlimit limit{0, 0};
-              ::setrlimit(RLIMIT_FSIZE, &limit);
-              const int file = ::open(path.c_str(), O_WRONLY);
-              return ::write(file, "x", 1) == -1 && errno == EFBIG ? 0 : 1;
-            }),
-            0);
+  EXPECT_TRUE(holdsInChild([&] {
+    ::signal(SIGXFSZ, SIG_DFL);
+    prepareProcess();
+    const rlimit limit{0, 0};
+    ::setrlimit(RLIMIT_FSIZE, &limit);
+    return ::write(::open(path.c_str(), O_WRONLY), "x", 1) == -1 && errno == EFBIG;
+  }));
 }
 
 bool isOpenOnNothing(int descriptor) {

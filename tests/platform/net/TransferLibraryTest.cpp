@@ -17,5 +17,11 @@ TEST(TransferLibraryTest, FunctionsAreThoseOfTheLibraryThatTheHeadersDescribe) {
   library->urlCleanup(url);
 }
 
+TEST(TransferLibraryTest, ErrorsAreShownWithoutWhatServersMadeUp) {
+  EXPECT_EQ(transferError(CURLE_COULDNT_RESOLVE_HOST, "No host: \x1B[31m\u00E9\x7F~.\r\n"),
+            (ErrorRecord{"transfer", 6, "No host: ?[31m???~"}));
+  EXPECT_EQ(transferError(CURLE_RECV_ERROR, "...").description, "");
+}
+
 }  // namespace
 }  // namespace platform
