@@ -13,8 +13,8 @@ std::optional<PropertyListValue> readPropertyList(std::string bytes,
     fault = PropertyListFault{.description = "an empty property list"};
     return std::nullopt;
   }
-  if (bytes.starts_with("bplist")) return BinaryPropertyListReader(bytes).read(fault);
-  return XMLPropertyListReader(std::move(bytes)).read(fault);
+  if (bytes.starts_with("bplist")) return readBinaryPropertyList(bytes, fault);
+  return readXMLPropertyList(std::move(bytes), fault);
 }
 
 }  // namespace platform
