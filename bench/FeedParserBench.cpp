@@ -24,8 +24,8 @@ void parseXMLOnly(benchmark::State& state) {
   for (auto _ : state) {
     NoEvents events;
     platform::XMLParser parser(feed, events);
-    platform::ErrorSlot error;
-    if (!parser.parse(error)) throw std::runtime_error("the feed was refused");
+    std::optional<platform::XMLFault> fault;
+    if (!parser.parse(fault)) throw std::runtime_error("the feed was refused");
   }
   state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(feed.size()));
   state.SetItemsProcessed(state.iterations() * state.range(0));

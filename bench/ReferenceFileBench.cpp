@@ -16,8 +16,8 @@ namespace {
 void readReferenceFile(benchmark::State& state) {
   const std::string file = sampleReferenceFile(static_cast<int>(state.range(0)));
   for (auto _ : state) {
-    platform::ErrorSlot error;
-    const auto value = platform::readPropertyList(file, error);
+    std::optional<platform::PropertyListFault> fault;
+    const auto value = platform::readPropertyList(file, fault);
     if (!value) throw std::runtime_error("the reference file was refused");
     benchmark::DoNotOptimize(value);
   }

@@ -7,19 +7,16 @@ the tool then writes its result all the same, where the row does not say otherwi
 import contextlib
 import dataclasses
 import plistlib
-import re
 import shutil
-import subprocess
-import sys
 from pathlib import Path
 from typing import Optional
 
 import inputs
 import media_server
 from measuring import Contestant, contest, run
+from rivals import Peers
 
 STYLESHEET = Path(__file__).parent / "to-reference.xsl"
-FEEDPARSER = "import feedparser, sys; sys.exit(len(feedparser.parse(sys.argv[1]).entries) == 0)"
 MEGABYTE = 1_000_000
 
 
@@ -61,48 +58,14 @@ class Row:
         return {**kept, "ours": ours, "theirs": theirs, "ratio": ours["median"] / theirs["median"]}
 
 
-def python_with_feedparser():
-    """A Python that has feedparser; distributions install it for their own one only."""
-    for interpreter in (sys.executable, "/usr/bin/python3"):
-        if shutil.which(interpreter) and subprocess.run(
-                [interpreter, "-c", "import feedparser"], stderr=subprocess.DEVNULL, check=False).returncode == 0:
-            return interpreter
-    return None
-
-
-def version_in(text):
-    """The first version number in what a program says of itself; 20914 is how libxml writes 2.9.14."""
-    found = re.search(r"\b(\d)(\d\d)(\d\d)\b|\d+(?:\.\d+)+", text)
-    if not found:
-        return "of an unknown version"
-    return ".".join(str(int(part)) for part in found.groups()) if found[1] else found[0]
-
-
-def rivals():
-    """The version of each rival that is installed, None for a missing one."""
-    versions = {}
-    for name, argument in (("xmllint", "--version"), ("xsltproc", "--version"), ("plistutil", "--version"),
-                           ("curl", "--version"), ("wget", "--version"), ("cp", "--version"), ("nginx", "-v")):
-        path = media_server.program() if name == "nginx" else shutil.which(name)
-        if path:
-            said = subprocess.run([path, argument], stdout=subprocess.PIPE, stderr=subprocess.STDOUT, check=False)
-            versions[name] = version_in(said.stdout.decode(errors="replace"))
-        else:
-            versions[name] = None
-    interpreter = python_with_feedparser()
-    versions["feedparser"] = interpreter and subprocess.run(
-        [interpreter, "-c", "import feedparser; print(feedparser.__version__)"],
-        stdout=subprocess.PIPE, check=True).stdout.decode().strip()
-    return versions
-
-
 class Contests:
     """All contests, over inputs that are made when first needed and kept in `kept`; outputs go to `scratch`."""
 
-    NAMES = ("feed", "feedparser", "reference", "growth", "names", "many", "large", "local", "start")
+    NAMES = ("feed", "peers", "reference", "growth", "names", "many", "large", "local", "start")
 
-    def __init__(self, tool, sizes, kept, scratch, rounds):
-        self.tool, self.sizes, self.kept, self.scratch, self.rounds = tool, sizes, kept, scratch, rounds
+    def __init__(self, tool, peers, sizes, kept, scratch, rounds):
+        self.tool, self.peer_parsers, self.sizes, self.rounds = tool, peers, sizes, rounds
+        self.kept, self.scratch = kept, scratch
 
     def run(self, name):
         """The figures of the rows of one contest."""
@@ -173,29 +136,29 @@ class Contests:
                              check=holds_all(b"<key>EpisodeName<")),
             ],
             [
-                Row(f"parsefeed, {work}", parser, 1.5, "parsefeed", "xmllint", "xmllint"),
-                Row(f"createfeed, {work}", parser, 2.5, "createfeed", "xmllint", "xmllint"),
+                Row(f"parsefeed, {work}", parser, 1.4, "parsefeed", "xmllint", "xmllint"),
+                Row(f"createfeed, {work}", parser, 2.0, "createfeed", "xmllint", "xmllint"),
                 Row(f"parsefeed, {work}, to /dev/null", parser, None, "parsefeed, unwritten", "xmllint", "xmllint"),
                 Row(f"parsefeed, {work}", "`xsltproc`, a stylesheet to the same file", None, "parsefeed", "xsltproc",
                     "xsltproc"),
-                Row("peak memory, parsefeed", "the feed's size", 3.0, "parsefeed", size),
-                Row("peak memory, createfeed", "the feed's size", 4.0, "createfeed", size),
+                Row("peak memory, parsefeed", "the feed's size", 2.1, "parsefeed", size),
+                Row("peak memory, createfeed", "the feed's size", 2.8, "createfeed", size),
             ],
             1.0,
         )
 
-    def feedparser(self):
+    def peers(self):
         items = self.sizes.items
-        feed, interpreter = self.feed_of(items), python_with_feedparser()
-        return (
-            [
-                self.qel("parsefeed", "parsefeed", feed.as_uri(), self.scratch / "a.plist"),
-                Contestant("feedparser", [interpreter, "-c", FEEDPARSER, feed] if interpreter else None),
-            ],
-            [Row(f"parsefeed, {items:,} items", "Python's feedparser parsing it", 0.02, "parsefeed", "feedparser",
-                 "python3-feedparser")],
-            0.3,
-        )
+        feed = self.feed_of(items)
+        contestants, rows = [self.qel("parsefeed", "parsefeed", feed.as_uri(), self.scratch / "a.plist")], []
+        for name in Peers.NAMES:
+            output = self.scratch / f"{name}.count"
+            command = self.peer_parsers.command(name)
+            contestants.append(Contestant(name, [*command, feed, output] if command else None, output,
+                                          check=lambda output: int(output.read_text()) == items))
+            rows.append(Row(f"parsefeed, {items:,} items", f"{name}, a feed parser in {Peers.LANGUAGES[name]}",
+                            0.02 if name == "feedparser" else None, "parsefeed", name, Peers.PACKAGES[name]))
+        return contestants, rows, 0.3
 
     def reference(self):
         items = self.sizes.items

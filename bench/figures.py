@@ -1,5 +1,14 @@
 """What the figures of a run say: ratios, verdicts, and tables of them."""
 
+import json
+
+
+def kept_text(figures):
+    """The figures as they are kept, a row on each line."""
+    rows = ",\n".join(f"  {json.dumps(row, ensure_ascii=False)}" for row in figures["rows"])
+    text = json.dumps({**figures, "rows": []}, indent=1, ensure_ascii=False)
+    return text.replace('"rows": []', f'"rows": [\n{rows}\n ]') + "\n"
+
 
 def shown_ratio(ratio):
     """A ratio with three digits that count, but no more than it deserves."""

@@ -101,10 +101,10 @@ def summary(runs):
     seconds = [run.seconds for run in runs]
     return {
         "runs": len(runs),
-        "median": statistics.median(seconds),
-        "least": min(seconds),
-        "greatest": max(seconds),
-        "processor": statistics.median(run.processor_seconds for run in runs),
+        "median": round(statistics.median(seconds), 6),
+        "least": round(min(seconds), 6),
+        "greatest": round(max(seconds), 6),
+        "processor": round(statistics.median(run.processor_seconds for run in runs), 6),
         "peak": round(statistics.median(run.peak for run in runs)),
     }
 

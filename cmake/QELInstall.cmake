@@ -17,8 +17,10 @@ install(FILES packaging/completions/qel.bash
 install(FILES packaging/completions/_qel DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/site-functions)
 install(FILES packaging/completions/qel.fish DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d)
 
-# In the layout of the sources, so that links between the documents hold.
-install(FILES README.md CHANGELOG.md CONTRIBUTING.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
+# In the layout of the sources, so that links between the documents hold. The README of the sources is for
+# those who have them.
+install(FILES packaging/installed-readme.md DESTINATION ${CMAKE_INSTALL_DOCDIR} RENAME README.md)
+install(FILES CHANGELOG.md CONTRIBUTING.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
 install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} USE_SOURCE_PERMISSIONS
   PATTERN "*.1" EXCLUDE
   PATTERN "__pycache__" EXCLUDE
@@ -44,7 +46,7 @@ set(CPACK_DEBIAN_PACKAGE_PRIORITY optional)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 # Loaded by the tool itself, so that it is not found among the linked ones.
 set(CPACK_DEBIAN_PACKAGE_DEPENDS "libcurl4 (>= 7.85)")
-set(CPACK_DEBIAN_PACKAGE_RECOMMENDS ca-certificates)
+set(CPACK_DEBIAN_PACKAGE_RECOMMENDS "ca-certificates, parallel, python3")  # the latter for the scripts among the examples
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 set(CPACK_DEBIAN_COMPRESSION_TYPE xz)
 

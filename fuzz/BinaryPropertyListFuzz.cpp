@@ -6,13 +6,13 @@
 /// Any bytes, or any objects, as a binary property list: it is refused with a cause, or can be
 /// written in the XML form and then reads back as what XML can hold of it.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-  platform::ErrorSlot error;
-  const auto value = platform::readPropertyList(binaryListOf(inputText(data, size)), error);
+  std::optional<platform::PropertyListFault> fault;
+  const auto value = platform::readPropertyList(binaryListOf(inputText(data, size)), fault);
   if (!value) {
-    requireTold(error);
+    requireTold(fault);
     return 0;
   }
-  requireThat(!error, "a list that is accepted leaves the slot alone");
+  requireThat(!fault, "a list that is accepted leaves the slot alone");
   const platform::Dictionary* dictionary = value->asDictionary();
   if (dictionary == nullptr || isTooLargeToWrite(*value)) return 0;
   const platform::Dictionary once = writtenAndReadBack(*dictionary);

@@ -22,10 +22,10 @@ namespace {
 using platform::Dictionary;
 
 std::unique_ptr<QELPodcastSource> referenceFileSource(std::string bytes) {
-  platform::ErrorSlot error;
-  auto value = platform::readPropertyList(std::move(bytes), error);
+  std::optional<platform::PropertyListFault> fault;
+  auto value = platform::readPropertyList(std::move(bytes), fault);
   if (!value) {
-    requireTold(error);
+    requireTold(fault);
     return nullptr;
   }
   return QELReferenceFilePodcastSource::initWithDictionary(

@@ -19,17 +19,15 @@ std::chrono::sys_seconds secondOf(PointInTime date) {
 
 /// That property lists keep every date to the second.
 void requireReadsBackFromLists(PointInTime date) {
-  std::string text;
-  platform::appendPropertyListDate(text, date);
+  const std::string text = platform::propertyListDate(date);
   const std::optional<PointInTime> back = platform::dateFromPropertyListText(text);
   requireThat(back.has_value(), "a date that was written for a property list is one");
   // The first second is held in part only.
   const bool isFirst = secondOf(date) == secondOf(PointInTime::min());
   requireThat(*back == (isFirst ? PointInTime::min() : PointInTime(secondOf(date))),
               "property lists keep dates to the second");
-  std::string again;
-  platform::appendPropertyListDate(again, *back);
-  requireThat(again == text, "a property list's date is written as it was read");
+  requireThat(platform::propertyListDate(*back) == text,
+              "a property list's date is written as it was read");
 }
 
 /// That feeds keep every date to the second that a feed can hold: with a year of our era that is

@@ -4,6 +4,7 @@
 
 #include "fuzz/FuzzTarget.h"
 #include "platform/net/GzipDecoder.h"
+#include "platform/text/ASCII.h"
 #include "platform/text/Base64.h"
 #include "platform/text/TextEncoding.h"
 
@@ -45,14 +46,13 @@ void decompress(std::string_view input) {
 }
 
 void requireBase64(std::string_view input) {
-  std::string text;
-  platform::appendBase64(text, input);
-  requireThat(platform::bytesFromBase64(text) == std::string(input), "base64 gives the bytes back");
-  if (const auto bytes = platform::bytesFromBase64(input)) {
-    std::string again;
-    platform::appendBase64(again, *bytes);
-    requireThat(platform::bytesFromBase64(again) == bytes, "base64 gives the bytes back");
-  }
+  const auto bytes = platform::bytesFromBase64(input);
+  if (!bytes) return;
+  const auto isDigit = [](char c) {
+    return c != '=' && platform::kWhitespace.find(c) == std::string_view::npos;
+  };
+  const auto digits = static_cast<std::size_t>(std::ranges::count_if(input, isDigit));
+  requireThat(bytes->size() == digits * 6 / 8, "each digit of base64 gives six bits");
 }
 
 /// The name of an encoding in the first line, a text in the rest.

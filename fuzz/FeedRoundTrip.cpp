@@ -118,7 +118,7 @@ class Item {
   void addDate() {
     const PropertyListValue* date = value("Date");
     if (date == nullptr) return;
-    result_.insert_or_assign(key("Date"), afterWriting({{"Date", *date}}).at("Date"));
+    result_.insert_or_assign(key("Date"), afterWriting({{"Date", *date}}).find("Date")->second);
   }
 
   void addOrder() {

@@ -11,11 +11,9 @@ void requireThat(bool holds, std::string_view invariant) {
   std::abort();
 }
 
-void requireTold(const platform::ErrorSlot& error) {
-  requireThat(error.has_value(), "a refusal tells its cause");
-  const std::string_view description = error->description;
-  requireThat(!error->domain.empty() && !description.empty(), "a cause has a domain and a text");
-  requireThat(!description.ends_with('.') && description.find('\n') == std::string_view::npos,
+void requireShowable(std::string_view description) {
+  requireThat(!description.empty() && !description.ends_with('.') &&
+                  description.find('\n') == std::string_view::npos,
               "a cause is one line without a full stop");
   requireThat(platform::isXMLText(description), "a cause can be shown");
 }

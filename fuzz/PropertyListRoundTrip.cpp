@@ -49,6 +49,17 @@ PointInTime wholeSecond(PointInTime date) {
   return isFirst ? PointInTime::min() : PointInTime(second);
 }
 
+/// Whether the value is of a kind that is written.
+bool isWritten(const PropertyListValue& value) {
+  return std::visit(
+      [](const auto& held) {
+        using Held = std::decay_t<decltype(held)>;
+        return !std::is_same_v<Held, double> && !std::is_same_v<Held, bool> &&
+               !std::is_same_v<Held, PropertyListValue::Data>;
+      },
+      value.storage());
+}
+
 PropertyListValue valueAfterWriting(const PropertyListValue& value) {
   if (const auto* text = std::get_if<Text>(&value.storage())) return {xmlText(*text)};
   if (const auto date = value.asDate()) return {wholeSecond(*date)};
@@ -56,7 +67,9 @@ PropertyListValue valueAfterWriting(const PropertyListValue& value) {
   const Array* array = value.asArray();
   if (array == nullptr) return value;
   Array result;
-  for (const PropertyListValue& element : *array) result.push_back(valueAfterWriting(element));
+  for (const PropertyListValue& element : *array) {
+    if (isWritten(element)) result.push_back(valueAfterWriting(element));
+  }
   return {std::move(result)};
 }
 
@@ -102,7 +115,7 @@ Dictionary afterWriting(const Dictionary& dictionary) {
   Dictionary result;
   for (const auto& [key, value] : dictionary) {
     // Keys can become the same; the last one then counts.
-    result.insert_or_assign(xmlText(key), valueAfterWriting(value));
+    if (isWritten(value)) result.insert_or_assign(xmlText(key), valueAfterWriting(value));
   }
   return result;
 }
@@ -119,8 +132,8 @@ std::string written(const Dictionary& dictionary) {
 
 Dictionary writtenAndReadBack(const Dictionary& dictionary) {
   const std::string bytes = written(dictionary);
-  platform::ErrorSlot error;
-  const auto value = platform::readPropertyList(bytes, error);
+  std::optional<platform::PropertyListFault> fault;
+  const auto value = platform::readPropertyList(bytes, fault);
   requireThat(value && value->asDictionary() != nullptr, "a written list is accepted");
   const Dictionary& result = *value->asDictionary();
   requireThat(areSame(result, afterWriting(dictionary)), "a written list reads back the same");

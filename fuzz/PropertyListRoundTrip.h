@@ -15,8 +15,8 @@ bool areSame(const platform::PropertyListValue& left, const platform::PropertyLi
 /// The text without what XML cannot hold.
 std::string xmlText(std::string_view text);
 
-/// What the dictionary is once it was written and read: texts and keys are without what XML cannot
-/// hold, dates without their fraction of a second; everything else is the same.
+/// What the dictionary is once it was written and read: without real numbers, booleans and data,
+/// the texts and keys without what XML cannot hold, the dates without their fraction of a second.
 platform::Dictionary afterWriting(const platform::Dictionary& dictionary);
 
 /// The dictionary written as a property list.

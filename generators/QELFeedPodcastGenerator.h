@@ -8,7 +8,7 @@
 #include "generators/QELPodcastGenerator.h"
 #include "model/QELEpisode.h"
 #include "platform/text/Text.h"
-#include "platform/xml/XMLDocument.h"
+#include "platform/xml/XMLWriter.h"
 
 /// Turns a source into a feed document: RSS 2.0 with Dublin Core, podcast-directory ("orvane") and
 /// the tool's own ("qel") elements; or, for "atom", a document without any element.

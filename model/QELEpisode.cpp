@@ -13,8 +13,8 @@ using platform::PropertyListValue;
 using platform::Text;
 using platform::operator""_text;  // NOLINT(misc-unused-using-decls): used in literals
 
-// What a field becomes by the value under its key, null where the key is missing. A value of an
-// unexpected kind counts as missing.
+/// What a field becomes by the value under its key, null where the key is missing. A value of an
+/// unexpected kind counts as missing.
 void read(const PropertyListValue* value, platform::AtomicValue<QELEpisode::OptionalText>& field) {
   field.store(value ? value->asText() : std::nullopt);
 }
@@ -28,7 +28,7 @@ void read(const PropertyListValue* value, std::atomic<std::uint64_t>& length) {
   length = (value ? value->asUnsignedInteger() : std::nullopt).value_or(0);
 }
 
-// What is written of a field; absent leaves its key out.
+/// What is written of a field; absent leaves its key out.
 template <typename Value>
 Value written(const platform::AtomicValue<Value>& field) {
   return field.load();

@@ -9,7 +9,7 @@
 /// A record that fetches what it refers to: it starts the download, receives its events and waits
 /// for its end.
 ///
-/// What counts as a failed transfer is decided by platform/net: see Download.h.
+/// When a transfer counts as failed is decided below, in platform/net/Download.h.
 class QELFetcher : protected platform::DownloadReceiver {
  public:
   QELFetcher(const QELFetcher&) = delete;

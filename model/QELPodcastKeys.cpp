@@ -39,8 +39,6 @@ std::span<const QELPodcastKey> QELPodcastDescriptiveKeys() {
 void QELAddPodcastKeys(std::span<const QELPodcastKey> keys, const QELPodcastSource& source,
                        platform::Dictionary& dictionary) {
   for (const QELPodcastKey& field : keys) {
-    if (const auto& value = (source.*field.value)()) {
-      dictionary.insert_or_assign(field.key, *value);
-    }
+    if (const auto& value = (source.*field.value)()) dictionary.insert_or_assign(field.key, *value);
   }
 }

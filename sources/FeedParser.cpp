@@ -1,6 +1,7 @@
 #include "sources/FeedParser.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 #include <utility>
 
@@ -17,20 +18,12 @@ using platform::Dictionary;
 using platform::Text;
 using platform::operator""_text;  // NOLINT(misc-unused-using-decls): used in literals
 
-/// The local names of the elements whose start empties the text buffer. Built once, at the first
-/// element of the first feed, and shared by all parsers.
-struct TextBearingElements {
-  std::vector<std::string_view> RSScdataElements{"title",     "pubDate",  "description", "author",
-                                                 "creator",   "link",     "url",         "uuid",
-                                                 "copyright", "keywords", "explicit"};
-  /// The place for Atom's, should Atom be read one day.
-  std::vector<std::string_view> AtomcdataElements;
-};
-
-const TextBearingElements& textBearingElements() {
-  static const TextBearingElements elements;
-  return elements;
-}
+/// The local names of the elements whose start empties the text buffer.
+constexpr std::array<std::string_view, 11> RSScdataElements = {
+    "title", "pubDate", "description", "author",   "creator", "link",
+    "url",   "uuid",    "copyright",   "keywords", "explicit"};
+/// The place for Atom's, should Atom be read one day.
+[[maybe_unused]] constexpr std::array<std::string_view, 0> AtomcdataElements{};
 
 /// Of the keys in the dictionary of an item, see the class.
 constexpr std::size_t kMostItemKeys = 14;
@@ -67,7 +60,11 @@ std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::st
 }
 
 bool FeedParser::parseWithError(platform::ErrorSlot& error) {
-  if (!feedParser_.parse(error)) return false;
+  std::optional<platform::XMLFault> fault;
+  if (!feedParser_.parse(fault)) {
+    error = fault->record();
+    return false;
+  }
   if (feedType_ == "rss" || feedType_ == "atom") return true;
   error = QELError(3, "The feed was neither RSS nor Atom");
   return false;
@@ -75,7 +72,6 @@ bool FeedParser::parseWithError(platform::ErrorSlot& error) {
 
 void FeedParser::didStartElement(const platform::XMLName& name,
                                  const platform::XMLAttributes& attributes) {
-  const std::vector<std::string_view>& textBearing = textBearingElements().RSScdataElements;
   if (name.local == "rss") {
     setFeedType("rss");
     return;
@@ -100,9 +96,8 @@ void FeedParser::didStartElement(const platform::XMLName& name,
     if (const auto text = attributes.value("text")) target().emplace("category"_text, Text(*text));
   }
 
-  if (std::find(textBearing.begin(), textBearing.end(), name.local) != textBearing.end()) {
-    emptyBuffer();
-  }
+  const auto* const end = RSScdataElements.end();
+  if (std::find(RSScdataElements.begin(), end, name.local) != end) emptyBuffer();
 }
 
 void FeedParser::didEndElement(const platform::XMLName& name) {
@@ -112,19 +107,19 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   if (local == "item") {
     endItem();
   } else if (local == "title") {
-    takeText(target(), "title"_text);
+    takeText("title"_text);
   } else if (local == "author" || local == "creator") {
-    takeText(target(), "author"_text);
+    takeText("author"_text);
   } else if (local == "description") {
-    takeText(target(), "description"_text);
+    takeText("description"_text);
   } else if (local == "copyright") {
-    takeText(target(), "copyright"_text);
+    takeText("copyright"_text);
   } else if (local == "keywords") {
-    takeText(target(), "keywords"_text);
+    takeText("keywords"_text);
   } else if (local == "explicit") {
-    readAdvisoryLabel(target());
+    readAdvisoryLabel();
   } else if (local == "pubDate") {
-    readDate(target());
+    readDate();
   } else if (local == "image") {
     parsingImage_ = false;
   } else if (local == "url") {
@@ -133,9 +128,9 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (local == "link") {
     readLink();
   } else if (name.qualified == "qel:uuid") {
-    takeText(target(), "QELUUID"_text);
+    takeText("QELUUID"_text);
   } else if (name.qualified == "qel:order") {
-    takeText(target(), "order"_text);
+    takeText("order"_text);
   }
 }
 
@@ -160,19 +155,19 @@ void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
   }
 }
 
-void FeedParser::readAdvisoryLabel(Dictionary& target) {
+void FeedParser::readAdvisoryLabel() {
   const std::string label = platform::lowercased(cdataBuffer_);
   if (label == "yes") {
-    target.insert_or_assign("advisoryLabel"_text, "Explicit"_text);
+    target().insert_or_assign("advisoryLabel"_text, "Explicit"_text);
   } else if (label == "clean") {
-    target.insert_or_assign("advisoryLabel"_text, "Clean"_text);
+    target().insert_or_assign("advisoryLabel"_text, "Clean"_text);
   }
   emptyBuffer();
 }
 
-void FeedParser::readDate(Dictionary& target) {
+void FeedParser::readDate() {
   if (const auto date = dateWithRFC822String(cdataBuffer_)) {
-    target.insert_or_assign("date"_text, *date);
+    target().insert_or_assign("date"_text, *date);
   }
   emptyBuffer();
 }
@@ -187,8 +182,8 @@ void FeedParser::readLink() {
   }
 }
 
-void FeedParser::takeText(Dictionary& target, const Text& key) {
-  target.insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
+void FeedParser::takeText(const Text& key) {
+  target().insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
   emptyBuffer();
 }
 

@@ -26,9 +26,16 @@
 /// Keys of both dictionaries, each absent when its element never came: "title", "author",
 /// "description", "copyright", "keywords", "category", "poster", "QELUUID" and "order" (texts),
 /// "advisoryLabel" ("Explicit" or "Clean"), "date" (a point in time); items also have "url",
-/// "contentType" (texts) and "contentLength" (an integer over 0).
+/// "contentType" (texts) and "contentLength" (an integer over 0). "order" is what "qel:order"
+/// holds: the number that becomes the episode's orvaneOrder. It never changes the order of the
+/// episodes.
 ///
-/// Made for one feed, parsed once, read and dropped.
+/// Made for one feed, parsed once, read and dropped:
+///
+///     const auto parser = FeedParser::parserWithFeedData(std::move(bytes));
+///     if (!parser->parseWithError(error)) return false;
+///     platform::textForKey(parser->feedAttributes(), "title");  // of the channel
+///     for (const platform::Dictionary& item : parser->episodes()) ...
 class FeedParser : private platform::XMLParserEvents {
  public:
   /// A parser of the bytes, which it gives up as it reads them; null for absent data.
@@ -77,14 +84,14 @@ class FeedParser : private platform::XMLParserEvents {
 
   void endItem();
   void readEnclosure(const platform::XMLAttributes& attributes);
-  void readAdvisoryLabel(platform::Dictionary& target);
-  void readDate(platform::Dictionary& target);
+  void readAdvisoryLabel();
+  void readDate();
   void readLink();
 
   bool readsRSS() const { return feedType_ == "rss"; }
   /// The open item, or the channel between items.
   platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
-  void takeText(platform::Dictionary& target, const platform::Text& key);
+  void takeText(const platform::Text& key);
   void emptyBuffer();
 
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items

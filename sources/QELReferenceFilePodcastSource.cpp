@@ -49,10 +49,12 @@ std::shared_ptr<const Dictionary> QELSharedDictionary(
 
 std::unique_ptr<QELReferenceFilePodcastSource> QELReferenceFilePodcastSource::initWithPath(
     const std::string& path) {
-  platform::ErrorSlot ignored;  // what is wrong with the file is not told apart here
-  std::optional<std::string> bytes = platform::readWholeFile(path, ignored);
+  // What is wrong with the file is not told apart here.
+  platform::ErrorSlot error;
+  std::optional<std::string> bytes = platform::readWholeFile(path, error);
   if (!bytes) return nullptr;
-  auto value = platform::readPropertyList(std::move(*bytes), ignored);
+  std::optional<platform::PropertyListFault> fault;
+  auto value = platform::readPropertyList(std::move(*bytes), fault);
   if (!value) return nullptr;
   return initWithDictionary(
       QELSharedDictionary(std::make_shared<const PropertyListValue>(std::move(*value))));

@@ -3,5 +3,5 @@
 #include <utility>
 
 platform::ErrorRecord QELError(std::int64_t code, std::string description) {
-  return {std::string(kQELErrorDomain), code, std::move(description)};
+  return {"QELDomain", code, std::move(description)};
 }

@@ -37,6 +37,7 @@ std::optional<RegularFile> RegularFile::open(const std::string& path, ErrorSlot&
     return std::nullopt;
   }
   if (!isRegular(status, error)) return std::nullopt;
+  static_assert(sizeof(status.st_size) == sizeof(std::uint64_t));
   return RegularFile(std::move(descriptor), static_cast<std::uint64_t>(status.st_size));
 }
 

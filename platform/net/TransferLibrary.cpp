@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <string>
+#include <string_view>
 #include <type_traits>
 #include <utility>
 
@@ -17,7 +18,14 @@ constexpr const char* kFile = "libcurl.so.4";
 
 ErrorRecord loadingError() {
   const char* const cause = dlerror();
-  return transferError(CURLE_FAILED_INIT, cause != nullptr ? cause : "libcurl cannot be loaded");
+  std::string description = cause != nullptr ? cause : "libcurl cannot be loaded";
+  // A file that was found is called by its whole path.
+  if (std::string_view(description).starts_with(kFile)) {
+    description +=
+        "; http and https need it: install the package libcurl4 (Debian, Ubuntu) or libcurl "
+        "(Fedora)";
+  }
+  return transferError(CURLE_FAILED_INIT, std::move(description));
 }
 
 }  // namespace

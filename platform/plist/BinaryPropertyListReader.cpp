@@ -1,41 +1,42 @@
 #include "platform/plist/BinaryPropertyListReader.h"
 
-#include <algorithm>
 #include <bit>
 #include <chrono>
 #include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <string>
 #include <utility>
+#include <vector>
 
-#include "platform/text/FormattedText.h"
+#include "platform/plist/PropertyListBuilder.h"
+#include "platform/text/ASCII.h"
 #include "platform/text/TextEncoding.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kHeader = "bplist00";
 constexpr std::size_t kTrailerSize = 32;
 constexpr std::size_t kWidestInteger = 8;
 
-// Containers that share their parts can make a list of any size out of a few bytes, and so can long
-// texts and data that stand in many places. A list may therefore take a fixed multiple of its bytes
-// in memory, which is several times of what one without shared containers takes. The allowance on
-// top is for lists that are small whatever they do.
-//
-// What is made of the list counts, too: an element may become a record of its own, and a text is
-// written wherever it stands, though it is held once.
+/// Containers that share their parts can make a list of any size out of a few bytes, and so can
+/// long texts and data that stand in many places. A list may therefore take a fixed multiple of its
+/// bytes in memory, which is several times of what one without shared containers takes. The
+/// allowance on top is for lists that are small whatever they do.
+///
+/// What is made of the list counts, too: an element may become a record of its own, and a text is
+/// written wherever it stands, though it is held once.
 constexpr std::uint64_t kMemoryAllowance = std::uint64_t{16} << 20;
 constexpr std::uint64_t kMemoryPerByte = 128;
 constexpr std::uint64_t kMemoryOfElement = 512;
 constexpr std::uint64_t kMemoryOfEntry = 128;
 
-// 2001-01-01 00:00:00 UTC, from where dates count, in seconds since 1970.
+/// 2001-01-01 00:00:00 UTC, from where dates count, in seconds since 1970.
 constexpr double kDateOrigin = 978307200.0;
 
-}  // namespace
-
 /// The high half of an object's marker.
-enum class BinaryPropertyListReader::Kind : unsigned {
+enum class Kind : unsigned {
   kSimple = 0x0,
   kInteger = 0x1,
   kReal = 0x2,
@@ -50,273 +51,301 @@ enum class BinaryPropertyListReader::Kind : unsigned {
   kDictionary = 0xD,
 };
 
-BinaryPropertyListReader::BinaryPropertyListReader(std::string_view bytes)
-    : bytes_(bytes), memoryLeft_(kMemoryAllowance + kMemoryPerByte * bytes.size()) {}
+struct Object {
+  Kind kind;
+  std::uint64_t size;   // the low half of the marker, or the count that stands behind it
+  std::size_t content;  // the offset of the first byte behind marker and count
+};
 
-std::optional<PropertyListValue> BinaryPropertyListReader::read(ErrorSlot& error) {
-  bool succeeded = readTrailer();
-  while (succeeded && !levels_.empty()) succeeded = readNextPart();
-  if (!succeeded) {
-    error = std::move(error_);
+/// An array or dictionary whose parts are being read.
+struct Level {
+  std::uint64_t number;
+  bool isDictionary;
+  std::size_t references;  // the offset of the first reference
+  std::size_t count;       // of elements or entries
+  std::size_t next = 0;
+};
+
+/// Reads one list, whose bytes outlive it.
+class Reader {
+ public:
+  explicit Reader(std::string_view bytes)
+      : bytes_(bytes), memoryLeft_(kMemoryAllowance + kMemoryPerByte * bytes.size()) {}
+
+  std::optional<PropertyListValue> read(std::optional<PropertyListFault>& fault) {
+    bool succeeded = readTrailer();
+    while (succeeded && !levels_.empty()) succeeded = readNextPart();
+    if (succeeded) return builder_.takeRoot();
+    fault = std::move(fault_);
     return std::nullopt;
   }
-  return builder_.takeRoot();
-}
 
-bool BinaryPropertyListReader::readTrailer() {
-  const auto malformed = [this](std::string description) {
-    return fail(PropertyListFault::kMalformed, std::move(description));
-  };
-  if (!bytes_.starts_with(kHeader))
-    return malformed("a binary property list of an unknown version");
-  if (bytes_.size() < kHeader.size() + kTrailerSize) return malformed("a cut binary property list");
+ private:
+  bool readTrailer() {
+    if (!bytes_.starts_with(kHeader)) return fail("a binary property list of an unknown version");
+    if (bytes_.size() < kHeader.size() + kTrailerSize) return fail("a cut binary property list");
 
-  const std::size_t tableEnd = bytes_.size() - kTrailerSize;
-  offsetWidth_ = unsignedAt(tableEnd + 6, 1);
-  referenceWidth_ = unsignedAt(tableEnd + 7, 1);
-  objectCount_ = unsignedAt(tableEnd + 8, 8);
-  const std::uint64_t root = unsignedAt(tableEnd + 16, 8);
-  const std::uint64_t tableOffset = unsignedAt(tableEnd + 24, 8);
+    const std::size_t tableEnd = bytes_.size() - kTrailerSize;
+    offsetWidth_ = unsignedAt(tableEnd + 6, 1);
+    referenceWidth_ = unsignedAt(tableEnd + 7, 1);
+    objectCount_ = unsignedAt(tableEnd + 8, 8);
+    const std::uint64_t root = unsignedAt(tableEnd + 16, 8);
+    const std::uint64_t tableOffset = unsignedAt(tableEnd + 24, 8);
 
-  const auto isWidth = [](std::size_t width) { return width >= 1 && width <= kWidestInteger; };
-  if (!isWidth(offsetWidth_) || !isWidth(referenceWidth_) || tableOffset < kHeader.size() ||
-      tableOffset > tableEnd || objectCount_ > (tableEnd - tableOffset) / offsetWidth_)
-    return malformed("a binary property list with a malformed trailer");
-  tableOffset_ = tableOffset;
+    const auto isWidth = [](std::size_t width) { return width >= 1 && width <= kWidestInteger; };
+    if (!isWidth(offsetWidth_) || !isWidth(referenceWidth_) || tableOffset < kHeader.size() ||
+        tableOffset > tableEnd || objectCount_ > (tableEnd - tableOffset) / offsetWidth_) {
+      return fail("a binary property list with a malformed trailer");
+    }
+    tableOffset_ = tableOffset;
 
-  // There are no more objects than bytes, so this is always there.
-  static_assert(sizeof(Text) <= kMemoryPerByte);
-  memoryLeft_ -= objectCount_ * sizeof(Text);
-  texts_.resize(objectCount_);
-  isOpen_.resize(objectCount_);
-  return readObject(root);
-}
+    // There are no more objects than bytes, so this is always there.
+    static_assert(sizeof(Text) <= kMemoryPerByte);
+    memoryLeft_ -= objectCount_ * sizeof(Text);
+    texts_.resize(objectCount_);
+    isOpen_.resize(objectCount_);
+    return readObject(root);
+  }
 
-bool BinaryPropertyListReader::readNextPart() {
-  Level& level = levels_.back();
-  if (level.next == level.count) {
-    isOpen_[level.number] = false;
-    levels_.pop_back();
-    builder_.end();
+  bool readNextPart() {
+    Level& level = levels_.back();
+    if (level.next == level.count) {
+      isOpen_[level.number] = false;
+      levels_.pop_back();
+      builder_.end();
+      return true;
+    }
+    std::size_t reference = level.references + level.next * referenceWidth_;
+    if (level.isDictionary) {
+      if (!readKey(unsignedAt(reference, referenceWidth_))) return false;
+      reference += level.count * referenceWidth_;  // the values stand behind all the keys
+    }
+    ++level.next;
+    return readObject(unsignedAt(reference, referenceWidth_));
+  }
+
+  bool readKey(std::uint64_t number) {
+    const auto object = objectAt(number);
+    if (!object) return false;
+    const auto key = text(number, *object);
+    if (!key) return fail("a key that is no text", number);
+    builder_.setKey(*key);
     return true;
   }
-  std::size_t reference = level.references + level.next * referenceWidth_;
-  if (level.isDictionary) {
-    if (!readKey(unsignedAt(reference, referenceWidth_))) return false;
-    reference += level.count * referenceWidth_;  // the values stand behind all the keys
+
+  bool readObject(std::uint64_t number) {
+    const auto object = objectAt(number);
+    if (!object) return false;
+    switch (object->kind) {
+      case Kind::kArray:
+      case Kind::kOrderedSet:
+      case Kind::kSet:
+      case Kind::kDictionary:
+        return openContainer(number, *object);
+      default:
+        break;
+    }
+    auto value = scalar(number, *object);
+    if (!value) return fail("an object that is cut or of an unknown kind", number);
+    builder_.add(std::move(*value));
+    return true;
   }
-  ++level.next;
-  return readObject(unsignedAt(reference, referenceWidth_));
-}
 
-bool BinaryPropertyListReader::readKey(std::uint64_t number) {
-  const auto object = objectAt(number);
-  if (!object) return false;
-  const auto key = text(number, *object);
-  if (!key) return failAtObject(number, "is a key but no text");
-  builder_.setKey(*key);
-  return true;
-}
+  bool openContainer(std::uint64_t number, const Object& object) {
+    const bool isDictionary = object.kind == Kind::kDictionary;
+    if (isOpen_[number]) return fail("an array or dictionary that contains itself", number);
+    if (levels_.size() >= kPropertyListDepthLimit) return fail(kPropertyListTooDeep, number);
+    if (!holds(object, object.size, isDictionary ? 2 * referenceWidth_ : referenceWidth_)) {
+      return fail("an array or dictionary that is cut", number);
+    }
+    if (!spend(object.size * (isDictionary ? kMemoryOfEntry : kMemoryOfElement))) return false;
 
-bool BinaryPropertyListReader::readObject(std::uint64_t number) {
-  const auto object = objectAt(number);
-  if (!object) return false;
-  switch (object->kind) {
-    case Kind::kArray:
-    case Kind::kOrderedSet:
-    case Kind::kSet:
-    case Kind::kDictionary:
-      return openContainer(number, *object);
-    default:
-      break;
+    if (isDictionary) {
+      builder_.beginDictionary();
+    } else {
+      builder_.beginArray(object.size);
+    }
+    isOpen_[number] = true;
+    levels_.push_back({.number = number,
+                       .isDictionary = isDictionary,
+                       .references = object.content,
+                       .count = object.size});
+    return true;
   }
-  auto value = scalar(number, *object);
-  if (!value) return failAtObject(number, "is cut or of an unknown kind");
-  builder_.add(std::move(*value));
-  return true;
-}
 
-bool BinaryPropertyListReader::openContainer(std::uint64_t number, const Object& object) {
-  const bool isDictionary = object.kind == Kind::kDictionary;
-  if (isOpen_[number]) return failAtObject(number, "contains itself");
-  if (levels_.size() >= kPropertyListDepthLimit)
-    return fail(PropertyListFault::kTooLarge,
-                formattedText("arrays and dictionaries nested deeper than %ld levels",
-                              {kPropertyListDepthLimit}));
-  if (!holds(object, object.size, isDictionary ? 2 * referenceWidth_ : referenceWidth_))
-    return failAtObject(number, "is cut");
-  if (!spend(object.size * (isDictionary ? kMemoryOfEntry : kMemoryOfElement))) return false;
-
-  if (isDictionary) {
-    builder_.beginDictionary();
-  } else {
-    builder_.beginArray(object.size);
-  }
-  isOpen_[number] = true;
-  levels_.push_back({.number = number,
-                     .isDictionary = isDictionary,
-                     .references = object.content,
-                     .count = object.size});
-  return true;
-}
-
-std::optional<BinaryPropertyListReader::Object> BinaryPropertyListReader::objectAt(
-    std::uint64_t number) {
-  if (number >= objectCount_) {
-    failAtObject(number, "does not exist");
-    return std::nullopt;
-  }
-  const std::uint64_t offset = unsignedAt(tableOffset_ + number * offsetWidth_, offsetWidth_);
-  if (offset < kHeader.size() || offset >= tableOffset_) {
-    failAtObject(number, "lies outside the objects");
-    return std::nullopt;
-  }
-  const std::uint64_t marker = unsignedAt(offset, 1);
-  Object object{
-      .kind = static_cast<Kind>(marker >> 4), .size = marker & 0xF, .content = offset + 1};
-
-  const bool isCounted = object.kind >= Kind::kData;
-  if (isCounted && object.size == 0xF) {
-    const Object count{.kind = Kind::kInteger, .size = 0, .content = object.content + 1};
-    const std::uint64_t countMarker = holds(object, 1, 1) ? unsignedAt(object.content, 1) : 0;
-    const std::size_t width = std::size_t{1} << (countMarker & 0x3);
-    // Counts of 1, 2, 4 and 8 bytes: markers 0x10 to 0x13.
-    if (countMarker >> 2 != 0x10 >> 2 || !holds(count, 1, width)) {
-      failAtObject(number, "has a malformed count");
+  std::optional<Object> objectAt(std::uint64_t number) {
+    if (number >= objectCount_) {
+      fail("an object that does not exist", number);
       return std::nullopt;
     }
-    object.size = unsignedAt(count.content, width);
-    object.content = count.content + width;
-  }
-  return object;
-}
-
-std::optional<PropertyListValue> BinaryPropertyListReader::scalar(std::uint64_t number,
-                                                                  const Object& object) {
-  switch (object.kind) {
-    case Kind::kSimple:
-      if (object.size == 0x8) return PropertyListValue(false);
-      if (object.size == 0x9) return PropertyListValue(true);
+    const std::uint64_t offset = unsignedAt(tableOffset_ + number * offsetWidth_, offsetWidth_);
+    if (offset < kHeader.size() || offset >= tableOffset_) {
+      fail("an object that lies outside of the objects", number);
       return std::nullopt;
-    case Kind::kInteger:
-      return integer(object);
-    case Kind::kReal:
-      return real(object);
-    case Kind::kDate:
-      return date(object);
-    case Kind::kData:
-      return data(object);
-    default:
-      return text(number, object);
+    }
+    const std::uint64_t marker = unsignedAt(offset, 1);
+    Object object{
+        .kind = static_cast<Kind>(marker >> 4), .size = marker & 0xF, .content = offset + 1};
+
+    const bool isCounted = object.kind >= Kind::kData;
+    if (isCounted && object.size == 0xF) {
+      const Object count{.kind = Kind::kInteger, .size = 0, .content = object.content + 1};
+      const std::uint64_t countMarker = holds(object, 1, 1) ? unsignedAt(object.content, 1) : 0;
+      const std::size_t width = std::size_t{1} << (countMarker & 0x3);
+      // Counts of 1, 2, 4 and 8 bytes: markers 0x10 to 0x13.
+      if (countMarker >> 2 != 0x10 >> 2 || !holds(count, 1, width)) {
+        fail("an object with a malformed count", number);
+        return std::nullopt;
+      }
+      object.size = unsignedAt(count.content, width);
+      object.content = count.content + width;
+    }
+    return object;
   }
-}
 
-std::optional<PropertyListValue> BinaryPropertyListReader::integer(const Object& object) const {
-  if (object.size > 4 || !holds(object, 1, std::size_t{1} << object.size)) return std::nullopt;
-  if (object.size < 3)
-    return PropertyListValue(unsignedAt(object.content, std::size_t{1} << object.size));
-  // Shorter integers have no sign; those of 8 bytes have one, and those of 16 bytes hold both what
-  // is negative and what exceeds the 8.
-  const std::uint64_t first = unsignedAt(object.content, 8);
-  if (object.size == 3) return PropertyListValue(static_cast<std::int64_t>(first));
-  const std::uint64_t second = unsignedAt(object.content + 8, 8);
-  if (first == 0) return PropertyListValue(second);
-  const auto negative = static_cast<std::int64_t>(second);
-  if (first == ~std::uint64_t{0} && negative < 0) return PropertyListValue(negative);
-  return std::nullopt;
-}
-
-std::optional<PropertyListValue> BinaryPropertyListReader::real(const Object& object) const {
-  if (object.size == 2 && holds(object, 1, 4)) {
-    const auto bits = static_cast<std::uint32_t>(unsignedAt(object.content, 4));
-    return PropertyListValue(static_cast<double>(std::bit_cast<float>(bits)));
+  /// Absent for an object that is cut or not of a kind that a property list has.
+  std::optional<PropertyListValue> scalar(std::uint64_t number, const Object& object) {
+    switch (object.kind) {
+      case Kind::kSimple:
+        if (object.size == 0x8) return PropertyListValue(false);
+        if (object.size == 0x9) return PropertyListValue(true);
+        return std::nullopt;
+      case Kind::kInteger:
+        return integer(object);
+      case Kind::kReal:
+        return real(object);
+      case Kind::kDate:
+        return date(object);
+      case Kind::kData:
+        return data(object);
+      default:
+        return text(number, object);
+    }
   }
-  if (object.size == 3 && holds(object, 1, 8))
-    return PropertyListValue(std::bit_cast<double>(unsignedAt(object.content, 8)));
-  return std::nullopt;
-}
 
-std::optional<PropertyListValue> BinaryPropertyListReader::date(const Object& object) const {
-  if (object.size != 3 || !holds(object, 1, 8)) return std::nullopt;
-  const auto seconds = std::bit_cast<double>(unsignedAt(object.content, 8));
-  const double milliseconds = std::round((seconds + kDateOrigin) * 1000.0);
-  // Written so that what is no number is refused too.
-  if (!(milliseconds >= -0x1p63 && milliseconds < 0x1p63)) return std::nullopt;
-  return PropertyListValue(
-      PointInTime(std::chrono::milliseconds(static_cast<std::int64_t>(milliseconds))));
-}
-
-std::optional<PropertyListValue> BinaryPropertyListReader::data(const Object& object) {
-  if (!holds(object, object.size, 1) || !spend(object.size)) return std::nullopt;
-  return PropertyListValue(
-      PropertyListValue::Data{std::string(bytes_.substr(object.content, object.size))});
-}
-
-std::optional<Text> BinaryPropertyListReader::text(std::uint64_t number, const Object& object) {
-  const bool isUTF16 = object.kind == Kind::kTextUTF16;
-  if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8)
+  std::optional<PropertyListValue> integer(const Object& object) const {
+    if (object.size > 4 || !holds(object, 1, std::size_t{1} << object.size)) return std::nullopt;
+    if (object.size < 3) {
+      return PropertyListValue(unsignedAt(object.content, std::size_t{1} << object.size));
+    }
+    // Shorter integers have no sign; those of 8 bytes have one, and those of 16 bytes hold both
+    // what is negative and what exceeds the 8.
+    const std::uint64_t first = unsignedAt(object.content, 8);
+    if (object.size == 3) return PropertyListValue(static_cast<std::int64_t>(first));
+    const std::uint64_t second = unsignedAt(object.content + 8, 8);
+    if (first == 0) return PropertyListValue(second);
+    const auto negative = static_cast<std::int64_t>(second);
+    if (first == ~std::uint64_t{0} && negative < 0) return PropertyListValue(negative);
     return std::nullopt;
-  Text& text = texts_[number];
-  if (!text.empty()) {
-    if (!spend(text.size())) return std::nullopt;
+  }
+
+  std::optional<PropertyListValue> real(const Object& object) const {
+    if (object.size == 2 && holds(object, 1, 4)) {
+      const auto bits = static_cast<std::uint32_t>(unsignedAt(object.content, 4));
+      return PropertyListValue(static_cast<double>(std::bit_cast<float>(bits)));
+    }
+    if (object.size == 3 && holds(object, 1, 8)) {
+      return PropertyListValue(std::bit_cast<double>(unsignedAt(object.content, 8)));
+    }
+    return std::nullopt;
+  }
+
+  std::optional<PropertyListValue> date(const Object& object) const {
+    if (object.size != 3 || !holds(object, 1, 8)) return std::nullopt;
+    const auto seconds = std::bit_cast<double>(unsignedAt(object.content, 8));
+    const double milliseconds = std::round((seconds + kDateOrigin) * 1000.0);
+    // Written so that what is no number is refused too.
+    if (!(milliseconds >= -0x1p63 && milliseconds < 0x1p63)) return std::nullopt;
+    return PropertyListValue(
+        PointInTime(std::chrono::milliseconds(static_cast<std::int64_t>(milliseconds))));
+  }
+
+  std::optional<PropertyListValue> data(const Object& object) {
+    if (!holds(object, object.size, 1) || !spend(object.size)) return std::nullopt;
+    return PropertyListValue(
+        PropertyListValue::Data{std::string(bytes_.substr(object.content, object.size))});
+  }
+
+  std::optional<Text> text(std::uint64_t number, const Object& object) {
+    const bool isUTF16 = object.kind == Kind::kTextUTF16;
+    if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8) {
+      return std::nullopt;
+    }
+    Text& text = texts_[number];
+    if (!text.empty()) {
+      if (!spend(text.size())) return std::nullopt;
+      return text;
+    }
+
+    if (!holds(object, object.size, isUTF16 ? 2 : 1)) return std::nullopt;
+    const std::string_view encoded =
+        bytes_.substr(object.content, isUTF16 ? 2 * object.size : object.size);
+    // Objects may overlap, so that even unshared texts can exceed the bytes by any factor.
+    if (!spend(encoded.size())) return std::nullopt;
+    if (!isUTF16 && isASCII(encoded)) {
+      text = Text(encoded);
+    } else {
+      const std::string_view encoding = isUTF16                           ? "UTF-16BE"
+                                        : object.kind == Kind::kTextASCII ? "US-ASCII"
+                                                                          : "UTF-8";
+      auto converted = convertedToUTF8(encoded, encoding);
+      if (!converted) return std::nullopt;
+      if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size())) {
+        return std::nullopt;
+      }
+      text = Text(*converted);
+    }
     return text;
   }
 
-  if (!holds(object, object.size, isUTF16 ? 2 : 1)) return std::nullopt;
-  const std::string_view encoded =
-      bytes_.substr(object.content, isUTF16 ? 2 * object.size : object.size);
-  // Objects may overlap, so that even unshared texts can exceed the bytes by any factor.
-  if (!spend(encoded.size())) return std::nullopt;
-  const bool isPlain = !isUTF16 && std::ranges::all_of(encoded, [](char c) {
-    return static_cast<unsigned char>(c) < 0x80;
-  });
-  if (isPlain) {
-    text = Text(encoded);
-  } else {
-    const std::string_view encoding = isUTF16                           ? "UTF-16BE"
-                                      : object.kind == Kind::kTextASCII ? "US-ASCII"
-                                                                        : "UTF-8";
-    auto converted = convertedToUTF8(encoded, encoding);
-    if (!converted) return std::nullopt;
-    if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size()))
-      return std::nullopt;
-    text = Text(*converted);
+  /// Whether that many items of that width lie between the object's content and the objects' end.
+  bool holds(const Object& object, std::uint64_t count, std::size_t width) const {
+    // The content of an object begins at the end of the objects at most.
+    return count <= (tableOffset_ - object.content) / width;
   }
-  return text;
-}
 
-bool BinaryPropertyListReader::holds(const Object& object, std::uint64_t count,
-                                     std::size_t width) const {
-  // The content of an object begins at the end of the objects at most.
-  return count <= (tableOffset_ - object.content) / width;
-}
+  std::uint64_t unsignedAt(std::size_t offset, std::size_t width) const {
+    std::uint64_t number = 0;
+    for (const char byte : bytes_.substr(offset, width)) {
+      number = number << 8 | static_cast<unsigned char>(byte);
+    }
+    return number;
+  }
 
-std::uint64_t BinaryPropertyListReader::unsignedAt(std::size_t offset, std::size_t width) const {
-  std::uint64_t number = 0;
-  for (const char byte : bytes_.substr(offset, width))
-    number = number << 8 | static_cast<unsigned char>(byte);
-  return number;
-}
+  bool spend(std::uint64_t memory) {
+    if (memory > memoryLeft_) {
+      return fail("a binary property list whose shared objects make it too large");
+    }
+    memoryLeft_ -= memory;
+    return true;
+  }
 
-bool BinaryPropertyListReader::spend(std::uint64_t memory) {
-  if (memory > memoryLeft_)
-    return fail(PropertyListFault::kTooLarge,
-                "a binary property list whose shared objects make it too large");
-  memoryLeft_ -= memory;
-  return true;
-}
+  /// Keeps the first fault that is told, of the object if one is named; returns false.
+  bool fail(std::string description, std::optional<std::uint64_t> object = std::nullopt) {
+    if (!fault_)
+      fault_ = PropertyListFault{.description = std::move(description), .object = object};
+    return false;
+  }
 
-bool BinaryPropertyListReader::fail(PropertyListFault fault, std::string description) {
-  if (!error_)
-    error_ = ErrorRecord{.domain = std::string(kPropertyListErrorDomain),
-                         .code = static_cast<std::int64_t>(fault),
-                         .description = std::move(description)};
-  return false;
-}
+  std::string_view bytes_;
+  std::size_t tableOffset_ = 0;  // where the objects end
+  std::size_t offsetWidth_ = 0;
+  std::size_t referenceWidth_ = 0;
+  std::uint64_t objectCount_ = 0;
 
-bool BinaryPropertyListReader::failAtObject(std::uint64_t number, std::string_view fault) {
-  return fail(PropertyListFault::kMalformed,
-              formattedText("object %lu of a binary property list %@", {number, fault}));
+  PropertyListBuilder builder_;
+  std::vector<Level> levels_;
+  std::vector<bool> isOpen_;  // by object number: whether it is one of the levels
+  std::vector<Text> texts_;   // by object number: read once, then shared
+  std::uint64_t memoryLeft_;
+  std::optional<PropertyListFault> fault_;
+};
+
+}  // namespace
+
+std::optional<PropertyListValue> readBinaryPropertyList(std::string_view bytes,
+                                                        std::optional<PropertyListFault>& fault) {
+  return Reader(bytes).read(fault);
 }
 
 }  // namespace platform

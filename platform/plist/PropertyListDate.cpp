@@ -10,7 +10,6 @@
 #include "platform/time/CivilDay.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::int64_t kSecondsOfDay = 86400;
@@ -45,13 +44,14 @@ bool takeCharacter(std::string_view& text, char character) {
 
 }  // namespace
 
-void appendPropertyListDate(std::string& output, PointInTime date) {
+std::string propertyListDate(PointInTime date) {
   const std::int64_t seconds =
       std::chrono::floor<std::chrono::seconds>(date).time_since_epoch().count();
   const std::int64_t days = floorQuotient(seconds, kSecondsOfDay);
   const std::int64_t secondOfDay = seconds - days * kSecondsOfDay;
   const CivilDay civil = civilFromDays(days);
 
+  std::string output;
   if (civil.year < 0) output += '-';
   appendPadded(output, civil.year < 0 ? -civil.year : civil.year, 4);
   output += '-';
@@ -65,6 +65,7 @@ void appendPropertyListDate(std::string& output, PointInTime date) {
   output += ':';
   appendPadded(output, secondOfDay % 60, 2);
   output += 'Z';
+  return output;
 }
 
 std::optional<PointInTime> dateFromPropertyListText(std::string_view text) {

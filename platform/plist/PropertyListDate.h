@@ -8,10 +8,10 @@
 
 namespace platform {
 
-/// Appends the date as XML property lists write it: ISO 8601 in UTC, "2005-05-16T12:30:00Z", by the
+/// The date as XML property lists write it: ISO 8601 in UTC, "2005-05-16T12:30:00Z", by the
 /// Gregorian calendar for all times. A fraction of a second is dropped towards the past. The year
 /// has four digits at least, more after 9999, and a leading minus before the year 0.
-void appendPropertyListDate(std::string& output, PointInTime date);
+std::string propertyListDate(PointInTime date);
 
 /// The date that such a text names. As the format allows, smaller units may be missing from the
 /// right ("2005-05Z"). Absent for any other text, for a date that no calendar has, and for one that

@@ -2,13 +2,11 @@
 
 #include <algorithm>
 #include <iterator>
-#include <stdexcept>
 #include <utility>
 
 #include "platform/plist/PropertyListValue.h"
 
 namespace platform {
-
 namespace {
 
 using Entry = PropertyListDictionary::Entry;
@@ -90,12 +88,6 @@ PropertyListDictionary::const_iterator PropertyListDictionary::find(std::string_
   const auto found = place(entries_, key);
   const bool isThere = found != entries_.end() && found->first == key;
   return isThere ? begin() + (found - entries_.begin()) : end();
-}
-
-const PropertyListValue& PropertyListDictionary::at(std::string_view key) const {
-  const const_iterator found = find(key);
-  if (found == end()) throw std::out_of_range("a key that the dictionary has not");
-  return found->second;
 }
 
 void PropertyListDictionary::emplace(Text key, PropertyListValue value) {

@@ -46,9 +46,6 @@ class PropertyListDictionary {
 
   /// The entry of the key, or end().
   const_iterator find(std::string_view key) const;
-  bool contains(std::string_view key) const { return find(key) != end(); }
-  /// The value of a key that is there.
-  const PropertyListValue& at(std::string_view key) const;
 
   /// Adds the entry unless the key is there already.
   void emplace(Text key, PropertyListValue value);

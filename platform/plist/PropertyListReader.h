@@ -1,36 +1,41 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
-#include <string_view>
 
 #include "platform/plist/PropertyListValue.h"
-#include "platform/text/ErrorRecord.h"
+#include "platform/xml/TextPosition.h"
 
 namespace platform {
 
 /// The deepest nesting of arrays and dictionaries that is read.
-inline constexpr int kPropertyListDepthLimit = 512;
+inline constexpr std::size_t kPropertyListDepthLimit = 512;
+inline constexpr const char* kPropertyListTooDeep =
+    "arrays and dictionaries nested deeper than 512 levels";
 
-/// The domain of the reader's error records; their codes are those of PropertyListFault.
-inline constexpr std::string_view kPropertyListErrorDomain = "PropertyList";
-
-enum class PropertyListFault : std::int64_t {
-  kMalformed = 1,    // no property list, a cut one, or one that breaks the rules of its form
-  kTooLarge = 2,     // nested too deeply, or grown too large by objects that are shared
-  kOutOfMemory = 3,  // there is not enough memory for the values
+/// What is wrong with a property list, and where; without a place it is the list as a whole.
+struct PropertyListFault {
+  std::string description;                              // "a key without a value in a dictionary"
+  std::optional<TextPosition> position = std::nullopt;  // in the XML form
+  std::optional<std::uint64_t> object =
+      std::nullopt;  // in the binary form: the number of the object
 };
 
 /// Reads a property list in its XML form (the DTD "PropertyList 1.0", any encoding) or its binary
-/// form ("bplist00").
+/// form ("bplist00"):
 ///
-/// A list that is cut, malformed, cyclic or nested deeper than the limit gives no value and fills
-/// the slot; for the XML form the description names the line and the column, and a document that is
-/// no XML at all gives the record of the XML parser. Characters of a binary text that are no
-/// Unicode (lone surrogates, bytes over 127 in ASCII) become U+FFFD. Where a dictionary has a key
-/// twice, the last one counts. The binary form's null, fill and UID objects have no place in a
-/// property list and are refused; a set is read as an array.
-std::optional<PropertyListValue> readPropertyList(std::string bytes, ErrorSlot& error);
+///   std::optional<PropertyListFault> fault;
+///   const std::optional<PropertyListValue> list = readPropertyList(std::move(bytes), fault);
+///   if (!list) show(fault->description);
+///
+/// A list that is cut, malformed, cyclic, nested deeper than the limit, or grown too large by
+/// objects that are shared, gives no value and its first fault. Characters of a binary text that
+/// are no Unicode (lone surrogates, bytes over 127 in ASCII) become U+FFFD. Where a dictionary has
+/// a key twice, the last one counts. The binary form's null, fill and UID objects have no place in
+/// a property list and are refused; a set is read as an array.
+std::optional<PropertyListValue> readPropertyList(std::string bytes,
+                                                  std::optional<PropertyListFault>& fault);
 
 }  // namespace platform

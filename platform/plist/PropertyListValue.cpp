@@ -9,7 +9,6 @@
 #include "platform/text/LeadingInteger.h"
 
 namespace platform {
-
 namespace {
 
 constexpr auto kSignedMaximum = std::numeric_limits<std::int64_t>::max();
@@ -48,8 +47,9 @@ std::optional<std::uint64_t> leadingUnsignedInteger(std::string_view text) {
 }  // namespace
 
 PropertyListValue::PropertyListValue(std::uint64_t number) : value_(number) {
-  if (number <= static_cast<std::uint64_t>(kSignedMaximum))
+  if (number <= static_cast<std::uint64_t>(kSignedMaximum)) {
     value_ = static_cast<std::int64_t>(number);
+  }
 }
 
 std::optional<Text> PropertyListValue::asText() const {
@@ -71,8 +71,9 @@ std::optional<std::int64_t> PropertyListValue::asSignedInteger() const {
   if (const auto* number = std::get_if<std::int64_t>(&value_)) return *number;
   // A number is held as an unsigned one only where a signed one cannot hold it.
   if (std::holds_alternative<std::uint64_t>(value_)) return kSignedMaximum;
-  if (const auto* number = std::get_if<double>(&value_))
+  if (const auto* number = std::get_if<double>(&value_)) {
     return nearestInteger<std::int64_t>(*number);
+  }
   if (const auto* text = std::get_if<Text>(&value_)) return leadingInteger(*text);
   return std::nullopt;
 }

@@ -1,8 +1,5 @@
 #include "platform/plist/PropertyListWriter.h"
 
-#include <array>
-#include <charconv>
-#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <string>
@@ -11,37 +8,43 @@
 #include <vector>
 
 #include "platform/plist/PropertyListDate.h"
-#include "platform/text/Base64.h"
-#include "platform/xml/XMLEscaping.h"
+#include "platform/xml/XMLWriter.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::size_t kBufferSize = std::size_t{1} << 20;
 
-constexpr std::string_view kProlog =
-    "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
+constexpr std::string_view kHead =
     "<!DOCTYPE plist PUBLIC \"-//Apple//DTD PLIST 1.0//EN\" "
     "\"http://www.apple.com/DTDs/PropertyList-1.0.dtd\">\n"
     "<plist version=\"1.0\">\n";
-constexpr std::string_view kEpilog = "</plist>\n";
+constexpr std::string_view kTail = "</plist>\n";
 
-/// Writes one document. The open containers stand on a stack of its own, so that no nesting can
-/// exhaust the stack of the thread.
+/// Whether a podcast has values of this kind.
+bool isWritten(const PropertyListValue& value) {
+  const PropertyListValue::Storage& held = value.storage();
+  return !std::holds_alternative<double>(held) && !std::holds_alternative<bool>(held) &&
+         !std::holds_alternative<PropertyListValue::Data>(held);
+}
+
+/// Writes one list. The open containers stand on a stack of its own, so that no nesting can exhaust
+/// the stack of the thread.
 class Writer {
  public:
   explicit Writer(const ByteSink& sink) : sink_(sink) {}
 
   bool write(const Dictionary& root) {
-    output_ += kProlog;
-    writeValue(root);
+    // It is not indented inside of "plist", so it is what the XML writer takes for the root.
+    output_ += kHead;
+    open(xml_.appendRoot("dict"), root);
     bool accepted = true;
     while (accepted && !levels_.empty()) {
       std::visit([this](auto& level) { writeNext(level); }, levels_.back());
       if (output_.size() >= kBufferSize) accepted = flush();
     }
-    output_ += kEpilog;
+    xml_.finish();
+    output_ += kTail;
     return accepted && flush();
   }
 
@@ -49,6 +52,7 @@ class Writer {
   /// A container whose parts are being written.
   template <typename Container>
   struct Level {
+    XMLElement element;
     typename Container::const_iterator next;
     typename Container::const_iterator end;
   };
@@ -59,119 +63,49 @@ class Writer {
 
   void writeNext(ArrayLevel& level) {
     if (level.next == level.end) {
-      closeContainer("array");
+      levels_.pop_back();
     } else {
-      writeVariant(*level.next++);
+      writeVariant(level.element, *level.next++);
     }
   }
 
   void writeNext(DictionaryLevel& level) {
     if (level.next == level.end) {
-      closeContainer("dict");
+      levels_.pop_back();
       return;
     }
     const auto& [key, value] = *level.next++;
-    indent();
-    output_ += "<key>";
-    appendEscapedText(output_, key);
-    output_ += "</key>\n";
-    writeVariant(value);
+    if (!isWritten(value)) return;
+    level.element.appendChild("key", key);
+    writeVariant(level.element, value);
   }
 
-  void writeVariant(const PropertyListValue& value) {
-    std::visit([this](const auto& held) { writeValue(held); }, value.storage());
+  void writeVariant(XMLElement parent, const PropertyListValue& value) {
+    std::visit([this, parent](const auto& held) { write(parent, held); }, value.storage());
   }
 
-  void writeValue(const Text& text) {
-    startTag("string");
-    appendEscapedText(output_, text);
-    endTag("string");
+  void write(XMLElement parent, const Text& text) { parent.appendChild("string", text); }
+  void write(XMLElement parent, std::int64_t number) {
+    parent.appendChild("integer", std::to_string(number));
   }
-
-  void writeValue(std::int64_t number) { writeInteger(number); }
-  void writeValue(std::uint64_t number) { writeInteger(number); }
-
-  void writeValue(double number) {
-    startTag("real");
-    if (std::isnan(number)) {
-      output_ += "nan";
-    } else if (std::isinf(number)) {
-      output_ += number < 0 ? "-infinity" : "+infinity";
-    } else {
-      appendNumber(number);
-    }
-    endTag("real");
+  void write(XMLElement parent, std::uint64_t number) {
+    parent.appendChild("integer", std::to_string(number));
   }
-
-  void writeValue(bool flag) { emptyTag(flag ? "true" : "false"); }
-
-  void writeValue(PointInTime date) {
-    startTag("date");
-    appendPropertyListDate(output_, date);
-    endTag("date");
+  void write(XMLElement parent, PointInTime date) {
+    parent.appendChild("date", propertyListDate(date));
   }
-
-  void writeValue(const PropertyListValue::Data& data) {
-    startTag("data");
-    appendBase64(output_, data.bytes);
-    endTag("data");
+  void write(XMLElement parent, const PropertyListValue::Array& array) {
+    open(parent.appendChild("array"), array);
   }
-
-  void writeValue(const PropertyListValue::Array& array) { openContainer("array", array); }
-  void writeValue(const Dictionary& dictionary) { openContainer("dict", dictionary); }
-
-  template <typename Integer>
-  void writeInteger(Integer number) {
-    startTag("integer");
-    appendNumber(number);
-    endTag("integer");
+  void write(XMLElement parent, const Dictionary& dictionary) {
+    open(parent.appendChild("dict"), dictionary);
   }
-
-  template <typename Number>
-  void appendNumber(Number number) {
-    std::array<char, 32> digits{};
-    const auto result = std::to_chars(digits.data(), digits.data() + digits.size(), number);
-    output_.append(digits.data(), result.ptr);
-  }
+  void write(XMLElement /*parent*/, const auto& /*other*/) {}
 
   template <typename Container>
-  void openContainer(std::string_view name, const Container& container) {
-    if (container.empty()) {
-      emptyTag(name);
-      return;
-    }
-    startTag(name);
-    output_ += '\n';
-    levels_.push_back(Level<Container>{container.begin(), container.end()});
+  void open(XMLElement element, const Container& container) {
+    levels_.push_back(Level<Container>{element, container.begin(), container.end()});
   }
-
-  void closeContainer(std::string_view name) {
-    levels_.pop_back();
-    indent();
-    endTag(name);
-  }
-
-  void emptyTag(std::string_view name) {
-    indent();
-    output_ += '<';
-    output_ += name;
-    output_ += "/>\n";
-  }
-
-  void startTag(std::string_view name) {
-    indent();
-    output_ += '<';
-    output_ += name;
-    output_ += '>';
-  }
-
-  void endTag(std::string_view name) {
-    output_ += "</";
-    output_ += name;
-    output_ += ">\n";
-  }
-
-  void indent() { output_.append(levels_.size(), '\t'); }
 
   bool flush() {
     const bool accepted = sink_(output_);
@@ -181,6 +115,7 @@ class Writer {
 
   const ByteSink& sink_;
   std::string output_;
+  XMLWriter xml_{output_, {.indentation = '\t', .indentationWidth = 1, .emptyTagEnd = "/>"}};
   std::vector<std::variant<ArrayLevel, DictionaryLevel>> levels_;
 };
 

@@ -1,27 +1,24 @@
 #include "platform/plist/XMLPropertyListReader.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cstdint>
-#include <limits>
+#include <string_view>
 #include <system_error>
 #include <utility>
 
+#include "platform/plist/PropertyListBuilder.h"
 #include "platform/plist/PropertyListDate.h"
+#include "platform/text/ASCII.h"
 #include "platform/text/Base64.h"
 #include "platform/text/FormattedText.h"
+#include "platform/xml/XMLParser.h"
 
 namespace platform {
-
 namespace {
 
-constexpr std::string_view kWhitespace = " \t\r\n";
-
-std::string_view trimmed(std::string_view text) {
-  const std::size_t first = text.find_first_not_of(kWhitespace);
-  if (first == std::string_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kWhitespace) - first + 1);
-}
+using Value = std::optional<PropertyListValue>;
 
 /// The number that the whole text is; absent for anything else and for one out of range.
 template <typename Number, typename... Format>
@@ -37,7 +34,8 @@ bool startsWithSign(std::string_view text) {
   return text.starts_with('-') || text.starts_with('+');
 }
 
-std::optional<PropertyListValue> integerFromText(std::string_view text) {
+Value integerFromText(std::string_view text) {
+  text = trimmed(text);
   const bool isNegative = text.starts_with('-');
   if (startsWithSign(text)) text.remove_prefix(1);
   const bool isHexadecimal = text.starts_with("0x") || text.starts_with("0X");
@@ -45,13 +43,14 @@ std::optional<PropertyListValue> integerFromText(std::string_view text) {
 
   const auto magnitude = wholeNumber<std::uint64_t>(text, isHexadecimal ? 16 : 10);
   if (!magnitude) return std::nullopt;
-  if (!isNegative) return PropertyListValue(*magnitude);
+  if (!isNegative) return *magnitude;
   constexpr std::uint64_t kLargest = std::uint64_t{1} << 63;
   if (*magnitude > kLargest) return std::nullopt;
-  return PropertyListValue(static_cast<std::int64_t>(0 - *magnitude));
+  return static_cast<std::int64_t>(0 - *magnitude);
 }
 
-std::optional<double> realFromText(std::string_view text) {
+Value realFromText(std::string_view text) {
+  text = trimmed(text);
   if (text.starts_with('+')) {
     text.remove_prefix(1);
     if (startsWithSign(text)) return std::nullopt;
@@ -59,177 +58,150 @@ std::optional<double> realFromText(std::string_view text) {
   return wholeNumber<double>(text);
 }
 
-std::optional<PropertyListValue> dataFromText(std::string_view text) {
+Value dataFromText(std::string_view text) {
   auto bytes = bytesFromBase64(text);
   if (!bytes) return std::nullopt;
-  return PropertyListValue(PropertyListValue::Data{std::move(*bytes)});
+  return PropertyListValue::Data{std::move(*bytes)};
 }
+
+/// What an element of a property list is.
+struct Element {
+  enum class Kind { kList, kArray, kDictionary, kKey, kText, kFlag };
+
+  std::string_view name;
+  Kind kind;
+  Value (*value)(std::string_view text) = nullptr;  // of a text or a flag
+  const char* fault = nullptr;                      // of a text that gives no value
+};
+using Kind = Element::Kind;
+
+constexpr auto kElements = std::to_array<Element>({
+    {"key", Kind::kKey},
+    {"string", Kind::kText, [](std::string_view text) -> Value { return Text(text); }},
+    {"integer", Kind::kText, integerFromText, "an integer that is none or out of range"},
+    {"date", Kind::kText,
+     [](std::string_view text) -> Value { return dateFromPropertyListText(trimmed(text)); },
+     "a date that is none or out of range"},
+    {"dict", Kind::kDictionary},
+    {"array", Kind::kArray},
+    {"real", Kind::kText, realFromText, "a real that is none or out of range"},
+    {"true", Kind::kFlag, [](std::string_view) -> Value { return true; }},
+    {"false", Kind::kFlag, [](std::string_view) -> Value { return false; }},
+    {"data", Kind::kText, dataFromText, "data that is not in base64"},
+    {"plist", Kind::kList},
+});
+
+/// Reads one list.
+class Reader final : private XMLParserEvents {
+ public:
+  explicit Reader(std::string bytes) : parser_(std::move(bytes), *this) {}
+
+  Value read(std::optional<PropertyListFault>& fault) {
+    std::optional<XMLFault> found;
+    if (parser_.parse(found)) return builder_.takeRoot();
+    fault = PropertyListFault{.description = std::move(found->description),
+                              .position = found->position};
+    return std::nullopt;
+  }
+
+ private:
+  void didStartElement(const XMLName& name, const XMLAttributes& /*attributes*/) override {
+    const auto* const element =
+        std::ranges::find(kElements, name.qualified, [](const Element& e) { return e.name; });
+    const bool isKnown = element != kElements.end();
+    const bool isList = isKnown && element->kind == Kind::kList;
+    if (!isInsideList_ && !isList) {
+      parser_.abort("a document whose root element is not \"plist\"");
+    } else if (!isInsideList_) {
+      isInsideList_ = true;
+    } else if (!isKnown || isList) {
+      parser_.abort(formattedText("an unexpected element \"%@\"", {name.qualified}));
+    } else if (open_ != nullptr) {
+      parser_.abort(
+          formattedText("an element \"%@\" inside of a value that holds text", {name.qualified}));
+    } else if (element->kind == Kind::kKey) {
+      startKey(*element);
+    } else {
+      startValue(*element);
+    }
+  }
+
+  void didEndElement(const XMLName& /*name*/) override {
+    if (open_ != nullptr) {
+      endText(*std::exchange(open_, nullptr));
+    } else if (builder_.hasPendingKey()) {
+      parser_.abort(kKeyWithoutValue);
+    } else if (builder_.depth() > 0) {
+      builder_.end();
+    } else if (!builder_.hasRoot()) {
+      parser_.abort("a property list without a value");
+    }
+  }
+
+  void foundCharacters(std::string_view text) override {
+    if (open_ != nullptr && open_->kind != Kind::kFlag) {
+      text_ += text;
+    } else if (!trimmed(text).empty()) {
+      parser_.abort("text outside of a value that holds text");
+    }
+  }
+
+  void startKey(const Element& element) {
+    if (!builder_.isInDictionary()) {
+      parser_.abort("a key outside of a dictionary");
+    } else if (builder_.hasPendingKey()) {
+      parser_.abort(kKeyWithoutValue);
+    } else {
+      startText(element);
+    }
+  }
+
+  void startValue(const Element& element) {
+    const bool isArray = element.kind == Kind::kArray;
+    if (builder_.hasRoot()) {
+      parser_.abort("a second value in a property list");
+    } else if (builder_.isInDictionary() && !builder_.hasPendingKey()) {
+      parser_.abort("a value without a key in a dictionary");
+    } else if (!isArray && element.kind != Kind::kDictionary) {
+      startText(element);
+    } else if (builder_.depth() == kPropertyListDepthLimit) {
+      parser_.abort(kPropertyListTooDeep);
+    } else if (isArray) {
+      builder_.beginArray();
+    } else {
+      builder_.beginDictionary();
+    }
+  }
+
+  void startText(const Element& element) {
+    open_ = &element;
+    text_.clear();
+  }
+
+  void endText(const Element& element) {
+    if (element.kind == Kind::kKey) {
+      builder_.setKey(text_);
+    } else if (Value value = element.value(text_)) {
+      builder_.add(std::move(*value));
+    } else {
+      parser_.abort(element.fault);
+    }
+  }
+
+  static constexpr const char* kKeyWithoutValue = "a key without a value in a dictionary";
+
+  XMLParser parser_;
+  PropertyListBuilder builder_;
+  bool isInsideList_ = false;
+  const Element* open_ = nullptr;  // the open element that holds text, not elements
+  std::string text_;               // what it holds so far
+};
 
 }  // namespace
 
-enum class XMLPropertyListReader::Element {
-  kPlist,
-  kArray,
-  kDict,
-  kKey,
-  kString,
-  kInteger,
-  kReal,
-  kTrue,
-  kFalse,
-  kDate,
-  kData
-};
-
-std::optional<XMLPropertyListReader::Element> XMLPropertyListReader::elementNamed(
-    std::string_view name) {
-  static constexpr std::array<std::pair<std::string_view, Element>, 11> kElements = {{
-      {"key", Element::kKey},
-      {"string", Element::kString},
-      {"integer", Element::kInteger},
-      {"date", Element::kDate},
-      {"dict", Element::kDict},
-      {"array", Element::kArray},
-      {"real", Element::kReal},
-      {"true", Element::kTrue},
-      {"false", Element::kFalse},
-      {"data", Element::kData},
-      {"plist", Element::kPlist},
-  }};
-  for (const auto& [elementName, element] : kElements)
-    if (elementName == name) return element;
-  return std::nullopt;
-}
-
-std::optional<PropertyListValue> XMLPropertyListReader::read(ErrorSlot& error) {
-  if (!parser_.parse(error)) return std::nullopt;
-  return builder_.takeRoot();
-}
-
-void XMLPropertyListReader::didStartElement(const XMLName& name,
-                                            const XMLAttributes& /*attributes*/) {
-  const auto element = elementNamed(name.qualified);
-  const bool isList = element == Element::kPlist;
-  if (!isInsideList_ && !isList) {
-    fail("a document whose root element is not \"plist\"");
-  } else if (!isInsideList_) {
-    isInsideList_ = true;
-  } else if (!element || isList) {
-    fail(formattedText("an unexpected element \"%@\"", {name.qualified}));
-  } else if (scalar_) {
-    fail(formattedText("an element \"%@\" inside of a value that holds text", {name.qualified}));
-  } else if (element == Element::kKey) {
-    startKey();
-  } else {
-    startValue(*element);
-  }
-}
-
-void XMLPropertyListReader::didEndElement(const XMLName& /*name*/) {
-  if (scalar_) {
-    endScalar();
-  } else if (builder_.depth() > 0) {
-    endContainer();
-  } else if (!builder_.hasRoot()) {
-    fail("a property list without a value");
-  }
-}
-
-void XMLPropertyListReader::foundCharacters(std::string_view text) {
-  const bool holdsText = scalar_ && scalar_ != Element::kTrue && scalar_ != Element::kFalse;
-  if (holdsText) {
-    text_ += text;
-  } else if (!trimmed(text).empty()) {
-    fail("text outside of a value that holds text");
-  }
-}
-
-void XMLPropertyListReader::startKey() {
-  if (!builder_.isInDictionary()) {
-    fail("a key outside of a dictionary");
-  } else if (builder_.hasPendingKey()) {
-    fail("a key without a value in a dictionary");
-  } else {
-    startScalar(Element::kKey);
-  }
-}
-
-void XMLPropertyListReader::startValue(Element element) {
-  const bool isContainer = element == Element::kArray || element == Element::kDict;
-  if (builder_.hasRoot()) {
-    fail("a second value in a property list");
-  } else if (builder_.isInDictionary() && !builder_.hasPendingKey()) {
-    fail("a value without a key in a dictionary");
-  } else if (!isContainer) {
-    startScalar(element);
-  } else if (builder_.depth() == kPropertyListDepthLimit) {
-    fail(formattedText("arrays and dictionaries nested deeper than %ld levels",
-                       {kPropertyListDepthLimit}),
-         PropertyListFault::kTooLarge);
-  } else if (element == Element::kArray) {
-    builder_.beginArray();
-  } else {
-    builder_.beginDictionary();
-  }
-}
-
-void XMLPropertyListReader::startScalar(Element element) {
-  scalar_ = element;
-  text_.clear();
-}
-
-void XMLPropertyListReader::endContainer() {
-  if (builder_.hasPendingKey()) {
-    fail("a key without a value in a dictionary");
-  } else {
-    builder_.end();
-  }
-}
-
-void XMLPropertyListReader::endScalar() {
-  switch (*std::exchange(scalar_, std::nullopt)) {
-    case Element::kKey:
-      builder_.setKey(text_);
-      break;
-    case Element::kString:
-      builder_.add(Text(std::string_view(text_)));
-      break;
-    case Element::kInteger:
-      addUnlessAbsent(integerFromText(trimmed(text_)), "an integer that is none or out of range");
-      break;
-    case Element::kReal:
-      addUnlessAbsent(realFromText(trimmed(text_)), "a real that is none or out of range");
-      break;
-    case Element::kDate:
-      addUnlessAbsent(dateFromPropertyListText(trimmed(text_)),
-                      "a date that is none or out of range");
-      break;
-    case Element::kData:
-      addUnlessAbsent(dataFromText(text_), "data that is not in base64");
-      break;
-    case Element::kTrue:
-      builder_.add(true);
-      break;
-    default:
-      builder_.add(false);
-      break;
-  }
-}
-
-template <typename Value>
-void XMLPropertyListReader::addUnlessAbsent(std::optional<Value> value,
-                                            std::string_view faultIfAbsent) {
-  if (value) {
-    builder_.add(std::move(*value));
-  } else {
-    fail(faultIfAbsent);
-  }
-}
-
-void XMLPropertyListReader::fail(std::string_view description, PropertyListFault fault) {
-  parser_.abort({.domain = std::string(kPropertyListErrorDomain),
-                 .code = static_cast<std::int64_t>(fault),
-                 .description = formattedText("%@ at %@", {description, parser_.position()})});
+std::optional<PropertyListValue> readXMLPropertyList(std::string bytes,
+                                                     std::optional<PropertyListFault>& fault) {
+  return Reader(std::move(bytes)).read(fault);
 }
 
 }  // namespace platform

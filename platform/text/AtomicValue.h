@@ -1,6 +1,7 @@
 #pragma once
 
 #include <atomic>
+#include <mutex>
 #include <thread>
 #include <utility>
 
@@ -20,31 +21,27 @@ class AtomicValue {
   AtomicValue& operator=(const AtomicValue&) = delete;
 
   Value load() const {
-    const Guard guard(busy_);
+    const std::lock_guard guard(lock_);
     return value_;
   }
 
   void store(Value value) {
-    const Guard guard(busy_);
+    const std::lock_guard guard(lock_);
     std::swap(value_, value);  // the old value is destroyed after the lock is released
   }
 
  private:
-  class Guard {
-   public:
-    explicit Guard(std::atomic_flag& busy) : busy_(busy) {
-      while (busy_.test_and_set(std::memory_order_acquire)) std::this_thread::yield();
+  struct Lock {
+    void lock() {
+      while (busy.test_and_set(std::memory_order_acquire)) std::this_thread::yield();
     }
-    ~Guard() { busy_.clear(std::memory_order_release); }
-    Guard(const Guard&) = delete;
-    Guard& operator=(const Guard&) = delete;
+    void unlock() { busy.clear(std::memory_order_release); }
 
-   private:
-    std::atomic_flag& busy_;
+    std::atomic_flag busy;
   };
 
   Value value_{};
-  mutable std::atomic_flag busy_;
+  mutable Lock lock_;
 };
 
 }  // namespace platform

@@ -7,7 +7,6 @@
 #include "platform/text/ASCII.h"
 
 namespace platform {
-
 namespace {
 
 constexpr std::string_view kAlphabet =
@@ -20,23 +19,13 @@ constexpr std::array<std::uint8_t, 256> kSextets = [] {
   std::array<std::uint8_t, 256> sextets{};
   sextets.fill(kForeign);
   for (const char c : kWhitespace) sextets[static_cast<unsigned char>(c)] = kIgnored;
-  for (std::size_t i = 0; i < kAlphabet.size(); ++i)
+  for (std::size_t i = 0; i < kAlphabet.size(); ++i) {
     sextets[static_cast<unsigned char>(kAlphabet[i])] = static_cast<std::uint8_t>(i);
+  }
   return sextets;
 }();
 
 }  // namespace
-
-void appendBase64(std::string& output, std::string_view bytes) {
-  for (std::size_t i = 0; i < bytes.size(); i += 3) {
-    const std::string_view group = bytes.substr(i, 3);
-    std::uint32_t bits = 0;
-    for (std::size_t j = 0; j < 3; ++j)
-      bits = bits << 8 | (j < group.size() ? static_cast<unsigned char>(group[j]) : 0U);
-    for (std::size_t j = 0; j < 4; ++j)
-      output += j <= group.size() ? kAlphabet[bits >> (18 - 6 * j) & 0x3F] : '=';
-  }
-}
 
 std::optional<std::string> bytesFromBase64(std::string_view text) {
   std::string bytes;
@@ -55,8 +44,9 @@ std::optional<std::string> bytesFromBase64(std::string_view text) {
     bits = bits << 6 | sextet;
     ++characters;
     // Every character but the first of a group of four completes a byte.
-    if (const std::size_t place = characters % 4; place != 1)
+    if (const std::size_t place = characters % 4; place != 1) {
       bytes += static_cast<char>(bits >> ((4 - place) % 4 * 2) & 0xFF);
+    }
   }
   if (padding > 2 || (characters + padding) % 4 != 0) return std::nullopt;
   return bytes;

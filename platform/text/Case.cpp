@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <iterator>
 #include <limits>
 
 #include "platform/text/ASCII.h"
@@ -18,11 +19,15 @@ namespace {
 using CaseMapping = void (*)(const char*, std::uint32_t, icu::StringPiece, icu::ByteSink&,
                              icu::Edits*, UErrorCode&);
 
-std::string caseMapped(std::string_view text, CaseMapping mapping) {
+std::string caseMapped(std::string_view text, char (*asciiMapping)(char), CaseMapping mapping) {
   // ICU counts in 32 bits and lets the result grow to three times the text.
   constexpr std::size_t kPieceLimit = std::numeric_limits<std::int32_t>::max() / 4;
   std::string result;
   result.reserve(text.size());
+  if (isASCII(text)) {
+    std::transform(text.begin(), text.end(), std::back_inserter(result), asciiMapping);
+    return result;
+  }
   icu::StringByteSink<std::string> sink(&result);
   while (!text.empty()) {
     std::size_t length = text.size();
@@ -42,17 +47,11 @@ std::string caseMapped(std::string_view text, CaseMapping mapping) {
 }  // namespace
 
 std::string lowercased(std::string_view text) {
-  if (!isASCII(text)) return caseMapped(text, icu::CaseMap::utf8ToLower);
-  std::string result(text);
-  std::transform(result.begin(), result.end(), result.begin(), lowercasedASCII);
-  return result;
+  return caseMapped(text, lowercasedASCII, icu::CaseMap::utf8ToLower);
 }
 
 std::string uppercased(std::string_view text) {
-  if (!isASCII(text)) return caseMapped(text, icu::CaseMap::utf8ToUpper);
-  std::string result(text);
-  std::transform(result.begin(), result.end(), result.begin(), uppercasedASCII);
-  return result;
+  return caseMapped(text, uppercasedASCII, icu::CaseMap::utf8ToUpper);
 }
 
 }  // namespace platform

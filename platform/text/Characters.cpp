@@ -35,18 +35,9 @@ std::size_t utf16Length(std::string_view text) {
 }
 
 bool isHorizontalWhitespace(std::int32_t character) {
-  switch (character) {
-    case '\t':
-    case ' ':
-    case 0x00A0:
-    case 0x1680:
-    case 0x202F:
-    case 0x205F:
-    case 0x3000:
-      return true;
-    default:
-      return character >= 0x2000 && character <= 0x200A;
-  }
+  constexpr std::u32string_view kOthers = U"\t \u00A0\u1680\u202F\u205F\u3000";
+  return (character >= 0x2000 && character <= 0x200A) ||
+         kOthers.find(static_cast<char32_t>(character)) != std::u32string_view::npos;
 }
 
 }  // namespace platform

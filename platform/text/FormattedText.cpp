@@ -7,10 +7,11 @@
 namespace platform {
 namespace {
 
-// The digits of the largest double before its point, and room for the sign, the point and one more.
+/// The digits of the largest double before its point, and room for the sign, the point and one
+/// more.
 constexpr std::size_t kLongestNumber = 320;
 
-// std::to_chars writes what printf writes in the C locale, whatever the locale of the process.
+/// std::to_chars writes what printf writes in the C locale, whatever the locale of the process.
 template <typename... Number>
 void appendNumber(std::string& result, Number... numberAndFormat) {
   std::array<char, kLongestNumber> characters;
@@ -32,29 +33,7 @@ void append(std::string& result, const FormatArgument::Value& value) {
   }
 }
 
-/// The argument as a Number where it is an integer, as the placeholders for numbers reinterpret it.
-template <typename Number>
-FormatArgument::Value integerAs(const FormatArgument::Value& value) {
-  if (const auto* number = std::get_if<std::int64_t>(&value)) return static_cast<Number>(*number);
-  if (const auto* size = std::get_if<std::uint64_t>(&value)) return static_cast<Number>(*size);
-  return value;
-}
-
-using Conversion = FormatArgument::Value (*)(const FormatArgument::Value&);
-struct Placeholder {
-  std::string_view text;
-  Conversion converted;
-};
-FormatArgument::Value asItIs(const FormatArgument::Value& value) {
-  return value;
-}
-constexpr std::array<Placeholder, 5> kPlaceholders = {{
-    {"%@", asItIs},
-    {"%s", asItIs},
-    {"%ld", integerAs<std::int64_t>},
-    {"%lu", integerAs<std::uint64_t>},
-    {"%0.1f", integerAs<double>},
-}};
+constexpr std::array<std::string_view, 5> kPlaceholders = {"%@", "%s", "%ld", "%lu", "%0.1f"};
 
 }  // namespace
 
@@ -68,11 +47,10 @@ std::string formattedText(std::string_view format,
     format.remove_prefix(percent);
     const auto* placeholder =
         std::find_if(kPlaceholders.begin(), kPlaceholders.end(),
-                     [&](const Placeholder& known) { return format.starts_with(known.text); });
+                     [&](std::string_view known) { return format.starts_with(known); });
     if (placeholder != kPlaceholders.end()) {
-      append(result, argument == arguments.end() ? FormatArgument::Value()
-                                                 : placeholder->converted((argument++)->value()));
-      format.remove_prefix(placeholder->text.size());
+      append(result, argument == arguments.end() ? FormatArgument::Value() : (argument++)->value());
+      format.remove_prefix(placeholder->size());
     } else {
       result.push_back('%');  // of "%%", or of something that is no placeholder and stays
       format.remove_prefix(format.starts_with("%%") ? 2 : 1);

@@ -34,9 +34,14 @@ class FormatArgument {
 };
 
 /// The format with its placeholders replaced by the arguments in order, as printf does it: "%@" and
-/// "%s" take a text, "%ld" and "%lu" an integer, "%0.1f" a floating-point number with one decimal,
-/// "%%" is a percent sign. Surplus arguments are ignored; a placeholder without an argument inserts
+/// "%s" stand for a text, "%ld" and "%lu" for an integer, "%0.1f" for a floating-point number, of
+/// which one decimal is written, and "%%" for a percent sign. How an argument is written is decided
+/// by its own type. Surplus arguments are ignored; a placeholder without an argument inserts
 /// "(null)".
+///
+///     formattedText("%@: \"%@\"", {"Unsupported", title});  // Unsupported: "Pilot"
+///     formattedText("%lu / %lu (%0.1f%%)", {512U, 2048U, 25.0});  // 512 / 2048 (25.0%)
+///     formattedText("<%@>", {OptionalText()});  // <(null)>
 std::string formattedText(std::string_view format, std::initializer_list<FormatArgument> arguments);
 
 }  // namespace platform

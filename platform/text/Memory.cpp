@@ -6,7 +6,6 @@
 #include <cstdlib>
 #include <cstring>
 #include <new>
-#include <pugixml.hpp>
 
 namespace platform {
 namespace {
@@ -56,7 +55,6 @@ void Memory::serveLibraries() {
       nullptr, [](const void*, std::size_t size) { return allocate(size); },
       [](const void*, void* block, std::size_t size) { return reallocate(block, size); },
       [](const void*, void* block) { release(block); }, &status);
-  pugi::set_memory_management_functions(&allocate, &release);
 }
 
 }  // namespace platform

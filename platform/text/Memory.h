@@ -18,8 +18,8 @@ class Memory {
   static char* duplicate(const char* text);
   static void release(void* block);
 
-  /// Gives ICU and pugixml, which have one source of memory for the whole process, this one. To be
-  /// called before their first use; without it they use the C library's.
+  /// Gives ICU, which has one source of memory for the whole process, this one. To be called before
+  /// its first use; without it, ICU uses the C library's.
   static void serveLibraries();
 };
 

@@ -1,9 +1,9 @@
 #pragma once
 
+#include <concepts>
 #include <cstddef>
 #include <memory>
 #include <optional>
-#include <ostream>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -49,16 +49,10 @@ class Text {
   /// The length in bytes.
   std::size_t size() const { return size_; }
 
-  friend bool operator==(const Text& left, const Text& right) {
-    return left.view() == right.view();
-  }
-  friend bool operator==(const Text& left, std::string_view right) { return left.view() == right; }
-  friend bool operator==(const Text& left, const char* right) { return left.view() == right; }
-  friend bool operator==(const Text& left, const std::string& right) {
-    return left.view() == right;
-  }
-  friend std::ostream& operator<<(std::ostream& stream, const Text& text) {
-    return stream << text.view();
+  /// Whether the characters are those of the other text, of whatever type.
+  template <std::convertible_to<std::string_view> Other>
+  friend bool operator==(const Text& left, const Other& right) {
+    return left.view() == std::string_view(right);
   }
 
  private:

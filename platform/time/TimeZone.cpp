@@ -63,6 +63,7 @@ class CLibraryRules final : public TimeZone::Rules {
 
  private:
   static std::int64_t offset(std::chrono::seconds sinceEpoch) {
+    static_assert(sizeof(time_t) == sizeof(std::int64_t));
     const time_t time = sinceEpoch.count();
     struct tm fields {};
     localtime_r(&time, &fields);  // the years of every PointInTime are within those of struct tm

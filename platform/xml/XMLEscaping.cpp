@@ -1,10 +1,10 @@
 #include "platform/xml/XMLEscaping.h"
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 
 namespace platform {
-
 namespace {
 
 // What becomes of each byte: itself, a reference, nothing, or what the character shows that it
@@ -74,23 +74,20 @@ std::size_t lengthOfAllowedCharacter(std::string_view text) {
 }
 
 void appendEscaped(std::string& output, std::string_view text, const ByteRules& rules) {
-  std::size_t runStart = 0;
-  std::size_t next = 0;
-  while (next < text.size()) {
-    if (!rules.isSpecial(text[next])) {
-      ++next;
-      continue;
-    }
-    const std::size_t length = lengthOfAllowedCharacter(text.substr(next));
-    if (length > 0) {
+  const auto isSpecial = [&rules](char byte) { return rules.isSpecial(byte); };
+  const char* const end = text.data() + text.size();
+  const char* run = text.data();  // of bytes that stay as they are
+  const char* next = run;
+  while ((next = std::find_if(next, end, isSpecial)) != end) {
+    if (const std::size_t length = lengthOfAllowedCharacter({next, end})) {
       next += length;
       continue;
     }
-    output.append(text.substr(runStart, next - runStart));
-    output.append(reference(text[next]));
-    runStart = ++next;
+    output.append(run, next);
+    output.append(reference(*next));
+    run = ++next;
   }
-  output.append(text.substr(runStart));
+  output.append(run, end);
 }
 
 }  // namespace

@@ -1,14 +1,27 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <utility>
 
 #include "platform/text/ErrorRecord.h"
+#include "platform/xml/TextPosition.h"
 
 namespace platform {
+
+/// What is wrong with a document, and where.
+struct XMLFault {
+  std::int64_t code = 0;    // the library's
+  std::string description;  // "mismatched tag"
+  TextPosition position;
+
+  /// The same for whoever shows a sentence: "mismatched tag at line 3, column 7", of the domain
+  /// "XML".
+  ErrorRecord record() const;
+};
 
 /// The name of an element as the document writes it, and its part behind the prefix.
 ///
@@ -32,7 +45,8 @@ class XMLAttributes {
   const char* const* pairs_;
 };
 
-/// Receives the events of an XMLParser. Every text is UTF-8 and valid during the call only.
+/// Receives the events of an XMLParser. Every text is UTF-8 and valid during the call only. No
+/// event throws, since the library behind the parser is C.
 class XMLParserEvents {
  public:
   virtual ~XMLParserEvents() = default;
@@ -42,11 +56,21 @@ class XMLParserEvents {
   virtual void foundCharacters(std::string_view text) = 0;
 };
 
-/// An event-driven parser of XML 1.0 over a document in memory, in one pass.
+/// An event-driven parser of XML 1.0 over a document in memory, in one pass:
 ///
-/// The encoding is told by a byte order mark or the declaration and may be any that the conversion
-/// library knows; without either it is UTF-8. A document labelled ISO-8859-1 or US-ASCII is read as
-/// windows-1252, which is what such documents mean. White space before the declaration is skipped.
+///   struct Counter : XMLParserEvents {
+///     void didStartElement(const XMLName& name, const XMLAttributes&) override {
+///       if (name.local == "item") ++items;
+///     }
+///     void didEndElement(const XMLName&) override {}
+///     void foundCharacters(std::string_view) override {}
+///     int items = 0;
+///   } counter;
+///   std::optional<XMLFault> fault;
+///   if (!XMLParser(std::move(bytes), counter).parse(fault)) show(fault->description);
+///
+/// The encoding is what DocumentEncoding detects, any that the conversion library knows. White
+/// space before the declaration is skipped.
 ///
 /// Internal entities and attributes by default are resolved as long as what they add is not much
 /// more than the document itself, and their declarations not too many; beyond that the document is
@@ -67,20 +91,12 @@ class XMLParser {
       : bytes_(std::move(bytes)), events_(events), largestWholeSize_(largestWholeSize) {}
 
   /// Runs the whole parse on the calling thread; called once at most. On a malformed document
-  /// returns false with a description that names the fault, the line and the column (both counted
-  /// from 1, the column in characters): "mismatched tag at line 3, column 7". Events that came
-  /// before the fault have been delivered. Records have the domain "XML" and expat's codes.
-  /// Exhausted memory, in an event too, is such an error, but may have no place; other exceptions
-  /// of an event pass through.
-  bool parse(ErrorSlot& error);
+  /// returns false with its first fault; the events that came before it have been delivered.
+  bool parse(std::optional<XMLFault>& fault);
 
   /// Ends the parse from inside an event: no other event follows, and `parse` returns false with
-  /// this record.
-  void abort(ErrorRecord error) { abortedWith_ = std::move(error); }
-
-  /// Where the current event stands, for messages of the receiver: "line 3, column 7". Counts from
-  /// the start of the document, so it is not for every event. Empty outside of `parse`.
-  std::string position() const;
+  /// this fault, at the place of the event.
+  void abort(std::string description);
 
  private:
   struct Run;
@@ -88,8 +104,7 @@ class XMLParser {
   std::string bytes_;
   XMLParserEvents& events_;
   std::size_t largestWholeSize_;
-  ErrorSlot abortedWith_;
-  const Run* run_ = nullptr;  // while parse() runs
+  Run* run_ = nullptr;  // while parse() runs
 };
 
 }  // namespace platform

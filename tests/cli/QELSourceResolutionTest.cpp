@@ -2,10 +2,12 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdio>
 #include <string>
 
 #include "sources/QELFeedPodcastSource.h"
 #include "sources/QELReferenceFilePodcastSource.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace {
@@ -18,11 +20,10 @@ class QELSourceResolutionTest : public testing::Test {
 constexpr const char* kReferenceFile = "<plist version=\"1.0\"><dict/></plist>";
 
 TEST_F(QELSourceResolutionTest, Validation) {
-  struct Row {
+  const struct {
     std::optional<std::string_view> source;
     bool valid;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {"http://a.example/feed", true},
       {"https://a.example", true},
       {"pcast://a.example/feed", true},
@@ -42,7 +43,7 @@ TEST_F(QELSourceResolutionTest, Validation) {
       {"", true},
       {std::nullopt, false},
   };
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     EXPECT_EQ(QELValidateSource(row.source, false), row.valid) << row.source.value_or("(absent)");
   }
 }
@@ -82,6 +83,22 @@ TEST_F(QELSourceResolutionTest, MissingPathsNameNothing) {
 
 TEST_F(QELSourceResolutionTest, FileThatIsNoPropertyListNamesNothing) {
   EXPECT_EQ(initWithSourceString(directory_.addFile("a.plist", "text")), nullptr);
+}
+
+TEST_F(QELSourceResolutionTest, StandardInputIsReadUntilItHoldsAPropertyList) {
+  const std::string faulty = directory_.addFile("faulty", "text");
+  const std::string sound = directory_.addFile("sound", kReferenceFile);
+  EXPECT_EQ(exitStatusOfChild([&] {
+              const auto readFrom = [](const std::string& path) {
+                if (std::freopen(path.c_str(), "rb", stdin) == nullptr) return 1;
+                return QELPodcastFromStandardInput() ? 2 : 3;
+              };
+              const bool isReadAgain = readFrom(faulty) == 3 && readFrom(sound) == 2;
+              const auto cached = QELPodcastFromStandardInput();
+              const bool isKept = readFrom(faulty) == 2 && QELPodcastFromStandardInput() == cached;
+              return isReadAgain && isKept ? 0 : 1;
+            }),
+            0);
 }
 
 }  // namespace

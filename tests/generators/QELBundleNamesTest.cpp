@@ -13,7 +13,7 @@ using platform::Text;
 TEST(QELBundleNamesTest, TakesTheLastComponentOfALocation) {
   const struct {
     std::string_view location;
-    std::optional<Text> referenceType;
+    platform::OptionalText referenceType;
     std::optional<std::string> name;
   } rows[] = {
       {"/media/ebb.mp3", Text("local"), "ebb.mp3"},

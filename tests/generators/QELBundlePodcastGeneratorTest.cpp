@@ -43,13 +43,13 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
     return "file://" + (root() / "media" / encodedName).string();
   }
 
-  void addEpisode(const std::optional<Text>& location, const char* title = "t",
-                  const std::optional<Text>& poster = std::nullopt) {
+  void addEpisode(const platform::OptionalText& location, const char* title = "t",
+                  const platform::OptionalText& poster = std::nullopt) {
     const auto episode = QELEpisode::episodeWithDictionary(nullptr);
     episode->setTitle(title);
     episode->setLocation(location);
     episode->setPosterLocation(poster);
-    const auto typeOf = [](const std::optional<Text>& text) -> std::optional<Text> {
+    const auto typeOf = [](const platform::OptionalText& text) -> platform::OptionalText {
       if (!text) return std::nullopt;
       return text->view().starts_with("file:") || text->view().starts_with("http") ? "remote"
                                                                                    : "local";
@@ -60,19 +60,29 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
     source.setEpisodes(episodes_);
   }
 
-  /// Generates the bundle, which must succeed, and reads it back; keeps what was printed.
-  Dictionary generate() {
+  /// Generates a bundle at the path and keeps what was printed; the record of a failure.
+  platform::ErrorSlot failureAt(std::optional<std::string> path) {
     QELBundlePodcastGenerator generator;
-    generator.setOutputPath(bundlePath().string());
+    EXPECT_EQ(generator.outputPath(), std::nullopt);
+    generator.setOutputPath(path);
+    EXPECT_EQ(generator.outputPath(), path);
     platform::ErrorSlot error;
     testing::internal::CaptureStdout();
     const bool generated = generator.generateFromSource(source, error);
     std::fflush(stdout);
     printed = testing::internal::GetCapturedStdout();
-    EXPECT_TRUE(generated) << error.value_or(platform::ErrorRecord()).description;
+    EXPECT_EQ(generated, !error);
+    return error;
+  }
+
+  /// Generates the bundle, which must succeed, and reads it back; keeps what was printed.
+  Dictionary generate() {
+    platform::ErrorSlot error = failureAt(bundlePath().string());
+    EXPECT_EQ(error, std::nullopt);
     const auto bytes = platform::readWholeFile((bundlePath() / "Info.plist").string(), error);
     if (!bytes) return {};
-    const auto value = platform::readPropertyList(*bytes, error);
+    std::optional<platform::PropertyListFault> fault;
+    const auto value = platform::readPropertyList(*bytes, fault);
     return value && value->asDictionary() ? *value->asDictionary() : Dictionary();
   }
 
@@ -82,9 +92,20 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
     const PropertyListValue* episodes = platform::valueForKey(dictionary, "Episodes");
     if (!episodes) return names;
     for (const PropertyListValue& entry : *episodes->asArray()) {
-      names.push_back(entry.asDictionary()->at("EpisodeReference").asText()->string());
+      names.push_back(platform::textForKey(*entry.asDictionary(), "EpisodeReference")->string());
     }
     return names;
+  }
+
+  /// Adds each location as an episode; every one must get the name that stands behind it.
+  void expectNames(const std::vector<std::pair<std::string, std::string>>& rows) {
+    std::vector<std::string> expected;
+    for (const auto& [location, name] : rows) {
+      addEpisode(Text(location));
+      expected.push_back(name);
+    }
+    EXPECT_EQ(references(generate()), expected);
+    for (const std::string& name : expected) EXPECT_TRUE(fs::exists(bundlePath() / name)) << name;
   }
 
   /// Every file and directory in the bundle, relative to it.
@@ -101,53 +122,39 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
 
   QELPodcastSource source;
   std::string printed;
+  /// The entry of a local "one.mp3" with the title "One" and a PNG poster.
+  Dictionary entryOfOne{{"EpisodeName", "One"},
+                        {"EpisodeReference", "one.mp3"},
+                        {"EpisodeReferenceType", "local"},
+                        {"EpisodePosterReference", "Posters/one.png"},
+                        {"EpisodePosterReferenceType", "local"}};
 
  private:
   TemporaryDirectory directory_;
   std::shared_ptr<QELEpisodeList> episodes_ = std::make_shared<QELEpisodeList>();
 };
 
-TEST_F(QELBundlePodcastGeneratorTest, NoOutputPathFailsWithCodeOne) {
-  QELBundlePodcastGenerator generator;
-  EXPECT_EQ(generator.outputPath(), std::nullopt);
-  platform::ErrorSlot error;
-  EXPECT_FALSE(generator.generateFromSource(source, error));
-  EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 1, "No output path was provided"}));
-  generator.setOutputPath("a.podcast");
-  EXPECT_EQ(generator.outputPath(), "a.podcast");
-}
-
-TEST_F(QELBundlePodcastGeneratorTest, DirectoryThatCannotBeCreatedFailsWithCodeTwo) {
-  QELBundlePodcastGenerator generator;
-  generator.setOutputPath(media("file") + "/a.podcast");
-  platform::ErrorSlot error;
-  EXPECT_FALSE(generator.generateFromSource(source, error));
-  EXPECT_EQ(error,
+TEST_F(QELBundlePodcastGeneratorTest, PathsThatCannotBeUsedFail) {
+  EXPECT_EQ(failureAt(std::nullopt),
+            (platform::ErrorRecord{"QELDomain", 1, "No output path was provided"}));
+  EXPECT_EQ(failureAt(media("file") + "/a.podcast"),
             (platform::ErrorRecord{"QELDomain", 2, "Could not create bundle: Not a directory"}));
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, ReferenceFileThatCannotBeWrittenFailsWithCodeOne) {
+  const platform::ErrorRecord expected{"QELDomain", 1, "Could not write Info.plist file"};
+  {
+    const Interposed names(&InterposedCalls::getentropy, std::function([](void*, std::size_t) {
+      errno = EIO;
+      return -1;
+    }));
+    EXPECT_EQ(failureAt(bundlePath().string()), expected);
+    EXPECT_EQ(contents(), std::set<std::string>{"Posters"});
+  }
   fs::create_directories(bundlePath() / "Info.plist");
   addEpisode(media("a.mp3"));
-  QELBundlePodcastGenerator generator;
-  generator.setOutputPath(bundlePath().string());
-  platform::ErrorSlot error;
-  EXPECT_FALSE(generator.generateFromSource(source, error));
-  EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 1, "Could not write Info.plist file"}));
+  EXPECT_EQ(failureAt(bundlePath().string()), expected);
   EXPECT_EQ(contents(), (std::set<std::string>{"Info.plist", "Posters", "a.mp3"}));
-}
-
-TEST_F(QELBundlePodcastGeneratorTest, ReferenceFileThatCannotBeBegunFailsWithCodeOne) {
-  const Interposed names(&InterposedCalls::getentropy, std::function([](void*, std::size_t) {
-    errno = EIO;
-    return -1;
-  }));
-  QELBundlePodcastGenerator generator;
-  generator.setOutputPath(bundlePath().string());
-  platform::ErrorSlot error;
-  EXPECT_FALSE(generator.generateFromSource(source, error));
-  EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 1, "Could not write Info.plist file"}));
-  EXPECT_EQ(contents(), std::set<std::string>{"Posters"});
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, PodcastWithoutEpisodes) {
@@ -160,14 +167,8 @@ TEST_F(QELBundlePodcastGeneratorTest, PodcastWithoutEpisodes) {
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, LocalEpisodeIsCopiedAndItsEntryRewritten) {
-  const std::string poster = media("p.png", "poster");
-  addEpisode(media("one.mp3", "sound"), "One", Text(poster));
-  EXPECT_EQ(generate(), (Dictionary{{"Episodes", PropertyListValue::Array{Dictionary{
-                                                     {"EpisodeName", "One"},
-                                                     {"EpisodeReference", "one.mp3"},
-                                                     {"EpisodeReferenceType", "local"},
-                                                     {"EpisodePosterReference", "Posters/one.png"},
-                                                     {"EpisodePosterReferenceType", "local"}}}}}));
+  addEpisode(media("one.mp3", "sound"), "One", Text(media("p.png", "poster")));
+  EXPECT_EQ(generate(), (Dictionary{{"Episodes", PropertyListValue::Array{entryOfOne}}}));
   EXPECT_EQ(contents(),
             (std::set<std::string>{"Info.plist", "Posters", "Posters/one.png", "one.mp3"}));
   EXPECT_EQ(printed, "[N] Fetching 1 episodes\n[N] Fetching episode 1...\n[N] Fetched episode 1\n");
@@ -177,15 +178,9 @@ TEST_F(QELBundlePodcastGeneratorTest, RemoteEpisodeIsDownloadedAndItsSizeKept) {
   media("one.mp3", "sound");
   media("p.png", "poster");
   addEpisode(Text(mediaURL("one.mp3")), "One", Text(mediaURL("p.png")));
-  const Dictionary dictionary = generate();
   // The size is that of what was fetched last, the poster.
-  EXPECT_EQ(dictionary, (Dictionary{{"Episodes", PropertyListValue::Array{Dictionary{
-                                                     {"EpisodeName", "One"},
-                                                     {"EpisodeFileSize", std::int64_t{6}},
-                                                     {"EpisodeReference", "one.mp3"},
-                                                     {"EpisodeReferenceType", "local"},
-                                                     {"EpisodePosterReference", "Posters/one.png"},
-                                                     {"EpisodePosterReferenceType", "local"}}}}}));
+  entryOfOne.emplace("EpisodeFileSize", std::int64_t{6});
+  EXPECT_EQ(generate(), (Dictionary{{"Episodes", PropertyListValue::Array{entryOfOne}}}));
   EXPECT_EQ(printed,
             "[N] Fetching 1 episodes\n[N] Fetching episode 1...\n"
             "[N] Downloading episode entitled \"One\" (0 bytes)...\n"
@@ -195,40 +190,29 @@ TEST_F(QELBundlePodcastGeneratorTest, RemoteEpisodeIsDownloadedAndItsSizeKept) {
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, Names) {
-  const std::vector<std::pair<std::string, std::string>> rows = {
-      {media("1/show.mp3"), "show.mp3"},      {media("2/show.MP3"), "show-2.MP3"},
-      {media("3/show.aac"), "show-3.aac"},    {media("a:b.mp3"), "ab.mp3"},
-      {media("noextension"), "noextension."}, {media(".hidden"), ".hidden."},
-      {media("trailing."), "trailing-2."},    {media("two.dots.mp3"), "two.dots.mp3"},
+  expectNames({
+      {media("0/trailing"), "trailing."},
+      {media("1/show.mp3"), "show.mp3"},
+      {media("2/show.MP3"), "show-2.MP3"},
+      {media("3/show.aac"), "show-3.aac"},
+      {media("a:b.mp3"), "ab.mp3"},
+      {media("noextension"), "noextension."},
+      {media(".hidden"), ".hidden."},
+      {media("trailing."), "trailing-2."},
+      {media("two.dots.mp3"), "two.dots.mp3"},
       {media("Podcast.mp3"), "Podcast.mp3"},
-  };
-  addEpisode(media("0/trailing"));
-  std::vector<std::string> expected{"trailing."};
-  for (const auto& [location, name] : rows) {
-    addEpisode(Text(location));
-    expected.push_back(name);
-  }
-  EXPECT_EQ(references(generate()), expected);
-  for (const std::string& name : expected) EXPECT_TRUE(fs::exists(bundlePath() / name)) << name;
+  });
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, NamesOfURLs) {
-  media("a b.mp3");
-  media("c:d.mp3");
-  media("100%.mp3");
-  media("query.mp3");
-  media("e/f.mp3");
-  const std::vector<std::pair<std::string, std::string>> rows = {
-      {"a%20b.mp3", "a b.mp3"},   {"c%3Ad.mp3", "cd.mp3"},
-      {"100%25.mp3", "100%.mp3"}, {"query.mp3?x=/y.ogg#z.wav", "query.mp3"},
-      {"e%2Ff.mp3", "e:f.mp3"},
-  };
-  std::vector<std::string> expected;
-  for (const auto& [encoded, name] : rows) {
-    addEpisode(Text(mediaURL(encoded)));
-    expected.push_back(name);
-  }
-  EXPECT_EQ(references(generate()), expected);
+  for (const char* name : {"a b.mp3", "c:d.mp3", "100%.mp3", "query.mp3", "e/f.mp3"}) media(name);
+  expectNames({
+      {mediaURL("a%20b.mp3"), "a b.mp3"},
+      {mediaURL("c%3Ad.mp3"), "cd.mp3"},
+      {mediaURL("100%25.mp3"), "100%.mp3"},
+      {mediaURL("query.mp3?x=/y.ogg#z.wav"), "query.mp3"},
+      {mediaURL("e%2Ff.mp3"), "e:f.mp3"},
+  });
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, HostileNamesStayInsideTheBundle) {
@@ -269,34 +253,21 @@ TEST_F(QELBundlePodcastGeneratorTest, HostileNamesStayInsideTheBundle) {
   EXPECT_EQ(contents(), (std::set<std::string>{"Info.plist", "Posters", odd, longest}));
 }
 
-TEST_F(QELBundlePodcastGeneratorTest, EpisodeWithoutLocationIsSkipped) {
-  addEpisode(std::nullopt, "Lost");
-  EXPECT_EQ(generate(), Dictionary());
-  EXPECT_EQ(printed,
-            "[N] Fetching 1 episodes\n[N] Fetching episode 1...\n"
-            "[W] Found an episode (\"Lost\") without a specified location\n"
-            "[N] Skipping episode 1\n");
-}
-
-TEST_F(QELBundlePodcastGeneratorTest, EpisodeThatCannotBeSavedIsSkippedAndKeepsItsName) {
-  addEpisode(Text((root() / "media" / "missing" / "a.mp3").string()), "Gone");
-  addEpisode(media("a.mp3"), "Here");
-  EXPECT_EQ(references(generate()), (std::vector<std::string>{"a-2.mp3"}));
-  EXPECT_EQ(printed,
-            "[N] Fetching 2 episodes\n[N] Fetching episode 1...\n"
-            "[W] Could not save or download episode \"Gone\"\n[N] Skipping episode 1\n"
-            "[N] Fetching episode 2...\n[N] Fetched episode 2\n");
-}
-
-TEST_F(QELBundlePodcastGeneratorTest, DisallowedTypeIsSkippedAndKeepsItsName) {
+TEST_F(QELBundlePodcastGeneratorTest, EpisodesThatCannotBeFetchedAreSkippedAndKeepTheirNames) {
   source.setAllowedEpisodeFileTypes(QELPodcastSource::FileTypes{"mp3"});
+  addEpisode(std::nullopt, "Lost");
+  addEpisode(Text((root() / "media" / "missing" / "a.mp3").string()), "Gone");
   addEpisode(media("a.ogg"), "Wrong");
-  addEpisode(media("a.Mp3"), "Right");
-  EXPECT_EQ(references(generate()), (std::vector<std::string>{"a-2.Mp3"}));
+  addEpisode(media("a.Mp3"), "Here");
+  EXPECT_EQ(references(generate()), (std::vector<std::string>{"a-3.Mp3"}));
   EXPECT_EQ(printed,
-            "[N] Fetching 2 episodes\n[N] Fetching episode 1...\n"
-            "[W] Invalid file type \"ogg\" for episode \"Wrong\"\n[N] Skipping episode 1\n"
-            "[N] Fetching episode 2...\n[N] Fetched episode 2\n");
+            "[N] Fetching 4 episodes\n[N] Fetching episode 1...\n"
+            "[W] Found an episode (\"Lost\") without a specified location\n"
+            "[N] Skipping episode 1\n[N] Fetching episode 2...\n"
+            "[W] Could not save or download episode \"Gone\"\n"
+            "[N] Skipping episode 2\n[N] Fetching episode 3...\n"
+            "[W] Invalid file type \"ogg\" for episode \"Wrong\"\n"
+            "[N] Skipping episode 3\n[N] Fetching episode 4...\n[N] Fetched episode 4\n");
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, PodcastPosterIsSaved) {
@@ -313,12 +284,11 @@ TEST_F(QELBundlePodcastGeneratorTest, PodcastPosterIsSaved) {
 }
 
 TEST_F(QELBundlePodcastGeneratorTest, PodcastPosterThatFailsIsWarnedAbout) {
-  struct Row {
+  const struct {
     std::string location;
     const char* type;
     const char* warning;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {media("p.gif"), "local", "Unsupported poster image type \"gif\" for podcast \"S\""},
       {media("nothing"), "local", "Unsupported poster image type \"\" for podcast \"S\""},
       {"file://elsewhere/p.png", "remote",
@@ -327,7 +297,7 @@ TEST_F(QELBundlePodcastGeneratorTest, PodcastPosterThatFailsIsWarnedAbout) {
   };
   source.setTitle("S");
   source.setAllowedPosterFileTypes(QELPodcastSource::FileTypes{"png"});
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     source.setPosterLocation(Text(row.location));
     source.setPosterReferenceType(row.type);
     EXPECT_EQ(generate(), (Dictionary{{"PodcastName", "S"}}));
@@ -349,9 +319,9 @@ TEST_F(QELBundlePodcastGeneratorTest, EpisodePosterThatFailsLeavesTheEpisode) {
   addEpisode(media("3.mp3"), "Three", Text("/nowhere/p.png"));
   const Dictionary dictionary = generate();
   EXPECT_EQ(references(dictionary), (std::vector<std::string>{"1.mp3", "2.mp3", "3.mp3"}));
-  for (const PropertyListValue& entry : *dictionary.at("Episodes").asArray()) {
-    EXPECT_FALSE(entry.asDictionary()->contains("EpisodePosterReference"));
-    EXPECT_FALSE(entry.asDictionary()->contains("EpisodePosterReferenceType"));
+  for (const PropertyListValue& entry : *platform::valueForKey(dictionary, "Episodes")->asArray()) {
+    EXPECT_EQ(platform::valueForKey(*entry.asDictionary(), "EpisodePosterReference"), nullptr);
+    EXPECT_EQ(platform::valueForKey(*entry.asDictionary(), "EpisodePosterReferenceType"), nullptr);
   }
   EXPECT_EQ(printed,
             "[N] Fetching 3 episodes\n[N] Fetching episode 1...\n"

@@ -271,15 +271,18 @@ TEST(QELFeedPodcastGeneratorTest, AtomIsAnEmptyDocument) {
 }
 
 TEST(QELFeedPodcastGeneratorTest, NothingFillsAnElementForAtom) {
-  platform::XMLDocument document;
-  const platform::XMLElement feed = document.setRoot("feed");
+  std::string document;
+  platform::XMLWriter writer(document,
+                             {.indentation = ' ', .indentationWidth = 2, .emptyTagEnd = " />"});
+  const platform::XMLElement feed = writer.appendRoot("feed");
   QELPodcastSource source;
   source.setTitle("t");
   QELPopulateAtomElementFromItem(feed, source);
   const auto episode = unorderedEpisode();
   episode->setTitle("t");
   QELPopulateAtomElementFromItem(feed, *episode);
-  EXPECT_EQ(compact(document.serialised()), std::string(kDeclaration) + "<feed />\n");
+  writer.finish();
+  EXPECT_EQ(compact(document), std::string(kDeclaration) + "<feed />\n");
 }
 
 TEST(QELFeedPodcastGeneratorTest, UnknownFormatFailsAndKeepsTheEarlierDocument) {

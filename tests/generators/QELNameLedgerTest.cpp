@@ -19,11 +19,10 @@ std::vector<std::string> reserveAll(const std::vector<std::string>& names) {
 }
 
 TEST(QELNameLedgerTest, Reservations) {
-  struct Row {
+  const struct {
     std::vector<std::string> asked;
     std::vector<std::string> given;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {{"a", "b"}, {"a", "b"}},
       {{"a", "a", "a"}, {"a", "a-2", "a-3"}},
       {{"show", "show", "SHOW"}, {"show", "show-2", "SHOW"}},
@@ -33,7 +32,7 @@ TEST(QELNameLedgerTest, Reservations) {
       {{"a", "a-2", "a-2", "a"}, {"a", "a-2", "a-2-2", "a-3"}},
       {{"", "", ""}, {"", "-2", "-3"}},
   };
-  for (const Row& row : rows) EXPECT_EQ(reserveAll(row.asked), row.given) << row.asked.front();
+  for (const auto& row : rows) EXPECT_EQ(reserveAll(row.asked), row.given) << row.asked.front();
 }
 
 TEST(QELNameLedgerTest, ManyEpisodesOfOneName) {

@@ -11,11 +11,11 @@ namespace {
 
 using namespace std::chrono_literals;
 using platform::Dictionary;
+using platform::OptionalText;
 using platform::PointInTime;
 using platform::PropertyListValue;
 using platform::Text;
 
-using OptionalText = std::optional<Text>;
 using TextGetter = OptionalText (QELEpisode::*)() const;
 using TextSetter = void (QELEpisode::*)(OptionalText);
 
@@ -74,38 +74,31 @@ TEST(QELEpisodeTest, NewEpisodeHasOrderZeroAndNothingElse) {
   EXPECT_EQ(episode->dictionary(), (Dictionary{{"EpisodeOrder", std::int64_t{0}}}));
 }
 
-TEST(QELEpisodeTest, MissingDictionaryGivesAnEmptyRecordWithoutOrder) {
-  for (const auto& episode : {QELEpisode::episodeWithDictionary(nullptr),
-                              QELEpisode::episodeWithFeedDictionary(nullptr)}) {
-    expectAbsent(*episode);
-    EXPECT_EQ(episode->orvaneOrder(), -1);
-    EXPECT_EQ(episode->dictionary(), Dictionary());
-  }
-}
-
-TEST(QELEpisodeTest, EmptyDictionaryGivesAnEmptyRecordWithoutOrder) {
+TEST(QELEpisodeTest, MissingOrEmptyDictionaryGivesAnEmptyRecordWithoutOrder) {
   const Dictionary empty;
-  for (const auto& episode :
-       {QELEpisode::episodeWithDictionary(&empty), QELEpisode::episodeWithFeedDictionary(&empty)}) {
-    expectAbsent(*episode);
-    EXPECT_EQ(episode->orvaneOrder(), -1);
+  for (const Dictionary* dictionary : {static_cast<const Dictionary*>(nullptr), &empty}) {
+    for (const auto& episode : {QELEpisode::episodeWithDictionary(dictionary),
+                                QELEpisode::episodeWithFeedDictionary(dictionary)}) {
+      expectAbsent(*episode);
+      EXPECT_EQ(episode->orvaneOrder(), -1);
+      EXPECT_EQ(episode->dictionary(), Dictionary());
+    }
   }
 }
 
-TEST(QELEpisodeTest, EachReferenceKeyFillsItsField) {
+TEST(QELEpisodeTest, EachKeyFillsItsField) {
   for (const TextField& field : kTextFields) {
-    const Dictionary dictionary{{field.referenceKey, "x"}};
-    EXPECT_EQ((*QELEpisode::episodeWithDictionary(&dictionary).*field.get)(), "x")
+    const Dictionary reference{{field.referenceKey, "x"}};
+    EXPECT_EQ((*QELEpisode::episodeWithDictionary(&reference).*field.get)(), "x")
         << field.referenceKey;
-  }
-}
-
-TEST(QELEpisodeTest, EachFeedKeyFillsItsField) {
-  for (const TextField& field : kTextFields) {
     if (!field.feedKey) continue;
-    const Dictionary dictionary{{field.feedKey, "x"}};
-    EXPECT_EQ((*QELEpisode::episodeWithFeedDictionary(&dictionary).*field.get)(), "x")
-        << field.feedKey;
+    const Dictionary item{{field.feedKey, "x"}};
+    EXPECT_EQ((*QELEpisode::episodeWithFeedDictionary(&item).*field.get)(), "x") << field.feedKey;
+  }
+  for (const Dictionary& item : {Dictionary{{"date", kDate}}, Dictionary{{"", "x"}}}) {
+    EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&item)->date().has_value(),
+              platform::valueForKey(item, "date") != nullptr);
+    EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&item)->referenceType(), std::nullopt);
   }
 }
 
@@ -124,12 +117,12 @@ TEST(QELEpisodeTest, DictionaryHoldsEveryFieldAndReadsBack) {
   const Dictionary dictionary = episode->dictionary();
   EXPECT_EQ(dictionary.size(), std::size(kTextFields) + 3);
   for (const TextField& field : kTextFields) {
-    EXPECT_EQ(dictionary.at(field.referenceKey),
+    EXPECT_EQ(*platform::valueForKey(dictionary, field.referenceKey),
               PropertyListValue(std::string("value of ") + field.referenceKey));
   }
-  EXPECT_EQ(dictionary.at("EpisodeDate"), PropertyListValue(kDate));
-  EXPECT_EQ(dictionary.at("EpisodeOrder"), PropertyListValue(std::int64_t{7}));
-  EXPECT_EQ(dictionary.at("EpisodeFileSize"),
+  EXPECT_EQ(*platform::valueForKey(dictionary, "EpisodeDate"), PropertyListValue(kDate));
+  EXPECT_EQ(*platform::valueForKey(dictionary, "EpisodeOrder"), PropertyListValue(std::int64_t{7}));
+  EXPECT_EQ(*platform::valueForKey(dictionary, "EpisodeFileSize"),
             PropertyListValue(std::uint64_t{18446744073709551615U}));
 
   const auto again = QELEpisode::episodeWithDictionary(&dictionary);
@@ -137,12 +130,11 @@ TEST(QELEpisodeTest, DictionaryHoldsEveryFieldAndReadsBack) {
 }
 
 TEST(QELEpisodeTest, ReferenceTypesAreDerivedOnlyWhereTheyAreMissing) {
-  struct Row {
+  const struct {
     std::optional<const char*> location;
     std::optional<const char*> stored;
     OptionalText type;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {"http://a.example/1.mp3", std::nullopt, "remote"},
       {"FiLe:///a.mp3", std::nullopt, "remote"},
       {"/tmp/a.mp3", std::nullopt, "local"},
@@ -152,7 +144,7 @@ TEST(QELEpisodeTest, ReferenceTypesAreDerivedOnlyWhereTheyAreMissing) {
       {"http://a.example/1.mp3", "", ""},
       {std::nullopt, "Remote", "Remote"},
   };
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     Dictionary dictionary;
     if (row.location) {
       dictionary.emplace("EpisodeReference", *row.location);
@@ -169,11 +161,10 @@ TEST(QELEpisodeTest, ReferenceTypesAreDerivedOnlyWhereTheyAreMissing) {
 }
 
 TEST(QELEpisodeTest, OrdersAreReadAsSignedIntegers) {
-  struct Row {
+  const struct {
     PropertyListValue value;
     std::int64_t order;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {"12abc", 12},
       {"  12abc", 12},
       {"\n\t 3\n", 3},
@@ -187,7 +178,7 @@ TEST(QELEpisodeTest, OrdersAreReadAsSignedIntegers) {
       {"99999999999999999999", INT64_MAX},
       {PropertyListValue::Array{}, -1},
   };
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     const Dictionary feedItem{{"order", row.value}};
     const Dictionary reference{{"EpisodeOrder", row.value}};
     EXPECT_EQ(QELEpisode::episodeWithFeedDictionary(&feedItem)->orvaneOrder(), row.order);
@@ -212,11 +203,10 @@ TEST(QELEpisodeTest, UnknownFileSizeIsNotWritten) {
 }
 
 TEST(QELEpisodeTest, FileSizesAreReadAsUnsignedIntegers) {
-  struct Row {
+  const struct {
     PropertyListValue value;
     std::uint64_t length;
-  };
-  const Row rows[] = {
+  } rows[] = {
       {std::int64_t{5}, 5},
       {std::uint64_t{18446744073709551615U}, 18446744073709551615U},
       {std::int64_t{-5}, 0},
@@ -224,7 +214,7 @@ TEST(QELEpisodeTest, FileSizesAreReadAsUnsignedIntegers) {
       {true, 0},
       {PropertyListValue::Array{}, 0},
   };
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     const Dictionary reference{{"EpisodeFileSize", row.value}};
     const Dictionary feedItem{{"contentLength", row.value}};
     EXPECT_EQ(QELEpisode::episodeWithDictionary(&reference)->contentLength(), row.length);

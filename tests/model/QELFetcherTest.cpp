@@ -46,6 +46,16 @@ class QELFetcherTest : public testing::Test {
     return printed(succeeds, [&] { return podcast_.savePosterToPath(target_); });
   }
 
+  /// Gives the episode's media and all posters the location and the reference type.
+  void setLocations(const Text& location, const platform::OptionalText& type) {
+    episode_->setLocation(location);
+    episode_->setReferenceType(type);
+    episode_->setPosterLocation(location);
+    episode_->setPosterReferenceType(type);
+    podcast_.setPosterLocation(location);
+    podcast_.setPosterReferenceType(type);
+  }
+
   TemporaryDirectory directory_;
   const std::string file_;
   const std::string target_;
@@ -62,17 +72,14 @@ TEST_F(QELFetcherTest, WithoutLocationNothingIsFetched) {
 }
 
 TEST_F(QELFetcherTest, AnythingButRemoteIsCopied) {
-  for (const std::optional<Text>& type :
-       {std::optional<Text>("local"), std::optional<Text>("Remote"), std::optional<Text>(),
-        std::optional<Text>("")}) {
-    podcast_.setPosterReferenceType(type);
-    podcast_.setPosterLocation(Text(file_));
+  for (const platform::OptionalText& type :
+       {platform::OptionalText("local"), platform::OptionalText("Remote"), platform::OptionalText(),
+        platform::OptionalText("")}) {
+    setLocations(Text(file_), type);
     EXPECT_EQ(savePodcastPoster(true), "");
     EXPECT_EQ(contentOf(target_), "content");
     std::remove(target_.c_str());
-
-    episode_->setReferenceType(type);
-    episode_->setLocation(Text(server_.url("/media")));
+    setLocations(Text(server_.url("/media")), type);
     EXPECT_EQ(saveEpisode(false), "");
   }
   EXPECT_EQ(server_.connections(), 0);
@@ -80,13 +87,11 @@ TEST_F(QELFetcherTest, AnythingButRemoteIsCopied) {
 
 TEST_F(QELFetcherTest, CopyDoesNotOverwriteAndDownloadDoes) {
   directory_.addFile("target", "earlier");
-  episode_->setLocation(Text(file_));
-  episode_->setReferenceType("local");
+  setLocations(Text(file_), "local");
   EXPECT_EQ(saveEpisode(false), "");
   EXPECT_EQ(contentOf(target_), "earlier");
 
-  episode_->setLocation(Text("file://" + file_));
-  episode_->setReferenceType("remote");
+  setLocations(Text("file://" + file_), "remote");
   EXPECT_EQ(saveEpisode(true),
             "[N] Downloading episode entitled \"E\" (0 bytes)...\n  -- 7 / 7 (100.0%)\n");
   EXPECT_EQ(contentOf(target_), "content");
@@ -94,11 +99,8 @@ TEST_F(QELFetcherTest, CopyDoesNotOverwriteAndDownloadDoes) {
 
 TEST_F(QELFetcherTest, RemoteLocationThatIsNoURLFailsSilently) {
   for (const char* location : {"http://a b/", "nothing", ""}) {
-    episode_->setLocation(location);
-    episode_->setReferenceType("remote");
+    setLocations(location, "remote");
     EXPECT_EQ(saveEpisode(false), "") << location;
-    podcast_.setPosterLocation(location);
-    podcast_.setPosterReferenceType("remote");
     EXPECT_EQ(savePodcastPoster(false), "") << location;
   }
 }
@@ -106,27 +108,33 @@ TEST_F(QELFetcherTest, RemoteLocationThatIsNoURLFailsSilently) {
 TEST_F(QELFetcherTest, FailedDownloadPrintsItsNoticeOnly) {
   directory_.addFile("target", "earlier");
   episode_->setContentLength(7);
-  episode_->setLocation(Text(server_.url("/missing")));
-  episode_->setReferenceType("remote");
+  setLocations(Text(server_.url("/missing")), "remote");
   EXPECT_EQ(saveEpisode(false), "[N] Downloading episode entitled \"E\" (7 bytes)...\n");
   EXPECT_EQ(episode_->contentLength(), 7U);
-  episode_->setPosterLocation(Text(server_.url("/missing")));
-  episode_->setPosterReferenceType("remote");
   EXPECT_EQ(saveEpisodePoster(false), "[N] Downloading poster for episode entitled \"E\"...\n");
-  podcast_.setPosterLocation(Text(server_.url("/missing")));
-  podcast_.setPosterReferenceType("remote");
   EXPECT_EQ(savePodcastPoster(false), "[N] Downloading poster for podcast entitled \"P\"...\n");
   EXPECT_EQ(contentOf(target_), "earlier");
+}
+
+TEST_F(QELFetcherTest, AFailureDoesNotLastUntilTheNextFetch) {
+  setLocations(Text(server_.url("/missing")), "remote");
+  saveEpisode(false);
+  setLocations(Text("file://" + file_), "remote");
+  saveEpisode(true);
+  setLocations(Text(server_.url("/missing")), "remote");
+  saveEpisode(false);
 }
 
 TEST_F(QELFetcherTest, NoticeShowsTheSizeKnownBeforeAndTheCounterTheAnnouncedOne) {
   server_.serve("/media", HTTPTestServer::response("12345"));
   episode_->setContentLength(77);
-  episode_->setLocation(Text(server_.url("/media")));
-  episode_->setReferenceType("remote");
+  setLocations(Text(server_.url("/media")), "remote");
   EXPECT_EQ(saveEpisode(true),
             "[N] Downloading episode entitled \"E\" (77 bytes)...\n  -- 5 / 5 (100.0%)\n");
   EXPECT_EQ(episode_->contentLength(), 5U);
+  // The counter of each fetch begins at 0.
+  EXPECT_EQ(saveEpisode(true),
+            "[N] Downloading episode entitled \"E\" (5 bytes)...\n  -- 5 / 5 (100.0%)\n");
 }
 
 TEST_F(QELFetcherTest, UnknownLengthsLeaveTheCounterOut) {
@@ -134,8 +142,7 @@ TEST_F(QELFetcherTest, UnknownLengthsLeaveTheCounterOut) {
     connection.send("HTTP/1.1 200 OK\r\n\r\n12345");
     connection.close();
   });
-  episode_->setLocation(Text(server_.url("/media")));
-  episode_->setReferenceType("remote");
+  setLocations(Text(server_.url("/media")), "remote");
   EXPECT_EQ(saveEpisode(true), "[N] Downloading episode entitled \"E\" (0 bytes)...\n");
   EXPECT_EQ(episode_->contentLength(), 0U);
 
@@ -146,19 +153,13 @@ TEST_F(QELFetcherTest, UnknownLengthsLeaveTheCounterOut) {
   EXPECT_EQ(episode_->contentLength(), 2U);
 }
 
-TEST_F(QELFetcherTest, SizeOfAPosterReplacesTheEpisodesWithoutACounter) {
+TEST_F(QELFetcherTest, PostersAreDownloadedWithoutACounter) {
   server_.serve("/poster", HTTPTestServer::response("123"));
   episode_->setContentLength(77);
-  episode_->setPosterLocation(Text(server_.url("/poster")));
-  episode_->setPosterReferenceType("remote");
+  setLocations(Text(server_.url("/poster")), "remote");
   EXPECT_EQ(saveEpisodePoster(true), "[N] Downloading poster for episode entitled \"E\"...\n");
-  EXPECT_EQ(episode_->contentLength(), 3U);
-}
-
-TEST_F(QELFetcherTest, PodcastPosterIsDownloaded) {
-  server_.serve("/poster", HTTPTestServer::response("123"));
-  podcast_.setPosterLocation(Text(server_.url("/poster")));
-  podcast_.setPosterReferenceType("remote");
+  EXPECT_EQ(episode_->contentLength(), 3U);  // that of the poster
+  std::remove(target_.c_str());
   EXPECT_EQ(savePodcastPoster(true), "[N] Downloading poster for podcast entitled \"P\"...\n");
   EXPECT_EQ(contentOf(target_), "123");
 }

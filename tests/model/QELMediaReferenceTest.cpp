@@ -24,8 +24,8 @@ TEST(QELMediaReferenceTest, ExactlyRemoteLocationsThatAreURLsHaveOne) {
   for (const auto& row : rows) {
     const QELMediaReference reference(row.location, row.referenceType);
     EXPECT_EQ(reference.location, row.location);
-    EXPECT_EQ(reference.isRemote, row.isRemote) << row.location.value_or("(absent)");
-    EXPECT_EQ(reference.url.has_value(), row.hasURL) << row.location.value_or("(absent)");
+    EXPECT_EQ(reference.isRemote, row.isRemote) << testing::PrintToString(row.location);
+    EXPECT_EQ(reference.url.has_value(), row.hasURL) << testing::PrintToString(row.location);
   }
 }
 

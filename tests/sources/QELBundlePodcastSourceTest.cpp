@@ -7,6 +7,7 @@
 #include <memory>
 #include <string>
 
+#include "model/QELPodcastKeys.h"
 #include "platform/plist/PropertyListWriter.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
@@ -53,16 +54,13 @@ class QELBundlePodcastSourceTest : public testing::Test {
 };
 
 TEST_F(QELBundlePodcastSourceTest, WhatIsNoBundleGivesNoSource) {
-  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "nowhere.podcast").string()),
-            nullptr);
   fs::create_directories(directory() / "empty.podcast");
-  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "empty.podcast").string()),
-            nullptr);
-  std::ofstream(directory() / "file.podcast") << "text";
-  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "file.podcast").string()), nullptr);
   fs::create_directories(directory() / "bad.podcast");
   std::ofstream(directory() / "bad.podcast" / "Info.plist") << "text";
-  EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / "bad.podcast").string()), nullptr);
+  std::ofstream(directory() / "file.podcast") << "text";
+  for (const char* name : {"nowhere.podcast", "empty.podcast", "bad.podcast", "file.podcast"}) {
+    EXPECT_EQ(QELBundlePodcastSource::initWithPath((directory() / name).string()), nullptr) << name;
+  }
 }
 
 TEST_F(QELBundlePodcastSourceTest, SourceWithoutPathOrReferenceFileFailsWithCodeOne) {
@@ -80,26 +78,17 @@ TEST_F(QELBundlePodcastSourceTest, SourceWithoutPathOrReferenceFileFailsWithCode
 }
 
 TEST_F(QELBundlePodcastSourceTest, DescriptiveFieldsComeFromTheReferenceFile) {
-  const auto source = loaded(bundle({{"PodcastUUID", "u"},
-                                     {"PodcastName", "t"},
-                                     {"PodcastAuthor", "a"},
-                                     {"PodcastCopyright", "c"},
-                                     {"PodcastKeywords", "k"},
-                                     {"PodcastCategory", "g"},
-                                     {"PodcastDescription", "d"},
-                                     {"PodcastAdvisoryLabel", "l"},
-                                     {"PodcastReference", "http://a.example/"},
-                                     {"PodcastReferenceType", "remote"},
-                                     {"AllowedPosterTypes", PropertyListValue::Array{"png"}},
-                                     {"AllowedEpisodeTypes", PropertyListValue::Array{"mp3"}}}));
-  EXPECT_EQ(source->uuid(), "u");
-  EXPECT_EQ(source->title(), "t");
-  EXPECT_EQ(source->author(), "a");
-  EXPECT_EQ(source->copyright(), "c");
-  EXPECT_EQ(source->keywords(), "k");
-  EXPECT_EQ(source->category(), "g");
-  EXPECT_EQ(source->podcastDescription(), "d");
-  EXPECT_EQ(source->advisoryLabel(), "l");
+  Dictionary dictionary{{"PodcastReference", "http://a.example/"},
+                        {"PodcastReferenceType", "remote"},
+                        {"AllowedPosterTypes", PropertyListValue::Array{"png"}},
+                        {"AllowedEpisodeTypes", PropertyListValue::Array{"mp3"}}};
+  for (const QELPodcastKey& field : QELPodcastDescriptiveKeys()) {
+    dictionary.emplace(field.key, platform::Text(field.key));
+  }
+  const auto source = loaded(bundle(dictionary));
+  for (const QELPodcastKey& field : QELPodcastDescriptiveKeys()) {
+    EXPECT_EQ((*source.*field.value)(), field.key);
+  }
   EXPECT_EQ(source->location(), (directory() / "a.podcast").string());
   EXPECT_EQ(source->referenceType(), "local");
   EXPECT_EQ(source->posterLocation(), std::nullopt);
@@ -143,6 +132,19 @@ TEST_F(QELBundlePodcastSourceTest, LocationsAreRebasedAndEpisodePostersAreNot) {
   EXPECT_EQ(episodes[1]->referenceType(), "local");
   EXPECT_EQ(episodes[2]->location(), std::nullopt);
   EXPECT_EQ(episodes[2]->referenceType(), "remote");
+}
+
+TEST_F(QELBundlePodcastSourceTest, LoadingAgainRebasesTheSameEpisodesAgain) {
+  const std::string path =
+      bundle({{"PodcastPosterReference", "p.jpg"},
+              {"Episodes", PropertyListValue::Array{Dictionary{{"EpisodeReference", "a.mp3"}}}}});
+  const auto source = loaded(path);
+  const auto episodes = source->episodes();
+  platform::ErrorSlot error;
+  EXPECT_TRUE(source->loadSourceWithError(error));
+  EXPECT_EQ(source->episodes(), episodes);
+  EXPECT_EQ(episodes->at(0)->location(), platform::Text(path + path + "/a.mp3"));
+  EXPECT_EQ(source->posterLocation(), platform::Text(path + "/p.jpg"));
 }
 
 TEST_F(QELBundlePodcastSourceTest, RemotePosterIsJoinedLikeAPath) {

@@ -79,6 +79,15 @@ TEST(QELReferenceFilePodcastSourceTest, EmptyEpisodesGiveAnEmptyList) {
   EXPECT_TRUE(source->episodes()->empty());
 }
 
+TEST(QELReferenceFilePodcastSourceTest, MissingEpisodesLeaveTheListAsItWas) {
+  QELReferenceFilePodcastSource source(std::make_shared<const Dictionary>());
+  const auto earlier = std::make_shared<QELEpisodeList>();
+  source.setEpisodes(earlier);
+  platform::ErrorSlot error;
+  EXPECT_TRUE(source.loadSourceWithError(error));
+  EXPECT_EQ(source.episodes(), earlier);
+}
+
 TEST(QELReferenceFilePodcastSourceTest, AllowedTypesAreListsOfTexts) {
   const auto source = loaded(
       {{"AllowedPosterTypes", PropertyListValue::Array{"png", std::int64_t{3}, Dictionary{}}},

@@ -1,5 +1,7 @@
 #include "tests/support/PropertyListDump.h"
 
+#include <gtest/gtest.h>
+
 #include <array>
 #include <charconv>
 #include <chrono>
@@ -8,6 +10,8 @@
 #include <string_view>
 #include <utility>
 #include <variant>
+
+#include "platform/plist/PropertyListReader.h"
 
 namespace {
 
@@ -87,4 +91,22 @@ std::string dumped(const PropertyListValue& value) {
   std::string output;
   std::visit(Dumper{output}, value.storage());
   return output;
+}
+
+std::string readOutcome(std::string_view bytes) {
+  std::optional<platform::PropertyListFault> fault;
+  const auto value = platform::readPropertyList(std::string(bytes), fault);
+  EXPECT_NE(value.has_value(), fault.has_value());
+  if (value) return dumped(*value);
+  if (!fault) return "neither a value nor a fault";
+  if (fault->position) return fault->description + " at " + fault->position->text();
+  if (fault->object) {
+    return "object " + std::to_string(*fault->object) + ": " + fault->description;
+  }
+  return fault->description;
+}
+
+void expectOutcomes(const std::vector<PropertyListRow>& rows) {
+  for (const PropertyListRow& row : rows)
+    EXPECT_EQ(readOutcome(row.bytes), row.outcome) << row.name;
 }

@@ -3,9 +3,23 @@
 #include <linux/filter.h>
 #include <linux/seccomp.h>
 #include <sys/prctl.h>
+#include <sys/syscall.h>
 
 #include <array>
 #include <cstddef>
+
+/// What poll calls; newer processors never had a call of that name.
+#ifdef SYS_poll
+inline constexpr long kPollCall = SYS_poll;
+#else
+inline constexpr long kPollCall = SYS_ppoll;
+#endif
+
+/// Whether system calls can be refused here; an emulator of another processor cannot do without any.
+inline bool canRefuseSystemCalls() {
+  return ::prctl(PR_GET_SECCOMP) >= 0;
+}
+inline constexpr const char* kCannotRefuse = "system calls cannot be refused here";
 
 /// Makes a system call fail with the given errno for the rest of this process, as a file system or
 /// kernel without it would. False where the kernel does not allow that.

@@ -4,13 +4,11 @@
 
 namespace {
 
-struct Row {
-  std::optional<std::string_view> location;
-  std::optional<platform::Text> type;
-};
-
 TEST(QELReferenceTypeTest, ClassesLocations) {
-  const Row rows[] = {
+  const struct {
+    std::optional<std::string_view> location;
+    platform::OptionalText type;
+  } rows[] = {
       {std::nullopt, std::nullopt},
       {"", std::nullopt},
       {"http://a.example/1.mp3", "remote"},
@@ -28,7 +26,7 @@ TEST(QELReferenceTypeTest, ClassesLocations) {
       {" http://a.example/", "local"},
       {"\xE2\x84\xAA", "local"},  // one character that takes three bytes
   };
-  for (const Row& row : rows) {
+  for (const auto& row : rows) {
     EXPECT_EQ(QELReferenceType(row.location), row.type) << row.location.value_or("(absent)");
   }
 }

@@ -9,26 +9,21 @@ import unittest
 
 from support import ToolTestCase
 
-TEXTS = {
-    "plain": "Night Walks",
-    "empty": "",
-    "a space": " ",
-    "leading and trailing white space": "  \t a \n ",
-    "line breaks": "one\ntwo\n\nthree",
-    "carriage returns": "one\rtwo\r\nthree\r",
-    "tabs": "\tone\t\ttwo\t",
-    "markup": "<b>Tom & 'Jerry'</b> \"quoted\" ]]> <![CDATA[x]]> <!-- c --> &amp;amp; &#13;",
-    "beyond ASCII": "Füße, Œuvre, naïve",
-    "an emoji": "🚶🏽‍♀️ 👨‍👩‍👧 🇩🇪",
-    "combining marks": "e\u0301 a\u0308\u0323 \u1e69",
-    "composed and decomposed": "\u00e9 e\u0301",
-    "right to left": "שלום \u202eabc\u202c مرحبا",
-    "east Asian": "夜の散歩 밤 산책 夜间散步",
-    "unusual spaces": "\u00a0a\u2003b\u2028c\u2029d\u0085e\ufefff",
-    "the ends of the planes": "\ud7ff\ue000\ufffd\U00010000\U0010ffff",
-    "control characters of XML 1.0": "a\x7f\x80\x9fb",
-    "format characters": "%@ %s %n %d %% 100%",
-}
+# Whatever the unit tests of the writers try alone: all at once, nothing and a space.
+TEXTS = ("", " ", "".join((
+    "  \t a \n ",
+    "one\ntwo\n\nthree",
+    "one\rtwo\r\nthree\r",
+    "\tone\t\ttwo\t",
+    "<b>Tom & 'Jerry'</b> \"quoted\" ]]> <![CDATA[x]]> <!-- c --> &amp;amp; &#13;",
+    "Füße, Œuvre, naïve, \u00e9 e\u0301 a\u0308\u0323 \u1e69",
+    "🚶🏽‍♀️ 👨‍👩‍👧 🇩🇪",
+    "שלום \u202eabc\u202c مرحبا",
+    "夜の散歩 밤 산책 夜间散步",
+    "\u00a0a\u2003b\u2028c\u2029d\u0085e\ufefff",
+    "\ud7ff\ue000\ufffd\U00010000\U0010ffff\x7f\x80\x9f",
+    "%@ %s %n %d %% 100% \n ",
+)))
 
 # What a feed can carry of a podcast and of an episode, apart from dates and numbers.
 PODCAST_TEXT_KEYS = ("PodcastUUID", "PodcastName", "PodcastAuthor", "PodcastCopyright", "PodcastKeywords",
@@ -119,8 +114,8 @@ class FieldTest(RoundTripTestCase):
 
 class TextTest(RoundTripTestCase):
     def test_any_text_comes_back_in_every_field(self):
-        for name, text in TEXTS.items():
-            with self.subTest(name):
+        for text in TEXTS:
+            with self.subTest(text):
                 podcast = {**dict.fromkeys(PODCAST_TEXT_KEYS, text), "Episodes": [
                     {**dict.fromkeys(EPISODE_TEXT_KEYS, text), "EpisodeReference": "x" + text,
                      "EpisodeReferenceType": "local",
@@ -128,24 +123,12 @@ class TextTest(RoundTripTestCase):
                 podcast |= {"PodcastPosterReference": "x" + text, "PodcastPosterReferenceType": "local"}
                 self.assertEqual(self.through_feed(podcast), podcast)
 
-    def test_any_text_comes_back_from_a_reference_file(self):
-        for name, text in TEXTS.items():
-            with self.subTest(name):
-                podcast = {"PodcastName": text, "Episodes": [{"EpisodeName": text}]}
-                first = self.run_tool("parsefeed", self.reference(podcast, fmt=plistlib.FMT_BINARY))
-                self.assertSucceeds(first)
-                self.assertEqual(plistlib.loads(first.stdout), podcast)
-                self.assertEqual(self.parsefeed(self.write("written.plist", first.stdout)), podcast)
-
     def test_characters_that_xml_cannot_hold_are_dropped(self):
-        forbidden = "".join(map(chr, [*range(1, 9), 11, 12, *range(14, 32), 0xfffe, 0xffff]))
-        for name, text, expected in (("all", f"a{forbidden}b", "ab"), ("one", "a\x01b", "ab"), ("alone", "\x1f", ""),
-                                     ("between breaks", "a\r\x0b\n\x0cb", "a\r\nb"), ("nul", "a\0b", "ab")):
-            podcast = {"PodcastName": text, "PodcastCategory": text, "Episodes": [{"EpisodeName": text}]}
-            kept = {"PodcastName": expected, "PodcastCategory": expected, "Episodes": [{"EpisodeName": expected}]}
-            with self.subTest(name):
-                self.assertEqual(self.parsefeed(self.reference(podcast, fmt=plistlib.FMT_BINARY)), kept)
-                self.assertEqual(self.through_feed(podcast), kept)
+        forbidden = "".join(map(chr, [*range(9), 11, 12, *range(14, 32), 0xfffe, 0xffff]))
+        podcast = {"PodcastName": f"a{forbidden}b", "PodcastCategory": "\x1f", "PodcastAuthor": "a\r\x0b\n\x0cb"}
+        kept = {"PodcastName": "ab", "PodcastCategory": "", "PodcastAuthor": "a\r\nb"}
+        self.assertEqual(self.parsefeed(self.reference(podcast, fmt=plistlib.FMT_BINARY)), kept)
+        self.assertEqual(self.through_feed(podcast), kept)
 
     def test_20_megabytes_in_one_text(self):
         for name, piece in (("ASCII", "0123456789abcde\n"), ("markup", "<&>\r\t\"']]>"), ("three bytes each", "夜の散歩")):

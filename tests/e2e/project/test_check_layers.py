@@ -1,12 +1,15 @@
 """The layering check finds each kind of breach, and says where it is."""
 
+import ast
+import re
 import subprocess
 import sys
 import tempfile
 import unittest
 from pathlib import Path
 
-CHECK = Path(__file__).resolve().parents[3] / "scripts" / "check-layers"
+ROOT = Path(__file__).resolve().parents[3]
+CHECK = ROOT / "scripts" / "check-layers"
 
 SOUND = {
     "platform/text/Text.h": "#pragma once\n\n#include <string>\n",
@@ -91,6 +94,14 @@ class CheckLayersTest(unittest.TestCase):
                 status, lines = check(SOUND | files)
                 self.assertEqual(status, 1)
                 self.assertIn(line, lines)
+
+    def test_the_manual_shows_the_table_that_is_checked(self):
+        checked = ast.literal_eval(re.search(r"(?ms)^MAY_INCLUDE = (.*?^})", CHECK.read_text(encoding="utf-8"))[1]
+                                   .replace("set()", "()"))
+        text = (ROOT / "CONTRIBUTING.md").read_text(encoding="utf-8")
+        rows = re.findall(r"(?m)^\| `([^`|]+)/` \| [^|]+ \| ([^|]+) \|$", text)
+        shown = {room: set(re.findall(r"`(.+?)/`", rooms)) for room, rooms in rows}
+        self.assertEqual(shown, {room: set(rooms) for room, rooms in checked.items()})
 
     def test_a_tree_without_sources_is_no_success(self):
         self.assertEqual(check({})[0], 1)

@@ -18,7 +18,8 @@ from support import ToolTestCase, environment, has_gnu_parallel, tool
 
 ROOT = Path(__file__).resolve().parents[3]
 MANUAL_PAGE = ROOT / "docs" / "qel.1"
-PAGES = [ROOT / "README.md", *sorted((ROOT / "docs").glob("*.md"))]
+INSTALLED_README = ROOT / "packaging" / "installed-readme.md"
+PAGES = [ROOT / "README.md", INSTALLED_README, *sorted((ROOT / "docs").glob("*.md"))]
 DOCUMENTS = [*PAGES, MANUAL_PAGE]
 FLEET = ROOT / "docs" / "fleet.md"
 
@@ -177,7 +178,7 @@ class DocumentationTest(ToolTestCase):
     def test_commands_work_as_typed(self):
         counts = {document.name: self.check_commands(document) for document in DOCUMENTS if document != FLEET}
         # A document without such a block would pass unread.
-        for name in ("README.md", "bundle.md", "feeds.md", "reference-file.md", MANUAL_PAGE.name):
+        for name in ("README.md", INSTALLED_README.name, "bundle.md", "feeds.md", "reference-file.md", MANUAL_PAGE.name):
             self.assertGreater(counts[name], 0, name)
 
     @unittest.skipUnless(has_gnu_parallel(), "GNU parallel is not installed")
@@ -189,10 +190,32 @@ class DocumentationTest(ToolTestCase):
         for document in [*PAGES, ROOT / "CONTRIBUTING.md"]:
             for path, heading in link.findall(document.read_text(encoding="utf-8")):
                 with self.subTest(document=document.name, link=f"{path}#{heading}"):
-                    target = (document.parent / path).resolve() if path else document
+                    folder = ROOT if document == INSTALLED_README else document.parent
+                    target = (folder / path).resolve() if path else document
                     self.assertTrue(target.exists())
                     if heading:
                         self.assertIn(heading, headings(target))
+
+    def test_sources_that_are_named_exist(self):
+        for document in (ROOT / "CONTRIBUTING.md", *PAGES):
+            for name in re.findall(r"`([a-z]+/[\w/-]+\.(?:h|cpp|cmake|py))`", document.read_text(encoding="utf-8")):
+                if "NAME" not in name:
+                    with self.subTest(f"{document.name}: {name}"):
+                        self.assertTrue((ROOT / name).exists())
+
+    def test_the_tests_that_hold_the_promises_exist(self):
+        text = (ROOT / "docs" / "reliability.md").read_text(encoding="utf-8")
+        tests = set(re.findall(r"`(test_\w+)(?:\.(\w+))?(?:\.(\w+))?`", text))
+        suites = set(re.findall(r"`(?:fuzz\.(\w+)|(\w+)Test)`", text))
+        self.assertTrue(tests and suites)
+        for module, case, method in tests:
+            with self.subTest(module=module, case=case, method=method):
+                (file,) = (ROOT / "tests" / "e2e").glob(f"*/{module}.py")
+                self.assertRegex(file.read_text(encoding="utf-8"), rf"(?s)class {case}\b.*def {method}\b")
+        for target, unit in suites:
+            with self.subTest(fuzz=target, unit=unit):
+                pattern = f"fuzz/{target}Fuzz.cpp" if target else f"tests/**/{unit}Test.cpp"
+                self.assertEqual(len(list(ROOT.glob(pattern))), 1)
 
 
 def headings(document):

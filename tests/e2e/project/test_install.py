@@ -17,7 +17,7 @@ INSTALLED = {
     "share/bash-completion/completions/qel": "packaging/completions/qel.bash",
     "share/zsh/site-functions/_qel": "packaging/completions/_qel",
     "share/fish/vendor_completions.d/qel.fish": "packaging/completions/qel.fish",
-    DOCUMENTATION + "README.md": "README.md",
+    DOCUMENTATION + "README.md": "packaging/installed-readme.md",
     DOCUMENTATION + "CHANGELOG.md": "CHANGELOG.md",
     DOCUMENTATION + "CONTRIBUTING.md": "CONTRIBUTING.md",
 }

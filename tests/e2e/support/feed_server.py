@@ -68,33 +68,20 @@ class FeedServer:
         return self.route(path, lambda exchange: exchange.reply(status, body, headers))
 
     def redirect(self, path, location, status=302, headers=()):
-        """Redirects to the location as it is written; without a Location header when it is None."""
-        fields = list(headers) + ([("Location", location)] if location is not None else [])
-        return self.serve(path, b"moved", status, fields)
+        """Redirects to the location as it is written."""
+        return self.serve(path, b"moved", status, [*headers, ("Location", location)])
 
-    def redirect_chain(self, path, length, last):
-        """Serves path/0, which redirects `length` times and so ends at the route `last`."""
-        for number in range(length):
-            following = f"{path}/{number + 1}" if number + 1 < length else last
-            self.redirect(f"{path}/{number}", following)
-        return self.url(f"{path}/0" if length else last)
+    def compressed(self, path, body):
+        """Serves the body compressed by gzip."""
+        return self.serve(path, gzip.compress(body), headers=[("Content-Encoding", "gzip")])
 
-    def compressed(self, path, body, cut=0):
-        """Serves the body compressed by gzip; the last `cut` bytes of the compressed form never come, and
-        the announced length does not tell."""
-        packed = gzip.compress(body)
-        return self.serve(path, packed[:len(packed) - cut], headers=[("Content-Encoding", "gzip")])
-
-    def chunked(self, path, chunks, finished=True, headers=()):
-        """Serves the body in chunks; an unfinished one lacks the last, empty chunk."""
+    def chunked(self, path, chunks, headers=()):
+        """Serves the body in chunks."""
         def answer(exchange):
             exchange.head(200, [("Transfer-Encoding", "chunked"), *headers])
             for chunk in chunks:
                 exchange.send(b"%x\r\n%s\r\n" % (len(chunk), chunk))
-            if finished:
-                exchange.send(b"0\r\n\r\n")
-            else:
-                exchange.close()
+            exchange.send(b"0\r\n\r\n")
         return self.route(path, answer)
 
     def truncated(self, path, body, missing):
@@ -122,22 +109,12 @@ class FeedServer:
                 exchange.send(body[start:start + piece])
         return self.route(path, answer)
 
-    def reset(self, path, before=b""):
-        """Sends the bytes, whatever they are, and resets the connection."""
-        def answer(exchange):
-            exchange.send(before)
-            exchange.reset()
-        return self.route(path, answer)
-
     def raw(self, path, answer_bytes):
         """Sends the bytes, whatever they are, and closes the connection."""
         def answer(exchange):
             exchange.send(answer_bytes)
             exchange.close()
         return self.route(path, answer)
-
-    def empty_reply(self, path):
-        return self.raw(path, b"")
 
 
 class Exchange:

@@ -5,7 +5,6 @@ downloads alike and have the same outcome. `python3 lies.py` prints the catalogu
 """
 
 import gzip
-import itertools
 import time
 import zlib
 from typing import Callable, NamedTuple, Union
@@ -382,17 +381,12 @@ LIES = {
 }
 
 
-def rows():
-    """All lies, with their sections."""
-    return [(section, lie) for section, lies in LIES.items() for lie in lies]
-
-
 def table():
     """The catalogue in Markdown."""
     lines = ["| what the server does | a feed is | media and posters are |", "|---|---|---|"]
-    for section, lies in itertools.groupby(rows(), key=lambda row: row[0]):
+    for section, lies in LIES.items():
         lines.append(f"| **{section}** | | |")
-        for _, lie in lies:
+        for lie in lies:
             feed = lie.feed if lie.feed is READ else f"refused: `{lie.feed}`"
             outcome = lie.outcome
             if isinstance(outcome, bytes):

@@ -25,6 +25,7 @@ ORVANE = "{https://orvane.example/ns/podcast-1.0}"
 QEL_NAMESPACE = "{https://qel.example/ns/1.0}"
 
 LOADING = b"[N] Loading/interpreting source...\n"
+NO_FEED = "Could not load source: The feed was neither RSS nor Atom"
 
 # A sanitizer that finds a fault ends the tool with this status, which the tool itself never uses.
 SANITIZER_STATUS = 99
@@ -110,7 +111,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     if memory_limit is not None:
         if is_sanitized():
             env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
-        else:
+        elif not is_emulated():  # most would be the emulator's own
             shell.insert(0, f"ulimit -v {memory_limit >> 10} &&")
     if len(shell) > 1:  # a shell prepares the process: Python's own way is unsafe beside a server's threads
         prefix = ("/bin/sh", "-c", " ".join(shell), *prefix)
@@ -123,6 +124,11 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
 def is_sanitized():
     """Whether the executable has its own idea of the address space, which a limit would break."""
     return b"__asan_init" in Path(tool()).read_bytes()
+
+
+def is_emulated():
+    """Whether the tool is for another processor, so that a script starts it."""
+    return Path(tool()).read_bytes().startswith(b"#!")
 
 
 def unprivileged(directory):
@@ -280,6 +286,15 @@ class ToolTestCase(unittest.TestCase):
         """Exit status 1, exactly the message on standard error and exactly stdout on standard output."""
         expected = message if isinstance(message, bytes) else message.encode()
         self.assertEqual(result, Result(1, stdout, expected))
+
+    def assertInvalidSource(self, source, **options):
+        """The source begins like a URL and is none."""
+        self.assertFails(self.run_tool("parsefeed", source, **options), f'"{source}" is not a valid podcast source.\n')
+
+    def assertNoSource(self, source, **options):
+        """The source names neither a reference file nor a bundle."""
+        self.assertFails(self.run_tool("parsefeed", source, **options),
+                         f'Could not initialize podcast source with string "{source}".\n')
 
     def assertLoadFails(self, result, pattern=r".+", stdout=b""):
         """A failed load whose description, one that is not the tool's own, matches the whole pattern."""

@@ -17,7 +17,6 @@ from support import is_sanitized
 
 MEMORY = 300 << 20
 EARLIER = b"the file of an earlier run"
-PODCAST = {"PodcastName": "Night Walks"}
 
 
 class Servers:
@@ -162,8 +161,9 @@ class LieTest(BundleTestCase):
 class TableTest(unittest.TestCase):
     def test_it_is_printed_with_a_row_for_each_lie(self):
         printed = subprocess.run([sys.executable, "-B", lies.__file__], check=True, capture_output=True).stdout.decode()
-        self.assertEqual(printed.count("\n"), 2 + len(lies.LIES) + len(lies.rows()))
-        for _, lie in lies.rows():
+        told = [lie for section in lies.LIES.values() for lie in section]
+        self.assertEqual(printed.count("\n"), 2 + len(lies.LIES) + len(told))
+        for lie in told:
             self.assertIn(f"\n| {lie.name} | ", printed)
 
     def test_every_lie_has_a_name_of_its_own_in_its_section(self):

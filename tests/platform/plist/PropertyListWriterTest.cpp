@@ -31,9 +31,9 @@ std::string written(const Dictionary& dictionary) {
 }
 
 PropertyListValue readBack(std::string_view bytes) {
-  ErrorSlot error;
-  auto value = readPropertyList(std::string(bytes), error);
-  EXPECT_TRUE(value) << error->description;
+  std::optional<PropertyListFault> fault;
+  auto value = readPropertyList(std::string(bytes), fault);
+  EXPECT_TRUE(value) << fault->description;
   return value ? std::move(*value) : PropertyListValue("nothing was read");
 }
 
@@ -74,7 +74,7 @@ TEST(PropertyListWriterTest, IndentsByTabsAndSortsKeys) {
   const Dictionary podcast = {{"PodcastName", "Orbit"},
                               {"Episodes", PropertyListValue::Array{episode, Dictionary()}},
                               {"AllowedPosterTypes", PropertyListValue::Array()},
-                              {"a<b", true}};
+                              {"a<b", ""}};
   EXPECT_EQ(written(podcast), kProlog +
                                   "<dict>\n"
                                   "\t<key>AllowedPosterTypes</key>\n"
@@ -94,7 +94,7 @@ TEST(PropertyListWriterTest, IndentsByTabsAndSortsKeys) {
                                   "\t<key>PodcastName</key>\n"
                                   "\t<string>Orbit</string>\n"
                                   "\t<key>a&lt;b</key>\n"
-                                  "\t<true/>\n"
+                                  "\t<string></string>\n"
                                   "</dict>\n"
                                   "</plist>\n");
 }
@@ -104,8 +104,6 @@ TEST(PropertyListWriterTest, WritesEveryKindOfValueSoThatItReadsBack) {
     PropertyListValue value;
     const char* line;
   };
-  using Data = PropertyListValue::Data;
-  constexpr auto kInfinity = std::numeric_limits<double>::infinity();
   for (const Row& row : std::vector<Row>{
            {"", "<string></string>"},
            {"Pilot", "<string>Pilot</string>"},
@@ -113,70 +111,22 @@ TEST(PropertyListWriterTest, WritesEveryKindOfValueSoThatItReadsBack) {
            {std::numeric_limits<std::int64_t>::min(), "<integer>-9223372036854775808</integer>"},
            {std::numeric_limits<std::int64_t>::max(), "<integer>9223372036854775807</integer>"},
            {std::numeric_limits<std::uint64_t>::max(), "<integer>18446744073709551615</integer>"},
-           {0.1, "<real>0.1</real>"},
-           {-0.0, "<real>-0</real>"},
-           {3.0, "<real>3</real>"},
-           {1e300, "<real>1e+300</real>"},
-           {5e-324, "<real>5e-324</real>"},
-           {std::numeric_limits<double>::max(), "<real>1.7976931348623157e+308</real>"},
-           {kInfinity, "<real>+infinity</real>"},
-           {-kInfinity, "<real>-infinity</real>"},
-           {true, "<true/>"},
-           {false, "<false/>"},
-           {Data{""}, "<data></data>"},
-           {Data{"\xFF"}, "<data>/w==</data>"},
-           {Data{"\xFF\0"s}, "<data>/wA=</data>"},
-           {Data{"\xFF\0\x01"s}, "<data>/wAB</data>"},
-           {Data{"\xFF\0\x01>"s}, "<data>/wABPg==</data>"},
+           {PointInTime(1116246645s), "<date>2005-05-16T12:30:45Z</date>"},
            {PropertyListValue::Array{}, "<array/>"},
            {Dictionary{}, "<dict/>"},
        }) {
     EXPECT_EQ(line(row.value), row.line);
     EXPECT_TRUE(carried(row.value) == row.value) << row.line;
   }
-  const double noNumber = std::numeric_limits<double>::quiet_NaN();
-  EXPECT_EQ(line(noNumber), "<real>nan</real>");
-  EXPECT_EQ(dumped(carried(noNumber)), "nanr");
 }
 
-TEST(PropertyListWriterTest, WritesDatesOfAllTimesSoThatTheyReadBack) {
-  struct Row {
-    PointInTime date;
-    const char* text;
-    PointInTime readBack;
-  };
-  const auto at = [](std::int64_t seconds) { return PointInTime(std::chrono::seconds(seconds)); };
-  for (const Row& row : std::vector<Row>{
-           {at(0), "1970-01-01T00:00:00Z", at(0)},
-           {at(0) + 999ms, "1970-01-01T00:00:00Z", at(0)},
-           {at(0) - 1ms, "1969-12-31T23:59:59Z", at(-1)},
-           {at(951782400), "2000-02-29T00:00:00Z", at(951782400)},
-           {at(1136073599), "2005-12-31T23:59:59Z", at(1136073599)},
-           {at(2147483648), "2038-01-19T03:14:08Z", at(2147483648)},
-           {at(253402300799), "9999-12-31T23:59:59Z", at(253402300799)},
-           {at(253402300800), "10000-01-01T00:00:00Z", at(253402300800)},
-           {at(884541340800), "30000-01-01T00:00:00Z", at(884541340800)},
-           {at(6311328232780800), "200000000-01-01T00:00:00Z", at(6311328232780800)},
-           {at(-62135596800), "0001-01-01T00:00:00Z", at(-62135596800)},
-           {at(-62167219200), "0000-01-01T00:00:00Z", at(-62167219200)},
-           {at(-62167219201), "-0001-12-31T23:59:59Z", at(-62167219201)},
-           {at(-63549360000), "-0044-03-15T00:00:00Z", at(-63549360000)},
-           {PointInTime::max(), "292278994-08-17T07:12:55Z", at(9223372036854775)},
-           // Its second begins before the first point in time.
-           {PointInTime::min(), "-292275055-05-16T16:47:04Z", PointInTime::min()},
-       }) {
-    EXPECT_EQ(line(row.date), "<date>"s + row.text + "</date>");
-    EXPECT_EQ(carried(row.date).asDate(), row.readBack) << row.text;
-  }
-}
-
-TEST(PropertyListWriterTest, DatesReadBackOnEveryDayOfAnEra) {
-  // 400 years and some, a prime number of seconds more than a day apart, around the year 0.
-  Dictionary dates;
-  for (std::int64_t i = 0; i < 150000; ++i)
-    dates.emplace(std::to_string(1000000 + i),
-                  PointInTime(std::chrono::seconds(-68500000000 + i * 86413)));
-  EXPECT_TRUE(readBack(written(dates)) == PropertyListValue(dates));
+TEST(PropertyListWriterTest, LeavesOutWhatNoPodcastHas) {
+  using Array = PropertyListValue::Array;
+  const PropertyListValue data = PropertyListValue::Data{"bytes"};
+  EXPECT_EQ(written({{"a", 1.5}, {"b", true}, {"c", data}}), kProlog + "<dict/>\n</plist>\n");
+  const Dictionary dictionary = {
+      {"a", false}, {"b", Array{"x", 1.5, true, data, Array{data}}}, {"c", data}, {"d", "y"}};
+  EXPECT_EQ(dumped(readBack(written(dictionary))), R"({"b": ["x", []], "d": "y"})");
 }
 
 TEST(PropertyListWriterTest, AnyTextReadsBackTheSame) {
@@ -208,7 +158,7 @@ TEST(PropertyListWriterTest, AnyTextReadsBackTheSame) {
                                 "\xF4\x8F\xBF\xBF",
                                 "\xF0\x90\x80\x80"}) {
     EXPECT_EQ(carried(text).asText(), text);
-    EXPECT_TRUE(readBack(written({{text, true}})) == PropertyListValue(Dictionary{{text, true}}))
+    EXPECT_TRUE(readBack(written({{text, text}})) == PropertyListValue(Dictionary{{text, text}}))
         << text;
   }
 }
@@ -237,7 +187,7 @@ TEST(PropertyListWriterTest, LeavesOutWhatXMLCannotHold) {
 TEST(PropertyListWriterTest, WritesLongTextsInFewPieces) {
   std::string text;
   while (text.size() < 20'000'000) text += "A long tale of <tea> & caf\xC3\xA9.\r\n";
-  const Dictionary dictionary = {{"text", text}, {"z", PropertyListValue::Data{text}}};
+  const Dictionary dictionary = {{"text", text}, {"z", text}};
   std::string output;
   int pieces = 0;
   EXPECT_TRUE(writePropertyList(dictionary, [&](std::string_view bytes) {
@@ -275,7 +225,7 @@ TEST(PropertyListWriterTest, StopsWhenTheSinkRefuses) {
 
 TEST(PropertyListWriterTest, WritesWhatIsNestedDeeperThanIsRead) {
   const auto nested = [](int depth) {
-    PropertyListValue value = true;
+    PropertyListValue value = "x";
     for (int i = 0; i < depth; ++i) {
       PropertyListValue::Array array;
       array.push_back(std::move(value));
@@ -286,7 +236,7 @@ TEST(PropertyListWriterTest, WritesWhatIsNestedDeeperThanIsRead) {
   // The root is the first level.
   EXPECT_TRUE(carried(nested(511)) == nested(511));
   const std::string bytes = written({{"value", nested(3000)}});
-  EXPECT_NE(bytes.find("\n" + std::string(3001, '\t') + "<true/>\n"), std::string::npos);
+  EXPECT_NE(bytes.find("\n" + std::string(3001, '\t') + "<string>x</string>\n"), std::string::npos);
 }
 
 }  // namespace

@@ -42,14 +42,4 @@ TEST(CaseTest, KeepsMalformedSequences) {
   }
 }
 
-TEST(CaseTest, TakesEveryTwoBytesWithoutFault) {
-  for (int first = 0; first < 256; ++first) {
-    for (int second = 0; second < 256; ++second) {
-      const std::string text = {static_cast<char>(first), static_cast<char>(second)};
-      EXPECT_FALSE(platform::lowercased(text).empty());
-      EXPECT_FALSE(platform::uppercased(text).empty());
-    }
-  }
-}
-
 }  // namespace

@@ -5,6 +5,9 @@
 #include <limits>
 #include <string>
 
+#include "platform/text/Case.h"
+#include "platform/text/Splitting.h"
+
 namespace {
 
 TEST(CharactersTest, LengthsAndFirstCharacters) {
@@ -43,6 +46,9 @@ TEST(CharactersTest, TakesEveryTwoBytesWithoutFault) {
       const std::size_t characters = platform::characterCount(text);
       EXPECT_TRUE(characters == 1 || characters == 2);
       EXPECT_EQ(platform::firstCharacters(text, characters), text);
+      EXPECT_FALSE(platform::lowercased(text).empty());
+      EXPECT_FALSE(platform::uppercased(text).empty());
+      EXPECT_LE(platform::splitAtWhitespace(text).size(), characters + 1);
     }
   }
 }

@@ -20,9 +20,9 @@ TEST(FormattedTextTest, InsertsTexts) {
 }
 
 TEST(FormattedTextTest, InsertsNullForAbsentTextsAndMissingArguments) {
-  const std::optional<platform::Text> absent;
+  const platform::OptionalText absent;
   EXPECT_EQ(formattedText("<%@>", {absent}), "<(null)>");
-  EXPECT_EQ(formattedText("<%@>", {std::optional<platform::Text>("x")}), "<x>");
+  EXPECT_EQ(formattedText("<%@>", {platform::OptionalText("x")}), "<x>");
   EXPECT_EQ(formattedText("%@ %s %ld %lu %0.1f", {}), "(null) (null) (null) (null) (null)");
 }
 
@@ -36,9 +36,6 @@ TEST(FormattedTextTest, InsertsIntegers) {
             "-9223372036854775808");
   EXPECT_EQ(formattedText("%lu", {std::numeric_limits<std::uint64_t>::max()}),
             "18446744073709551615");
-  // The placeholder, not the argument, says whether the bits have a sign, as with printf.
-  EXPECT_EQ(formattedText("%lu", {-1}), "18446744073709551615");
-  EXPECT_EQ(formattedText("%ld", {std::numeric_limits<std::uint64_t>::max()}), "-1");
 }
 
 TEST(FormattedTextTest, InsertsNumbersWithOneDecimal) {
@@ -59,7 +56,6 @@ TEST(FormattedTextTest, InsertsNumbersWithOneDecimal) {
       {1e15, "1000000000000000.0"},
   };
   for (const auto& row : rows) EXPECT_EQ(formattedText("%0.1f", {row.number}), row.text);
-  EXPECT_EQ(formattedText("%0.1f", {3}), "3.0");
   EXPECT_EQ(formattedText("%0.1f", {std::numeric_limits<double>::infinity()}), "inf");
   EXPECT_EQ(formattedText("%0.1f", {-std::numeric_limits<double>::max()}).size(), 312U);
 }

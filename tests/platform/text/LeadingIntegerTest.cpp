@@ -15,8 +15,6 @@ TEST(LeadingIntegerTest, ReadsUpToTheFirstOtherCharacter) {
     std::string_view text;
     std::int64_t number;
   } rows[] = {
-      {"", 0},
-      {"0", 0},
       {"05,", 5},
       {"12abc", 12},
       {"  12", 12},
@@ -24,21 +22,8 @@ TEST(LeadingIntegerTest, ReadsUpToTheFirstOtherCharacter) {
       {"\u00A0\u300012", 12},
       {"+5", 5},
       {"-5", -5},
-      {"-0", 0},
-      {"+", 0},
-      {"-", 0},
-      {"+-5", 0},
-      {"-+5", 0},
-      {"--5", 0},
-      {"++5", 0},
-      {"+ 5", 0},
-      {"abc", 0},
-      {"a1", 0},
       {"1.9", 1},
       {"1e3", 1},
-      {"0x10", 0},
-      {"٣", 0},
-      {"\xFF\x31", 0},
       {"0000000000000000000000000007", 7},
       {"9223372036854775807", kMax},
       {"9223372036854775808", kMax},
@@ -49,6 +34,10 @@ TEST(LeadingIntegerTest, ReadsUpToTheFirstOtherCharacter) {
       {" -99999999999999999999999999", kMin},
   };
   for (const auto& row : rows) EXPECT_EQ(leadingInteger(row.text), row.number) << row.text;
+  for (const char* text : {"", "0", "-0", "+", "-", "+-5", "-+5", "--5", "++5", "+ 5", "abc", "a1",
+                           "0x10", "٣", "\xFF\x31"}) {
+    EXPECT_EQ(leadingInteger(text), 0) << text;
+  }
 }
 
 }  // namespace

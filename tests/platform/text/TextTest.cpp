@@ -30,7 +30,7 @@ TEST(TextTest, EmptyText) {
 }
 
 TEST(TextTest, CopiesShareTheCharactersAndOutliveTheirSource) {
-  std::optional<Text> first("some characters");
+  platform::OptionalText first("some characters");
   const Text copy = *first;
   EXPECT_EQ(copy.view().data(), first->view().data());
   first.reset();

@@ -119,5 +119,4 @@ TEST(XMLEscapingTest, TellsWhatXMLCanHoldWhole) {
 }
 
 }  // namespace
-
 }  // namespace platform

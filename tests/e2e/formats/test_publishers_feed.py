@@ -1,4 +1,4 @@
-"""Feeds as publishers really write them: counted redirects, signed queries, one name for every file.
+"""A feed as publishers really write them: counted redirects, signed queries, one name for every file.
 
 No single rule is the matter here but all of them at once, on the way into a bundle and out of it again.
 """
@@ -14,7 +14,7 @@ from support import DC, ORVANE, rss
 EPISODES = 40
 
 
-class RealShapeTest(BundleTestCase):
+class PublishersFeedTest(BundleTestCase):
     def setUp(self):
         super().setUp()
         self.web = self.server()

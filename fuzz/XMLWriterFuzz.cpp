@@ -4,12 +4,12 @@
 
 #include "fuzz/FuzzTarget.h"
 #include "fuzz/PropertyListRoundTrip.h"
-#include "platform/xml/XMLDocument.h"
 #include "platform/xml/XMLParser.h"
+#include "platform/xml/XMLWriter.h"
 
 namespace {
 
-/// What a document holds, in one text: what was built, and what the parser tells of it.
+/// What a document holds, in one text: what was written, and what the parser tells of it.
 class Contents {
  public:
   void start(std::string_view name) { text_.append("<").append(name).append(">"); }
@@ -36,8 +36,8 @@ class ContentsReader : private platform::XMLParserEvents {
   static Contents read(const std::string& document) {
     ContentsReader reader;
     platform::XMLParser parser(document, reader);
-    platform::ErrorSlot error;
-    requireThat(parser.parse(error), "a document that was written is well-formed");
+    std::optional<platform::XMLFault> fault;
+    requireThat(parser.parse(fault), "a document that was written is well-formed");
     return reader.contents_;
   }
 
@@ -65,11 +65,11 @@ class ContentsReader : private platform::XMLParserEvents {
   bool holdsText_ = false;
 };
 
-/// Builds a document by instructions of one byte and a text that ends at the next byte 0xFF, which
+/// Writes a document by instructions of one byte and a text that ends at the next byte 0xFF, which
 /// no text of XML holds.
-class Builder {
+class Scribe {
  public:
-  Builder() : open_{document_.setRoot(kContainer)} { contents_.start(kContainer); }
+  Scribe() : open_{writer_.appendRoot(kContainer)} { contents_.start(kContainer); }
 
   void follow(char instruction, std::string_view text) {
     switch (instruction) {
@@ -96,9 +96,9 @@ class Builder {
   }
 
   void requireReadsBack() {
-    const std::string bytes = document_.serialised();
+    writer_.finish();
     while (!open_.empty()) close();
-    requireThat(ContentsReader::read(bytes) == contents_, "a document reads back the same");
+    requireThat(ContentsReader::read(bytes_) == contents_, "a document reads back the same");
   }
 
  private:
@@ -107,7 +107,9 @@ class Builder {
     contents_.end();
   }
 
-  platform::XMLDocument document_;
+  std::string bytes_;
+  platform::XMLWriter writer_{bytes_,
+                              {.indentation = ' ', .indentationWidth = 2, .emptyTagEnd = " />"}};
   std::vector<platform::XMLElement> open_;
   Contents contents_;
 };
@@ -118,14 +120,14 @@ class Builder {
 /// can hold of it.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   std::string_view input = inputText(data, size);
-  Builder builder;
+  Scribe scribe;
   while (!input.empty()) {
     const char instruction = input.front();
     input.remove_prefix(1);
     const std::string_view text = input.substr(0, input.find('\xFF'));
-    builder.follow(instruction, text);
+    scribe.follow(instruction, text);
     input.remove_prefix(std::min(text.size() + 1, input.size()));
   }
-  builder.requireReadsBack();
+  scribe.requireReadsBack();
   return 0;
 }

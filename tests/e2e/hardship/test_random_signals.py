@@ -1,7 +1,6 @@
-"""Runs are interrupted: by people, by shutdowns, by a killed machine. What has a final name stays whole.
+"""Runs are interrupted at any moment, also by signals that nobody can catch. What has a final name stays whole.
 
-A signal that asks the tool to end leaves nothing behind but finished files; one that cannot be caught may
-leave hidden files, which the next run removes.
+A killed run may leave hidden files, which the next run removes.
 """
 
 import os
@@ -13,147 +12,9 @@ import subprocess
 import time
 import unittest
 
-from bundle_support import BundleTestCase, contents, digests, eventually, hidden
+from bundle_support import contents, digests, eventually, hidden
+from interruption import ENDING_SIGNALS, InterruptionTestCase, expect_signals
 from support import soaking, start
-
-ENDING_SIGNALS = (signal.SIGINT, signal.SIGTERM, signal.SIGHUP)
-
-
-def expect_signals():
-    """For the tool, before it starts: no signal is ignored, even if these tests run under nohup."""
-    for number in ENDING_SIGNALS:
-        signal.signal(number, signal.SIG_DFL)
-
-
-class InterruptionTestCase(BundleTestCase):
-    def begin(self, podcast, **options):
-        """A running createbundle for a podcast dictionary or a source."""
-        source = self.reference(podcast) if isinstance(podcast, dict) else podcast
-        options = {"stdout": subprocess.PIPE, "stderr": subprocess.PIPE, "preexec_fn": expect_signals, **options}
-        process = start("createbundle", source, "-d", self.bundle, **options)
-        self.addCleanup(process.communicate)
-        self.addCleanup(process.kill)
-        return process
-
-    def held(self, web, path, sent, announced=1 << 20):
-        """A route that sends some of its body and no more. Its URL and its gate."""
-        gate = self.gate()
-
-        def answer(exchange):
-            exchange.head(200, [("Content-Length", str(announced))])
-            exchange.send(sent)
-            gate.wait()
-        return web.route(path, answer), gate
-
-    def assertEndsBy(self, process, number):
-        process.send_signal(number)
-        _, stderr = process.communicate(timeout=60)
-        self.assertEqual((process.returncode, stderr), (-number, b""))
-        self.assertEqual(hidden(self.bundle), [])
-
-
-class EndingSignalTest(InterruptionTestCase):
-    def test_in_the_middle_of_an_episode(self):
-        for number in ENDING_SIGNALS:
-            with self.subTest(number):
-                web = self.server()
-                url, gate = self.held(web, "/two.mp3", b"half of it")
-                process = self.begin({"Episodes": [{"EpisodeReference": web.serve("/one.mp3", b"whole")},
-                                                   {"EpisodeReference": url}]})
-                gate.reached()
-                eventually(lambda: hidden(self.bundle))
-                self.assertEndsBy(process, number)
-                self.assertEqual(contents(self.bundle), {"Posters": None, "one.mp3": b"whole"})
-
-    def test_before_the_answer_to_a_request(self):
-        gate = self.gate()
-        url = self.server().route("/one.mp3", lambda exchange: gate.wait())
-        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
-        gate.reached()
-        self.assertEndsBy(process, signal.SIGINT)
-        self.assertEqual(contents(self.bundle), {"Posters": None})
-
-    def test_in_the_middle_of_a_poster(self):
-        web = self.server()
-        url, gate = self.held(web, "/face.jpg", b"half of it")
-        process = self.begin({"Episodes": [{"EpisodeReference": web.serve("/one.mp3", b"whole"),
-                                            "EpisodePosterReference": url}]})
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        self.assertEndsBy(process, signal.SIGTERM)
-        self.assertEqual(contents(self.bundle), {"Posters": None, "one.mp3": b"whole"})
-
-    def test_in_the_middle_of_the_podcasts_poster(self):
-        url, gate = self.held(self.server(), "/cover.jpg", b"half of it")
-        process = self.begin({"PodcastPosterReference": url, "PodcastPosterReferenceType": "remote"})
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        self.assertEndsBy(process, signal.SIGINT)
-        self.assertEqual(contents(self.bundle), {"Posters": None})
-
-    def test_while_the_feed_is_fetched(self):
-        url, gate = self.held(self.server(), "/feed", b"<rss>")
-        process = self.begin(url)
-        gate.reached()
-        self.assertEndsBy(process, signal.SIGTERM)
-        self.assertFalse(self.bundle.exists())
-
-    def test_files_of_an_earlier_run_stay_as_they_were(self):
-        web = self.server()
-        show = {"PodcastName": "Show", "Episodes": [{"EpisodeReference": web.serve("/one.mp3", b"earlier")}]}
-        self.assertWarns(self.create(show))
-        before = contents(self.bundle)
-        _, gate = self.held(web, "/one.mp3", b"later")
-        process = self.begin(show)
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        self.assertEndsBy(process, signal.SIGINT)
-        self.assertEqual(contents(self.bundle), before)
-
-    def test_a_second_signal_at_once(self):
-        url, gate = self.held(self.server(), "/one.mp3", b"half of it")
-        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        process.send_signal(signal.SIGINT)
-        process.send_signal(signal.SIGTERM)
-        process.communicate(timeout=60)
-        self.assertIn(process.returncode, (-signal.SIGINT, -signal.SIGTERM))
-        self.assertEqual(hidden(self.bundle), [])
-
-    def test_an_ignored_signal_stays_ignored(self):
-        gate = self.gate()
-
-        def answer(exchange):
-            gate.wait()
-            exchange.reply(200, b"whole")
-        url = self.server().route("/one.mp3", answer)
-        process = self.begin({"Episodes": [{"EpisodeReference": url}]},
-                             preexec_fn=lambda: signal.signal(signal.SIGHUP, signal.SIG_IGN))
-        gate.reached()
-        process.send_signal(signal.SIGHUP)
-        gate.open()
-        process.communicate(timeout=60)
-        self.assertEqual(process.returncode, 0)
-        self.assertEqual(self.files(), {"one.mp3": b"whole"})
-
-    def test_a_stopped_run_goes_on(self):
-        web = self.server()
-        gate = self.gate()
-
-        def answer(exchange):
-            exchange.head(200, [("Content-Length", "10")])
-            exchange.send(b"first")
-            gate.wait()
-            exchange.send(b"later")
-        process = self.begin({"Episodes": [{"EpisodeReference": web.route("/one.mp3", answer)}]})
-        gate.reached()
-        process.send_signal(signal.SIGSTOP)
-        gate.open()
-        process.send_signal(signal.SIGCONT)
-        process.communicate(timeout=60)
-        self.assertEqual(process.returncode, 0)
-        self.assertEqual(self.files(), {"one.mp3": b"firstlater"})
 
 
 class RandomMomentTest(InterruptionTestCase):
@@ -350,8 +211,7 @@ class KillTest(InterruptionTestCase):
               f"{self.ROUNDS} runs to the end", flush=True)
         self.assertGreater(left_behind, 0, "no kill met a file half written")
 
-    def leave_hidden_file(self):
-        """Kills a run in the middle of an episode. The name of the file that it leaves in the bundle."""
+    def test_hidden_files_of_a_killed_run_are_cleared_away(self):
         url, gate = self.held(self.server(), "/one.mp3", b"half of it")
         process = self.begin({"Episodes": [{"EpisodeReference": url}]})
         gate.reached()
@@ -359,52 +219,17 @@ class KillTest(InterruptionTestCase):
         process.kill()
         process.communicate(timeout=60)
         name, = hidden(self.bundle)
-        return name
-
-    def test_a_hidden_file_of_a_killed_run_is_cleared_away(self):
-        self.leave_hidden_file()
+        for folder in ("Posters", ".."):
+            (self.bundle / folder / name).write_bytes(b"half of it")
+        (self.bundle / ".qel-notes.part").write_bytes(b"mine")
         self.assertRuns(self.create({}), "Fetching 0 episodes")
-        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters"})
-
-    def test_one_among_the_posters_is_cleared_away_too(self):
-        name = self.leave_hidden_file()
-        (self.bundle / name).rename(self.bundle / "Posters" / name)
-        self.assertRuns(self.create({}), "Fetching 0 episodes")
-        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters"})
-
-    def test_one_outside_the_bundle_stays(self):
-        name = self.leave_hidden_file()
-        self.path("folder").mkdir()
-        (self.bundle / name).rename(self.path("folder") / name)
-        (self.bundle / "Posters").rmdir()
-        (self.bundle / "Posters").symlink_to("../folder")
-        self.assertRuns(self.create({}), "Fetching 0 episodes")
-        self.assertEqual(hidden(self.path("folder")), [name])
-
-    def test_no_episode_gets_a_name_that_is_cleared_away(self):
-        location = self.media(self.leave_hidden_file())
-        self.assertWarns(self.create_episodes(location),
-                         'Could not generate sane path for episode "(null)"')
-        self.assertEqual(self.files(), {})
-
-    def test_hidden_files_of_others_stay(self):
-        self.bundle.mkdir()
-        names = [".DS_Store", ".one.mp3", ".qel", ".qel-notes.part", ".part"]
-        for name in names:
-            (self.bundle / name).write_bytes(b"mine")
-        self.assertRuns(self.create({}), "Fetching 0 episodes")
-        self.assertEqual(hidden(self.bundle), sorted(names))
+        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", ".qel-notes.part"})
+        self.assertTrue(self.path(name).exists())
 
     def test_a_run_beside_this_one_keeps_its_hidden_file(self):
         web = self.server()
-        gate = self.gate()
-
-        def answer(exchange):
-            exchange.head(200, [("Content-Length", "10")])
-            exchange.send(b"first")
-            gate.wait()
-            exchange.send(b"later")
-        process = self.begin({"Episodes": [{"EpisodeReference": web.route("/one.mp3", answer)}]})
+        url, gate = self.held(web, "/one.mp3", b"first", b"later")
+        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
         gate.reached()
         eventually(lambda: hidden(self.bundle))
         source = self.reference({"Episodes": [{"EpisodeReference": web.serve("/two.mp3", b"two")}]}, name="two.plist")
@@ -413,44 +238,6 @@ class KillTest(InterruptionTestCase):
         process.communicate(timeout=60)
         self.assertEqual(process.returncode, 0)
         self.assertEqual(self.files(), {"one.mp3": b"firstlater", "two.mp3": b"two"})
-
-
-class LostReaderTest(InterruptionTestCase):
-    """Nobody has to read the progress lines to the end."""
-
-    def test_a_reader_that_goes_away(self):
-        web = self.server()
-        gate = self.gate()
-
-        def answer(exchange):
-            gate.wait()
-            exchange.reply(200, b"whole")
-        reader, writer = os.pipe()
-        process = self.begin({"Episodes": [{"EpisodeReference": web.route("/one.mp3", answer)},
-                                           *({"EpisodeReference": web.serve(f"/{number}.mp3", b"x" * 1000)}
-                                             for number in range(50))]}, stdout=writer)
-        os.close(writer)
-        gate.reached()
-        os.close(reader)
-        gate.open()
-        _, stderr = process.communicate(timeout=60)
-        self.assertEqual((process.returncode, stderr), (0, b""))
-        self.assertEqual(len(self.references()), 51)
-
-    def test_a_full_device_as_standard_output(self):
-        with open("/dev/full", "wb") as full:
-            result = self.create_episodes(self.media("a.mp3"), stdout=full)
-        self.assertEqual((result.status, result.stderr), (0, b""))
-        self.assertEqual(self.files(), {"a.mp3": b"media"})
-
-    def test_closed_standard_streams(self):
-        for closed in ((1,), (0, 1), (0, 1, 2)):
-            with self.subTest(closed):
-                source = self.reference({"Episodes": [{"EpisodeReference": self.server().serve("/a.mp3", b"media")}]})
-                result = self.run_tool("createbundle", source, "-d", self.bundle, closed=closed)
-                self.assertEqual(result.status, 0)
-                self.assertEqual(self.files(), {"a.mp3": b"media"})
-                self.assertEqual(self.references(), ["a.mp3"])
 
 
 if __name__ == "__main__":
