@@ -39,10 +39,10 @@ class TransferLibrary {
 
   TransferLibrary();
   static const TransferLibrary& instance();
-  /// A failure leaves the error that is the first.
+  /// Looks a function up. The first failure becomes the error.
   Symbol find(const char* name);
 
-  ErrorSlot error_;
+  ErrorSlot error_;  // before the functions, as finding them fills it
 
  public:
   decltype(&::curl_global_init_mem) globalInit = find("curl_global_init_mem");
