@@ -34,9 +34,7 @@ constexpr std::array kEndingSignals = {SIGINT, SIGTERM, SIGHUP};
 /// Empty, and errno set, when the system gives no random bytes.
 std::string hiddenName() {
   std::array<unsigned char, kRandomBytes> random{};
-  if (::getentropy(random.data(), random.size()) != 0) {
-    return {};
-  }
+  if (::getentropy(random.data(), random.size()) != 0) return {};
   std::string name(kNamePrefix);
   for (const unsigned char byte : random) {
     name += kHexDigits[byte >> 4U];
@@ -61,10 +59,6 @@ bool isNamed(int descriptor, const std::string& path) {
   return ::fstat(descriptor, &open) == 0 && ::lstat(path.c_str(), &named) == 0 &&
          open.st_dev == named.st_dev && open.st_ino == named.st_ino;
 }
-
-struct DirectoryCloser {
-  void operator()(DIR* directory) const { ::closedir(directory); }
-};
 
 int moveNew(const char* from, const char* to) {
   if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) return 0;
@@ -216,7 +210,7 @@ bool TemporaryFile::commitNew(ErrorSlot& error) {
 
 bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorSlot& error) {
   // The second descriptor keeps the lock until the file has its final name.
-  const FileDescriptor lockHolder = descriptor_.duplicated();
+  const FileDescriptor lockHolder(::fcntl(descriptor_.get(), F_DUPFD_CLOEXEC, 0));
   if (!lockHolder.isOpen() || !descriptor_.close() ||
       move(path_.c_str(), destination_.c_str()) != 0) {
     error = posixError(errno);
@@ -253,7 +247,7 @@ bool isTemporaryFileName(std::string_view name) {
 
 void removeStaleTemporaryFiles(const std::string& directory) {
   const std::string parent = directory.empty() ? "." : directory;
-  const std::unique_ptr<DIR, DirectoryCloser> entries(::opendir(parent.c_str()));
+  const std::unique_ptr<DIR, int (*)(DIR*)> entries(::opendir(parent.c_str()), &::closedir);
   if (!entries) return;
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string_view name = entry->d_name;

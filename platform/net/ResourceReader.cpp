@@ -31,8 +31,7 @@ class BodyCollector : public NetworkTransfer::Sink {
   bool begin(std::int64_t expectedLength, std::string_view contentEncoding,
              ErrorSlot& error) override {
     if (!beginDecoding(lowercased(contentEncoding), error)) return false;
-    if (decoder_) return true;
-    if (expectedLength <= 0) return true;
+    if (decoder_ || expectedLength <= 0) return true;
     const auto length = static_cast<std::uint64_t>(expectedLength);
     if (length > limit_) return refuseAsTooLarge(error);
     // The announcement may be a lie; beyond this the body grows as its bytes come.
