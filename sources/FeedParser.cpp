@@ -52,7 +52,8 @@ std::optional<std::string_view> FeedParser::MarkerSearch::textBehindMarker(std::
   return text.substr(found + marker_.size());
 }
 
-std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::string> data) {
+std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(
+    std::optional<platform::ByteSource> data) {
   if (!data) return nullptr;
   return std::unique_ptr<FeedParser>(new FeedParser(std::move(*data)));
 }

@@ -39,7 +39,7 @@
 class FeedParser : private platform::XMLParserEvents {
  public:
   /// A parser of the bytes, which it gives up as it reads them; null for absent data.
-  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string> data);
+  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<platform::ByteSource> data);
 
   /// Hands each item's dictionary over, in document order, once nothing is added to it any more,
   /// instead of keeping it. For feeds of tens of thousands of items, whose records are made at
@@ -74,7 +74,7 @@ class FeedParser : private platform::XMLParserEvents {
     std::size_t start_ = 0;  // of the marker, or of where it may still begin
   };
 
-  explicit FeedParser(std::string data) : feedParser_(std::move(data), *this) {}
+  explicit FeedParser(platform::ByteSource data) : feedParser_(std::move(data), *this) {}
 
   void didStartElement(const platform::XMLName& name,
                        const platform::XMLAttributes& attributes) override;

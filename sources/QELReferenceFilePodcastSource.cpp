@@ -42,7 +42,7 @@ std::unique_ptr<QELReferenceFilePodcastSource> QELReferenceFilePodcastSource::in
     const std::string& path) {
   // What is wrong with the file is not told apart here.
   platform::ErrorSlot error;
-  std::optional<std::string> bytes = platform::readWholeFile(path, error);
+  std::optional<platform::ByteSource> bytes = platform::openWholeFile(path, error);
   if (!bytes) return nullptr;
   std::optional<platform::PropertyListFault> fault;
   auto value = platform::readPropertyList(std::move(*bytes), fault);

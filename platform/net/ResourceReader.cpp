@@ -102,8 +102,8 @@ class BodyCollector : public NetworkTransfer::Sink {
 
 }  // namespace
 
-std::optional<std::string> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit) {
-  if (url.scheme() == "file") return readWholeFile(url.path(), error);
+std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit) {
+  if (url.scheme() == "file") return openWholeFile(url.path(), error);
 
   BodyCollector collector(limit);
   const NetworkTransfer transfer(url, "gzip", collector);

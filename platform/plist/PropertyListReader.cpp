@@ -7,14 +7,19 @@
 
 namespace platform {
 
-std::optional<PropertyListValue> readPropertyList(std::string bytes,
+std::optional<PropertyListValue> readPropertyList(ByteSource bytes,
                                                   std::optional<PropertyListFault>& fault) {
-  if (bytes.empty()) {
-    fault = PropertyListFault{.description = "an empty property list"};
-    return std::nullopt;
+  constexpr std::string_view kBinaryMark = "bplist";
+  ErrorSlot error;
+  const std::string_view head = bytes.head(kBinaryMark.size(), error);
+  if (!error && head == kBinaryMark) {
+    const std::optional<std::string> all = bytes.readAll(error);
+    if (all) return readBinaryPropertyList(*all, fault);
+  } else if (!error && !head.empty()) {
+    return readXMLPropertyList(std::move(bytes), fault);
   }
-  if (bytes.starts_with("bplist")) return readBinaryPropertyList(bytes, fault);
-  return readXMLPropertyList(std::move(bytes), fault);
+  fault = PropertyListFault{.description = error ? error->description : "an empty property list"};
+  return std::nullopt;
 }
 
 }  // namespace platform

@@ -82,7 +82,9 @@ DocumentEncoding DocumentEncoding::of(std::string_view bytes) {
   if (!shown.empty()) return {.name = std::string(shown)};
   const std::string_view label = declaredEncoding(bytes);
   if (label.empty()) return {.name = "UTF-8"};
-  return {.name = encodingMeantBy(label), .label = label};
+  return {.name = encodingMeantBy(label),
+          .label = std::string(label),
+          .position = positionBehind({bytes.data(), label.data()})};
 }
 
 }  // namespace platform
