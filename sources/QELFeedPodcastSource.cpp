@@ -34,7 +34,7 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
 
   platform::ErrorSlot said;
   std::optional<platform::ByteSource> bytes = platform::readResource(*feedURL_, said);
-  if (!bytes || bytes->head(1, said).empty()) {
+  if (!bytes || bytes->head(said).empty()) {
     fillSlot(error, std::move(said), "Could not load or read the specified feed URL");
     return false;
   }

@@ -9,13 +9,12 @@ namespace platform {
 
 std::optional<PropertyListValue> readPropertyList(ByteSource bytes,
                                                   std::optional<PropertyListFault>& fault) {
-  constexpr std::string_view kBinaryMark = "bplist";
   ErrorSlot error;
-  const std::string_view head = bytes.head(kBinaryMark.size(), error);
-  if (!error && head == kBinaryMark) {
+  const std::string_view head = bytes.head(error);
+  if (head.starts_with("bplist")) {
     const std::optional<std::string> all = bytes.readAll(error);
     if (all) return readBinaryPropertyList(*all, fault);
-  } else if (!error && !head.empty()) {
+  } else if (!head.empty()) {
     return readXMLPropertyList(std::move(bytes), fault);
   }
   fault = PropertyListFault{.description = error ? error->description : "an empty property list"};

@@ -2,15 +2,14 @@
 
 namespace platform {
 
-std::string_view ByteSource::head(std::size_t size, ErrorSlot& error) {
-  if (read_ && held_.size() < size) {
-    std::string first(size, '\0');
-    const std::optional<std::size_t> count = read(first, error);
-    if (!count) return {};
-    first.resize(*count);
+std::string_view ByteSource::head(ErrorSlot& error) {
+  if (read_ && held_.empty()) {
+    constexpr std::size_t kHeadSize = std::size_t{64} << 10;
+    std::string first(kHeadSize, '\0');
+    first.resize(read(first, error).value_or(0));
     held_ = std::move(first);
   }
-  return std::string_view(held_).substr(0, size);
+  return held_;
 }
 
 std::optional<std::size_t> ByteSource::read(std::span<char> room, ErrorSlot& error) {

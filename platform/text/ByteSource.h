@@ -13,8 +13,8 @@
 
 namespace platform {
 
-/// The bytes of a document for whoever reads them once: bytes in memory, which are given up when they
-/// have been read, or those of a file, which are read straight to where they are wanted.
+/// The bytes of a document for whoever reads them once: bytes in memory, which are given up when
+/// they have been read, or those of a file, which are read straight to where they are wanted.
 class ByteSource {
  public:
   /// Puts the next bytes into the room: how many, 0 at the end. No value, and the slot filled, on
@@ -28,9 +28,10 @@ class ByteSource {
 
   std::uint64_t expectedSize() const { return expectedSize_; }
 
-  /// The first bytes, as far as there are so many, which are still to be read; called before
-  /// anything is. Empty, and the slot filled, on failure.
-  std::string_view head(std::size_t size, ErrorSlot& error);
+  /// The first bytes, which are still to be read: 64 KiB of a file, or all that is in memory.
+  /// Called before anything is read. Empty only where there are none at all, and, with the slot
+  /// filled, on failure.
+  std::string_view head(ErrorSlot& error);
 
   /// Fills the room with the next bytes: how many, fewer than it takes at the end alone. No value,
   /// and the slot filled, on failure.

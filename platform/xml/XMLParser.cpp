@@ -27,8 +27,8 @@ constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 /// is scanned anew with each further piece.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
 
-/// What tells the encoding of a document stands in so many bytes, and all that is skipped.
-constexpr std::size_t kHeadSize = std::size_t{64} << 10;
+/// A document that is larger than was expected has all that is skipped in its first piece.
+constexpr std::uint64_t kSmallestSize = std::uint64_t{64} << 10;
 
 XMLName nameOf(const XML_Char* name) {
   const std::string_view qualified(name);
@@ -42,19 +42,25 @@ XMLFault faultOfReading(const ErrorSlot& error) {
 /// Makes the document UTF-8. False, with the fault, when its encoding is not known.
 bool makeUTF8(ByteSource& document, std::optional<XMLFault>& fault) {
   ErrorSlot error;
-  const DocumentEncoding encoding = DocumentEncoding::of(document.head(kHeadSize, error));
-  if (encoding.name == "UTF-8") return true;
-  if (encoding.name) {
-    const std::optional<std::string> bytes = document.readAll(error);
-    if (!bytes) {
-      fault = faultOfReading(error);
-      return false;
-    }
-    const std::string_view text = std::string_view(*bytes).substr(encoding.markLength);
-    if (auto converted = convertedToUTF8(text, *encoding.name)) {
-      document = ByteSource(std::move(*converted));
-      return true;
-    }
+  std::string_view head = document.head(error);
+  DocumentEncoding encoding = DocumentEncoding::of(head);
+  // The declaration may end behind the head.
+  const bool isTold = encoding.name == "UTF-8" && head.find('>') != std::string_view::npos;
+  if (isTold) return true;
+
+  std::optional<std::string> bytes;
+  if (!error) bytes = document.readAll(error);
+  if (!bytes) {
+    fault = faultOfReading(error);
+    return false;
+  }
+  encoding = DocumentEncoding::of(*bytes);
+  if (encoding.name && encoding.name != "UTF-8") {
+    bytes = convertedToUTF8(std::string_view(*bytes).substr(encoding.markLength), *encoding.name);
+  }
+  if (encoding.name && bytes) {
+    document = ByteSource(std::move(*bytes));
+    return true;
   }
   constexpr std::size_t kShownLength = 64;  // the names of encodings are shorter
   fault = XMLFault{.code = XML_ERROR_UNKNOWN_ENCODING,
@@ -95,8 +101,7 @@ struct XMLParser::Run {
   bool feed() {
     // A mark in front keeps the library from guessing at UTF-16.
     XML_Parse(handle.get(), kUTF8Mark.data(), static_cast<int>(kUTF8Mark.size()), XML_FALSE);
-    const std::uint64_t expected =
-        std::max<std::uint64_t>(owner.document_.expectedSize(), kHeadSize);
+    const std::uint64_t expected = std::max(owner.document_.expectedSize(), kSmallestSize);
     // The byte beyond what is expected lets the end be seen.
     std::size_t size = expected < owner.largestWholeSize_ ? expected + 1 : kPieceSize;
     for (bool isFirst = true;; isFirst = false) {

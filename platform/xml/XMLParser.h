@@ -71,8 +71,8 @@ class XMLParserEvents {
 ///   std::optional<XMLFault> fault;
 ///   if (!XMLParser(std::move(bytes), counter).parse(fault)) show(fault->description);
 ///
-/// The encoding is what DocumentEncoding detects in the first 64 KiB, any that the conversion
-/// library knows. White space before the declaration is skipped.
+/// The encoding is what DocumentEncoding detects, any that the conversion library knows. White
+/// space before the declaration is skipped.
 ///
 /// Internal entities and attributes by default are resolved as long as what they add is not much
 /// more than the document itself, and their declarations not too many; beyond that the document is
