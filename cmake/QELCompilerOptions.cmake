@@ -3,6 +3,11 @@
 include(CheckCXXCompilerFlag)
 include(CheckLinkerFlag)
 
+# Files of any size and dates beyond 2038, also where neither is the default.
+if(CMAKE_SIZEOF_VOID_P EQUAL 4)
+  add_compile_definitions(_FILE_OFFSET_BITS=64 _TIME_BITS=64)
+endif()
+
 add_library(qel_warnings INTERFACE)
 target_compile_options(qel_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wconversion)
 

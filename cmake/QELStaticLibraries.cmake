@@ -10,6 +10,7 @@ target_link_libraries(ICU::uc INTERFACE ICU::data)
 add_link_options(-static-libstdc++ -static-libgcc -Wl,--gc-sections -Wl,-Map=$<TARGET_PROPERTY:NAME>.map)
 
 add_library(qel_older_glibc OBJECT packaging/release/OlderGlibc.cpp)
+target_link_libraries(qel_older_glibc PRIVATE qel_options)
 link_libraries(qel_older_glibc)
 
 # The same bytes, wherever the sources stand.

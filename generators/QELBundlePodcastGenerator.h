@@ -9,9 +9,10 @@
 /// Turns a source into a podcast bundle: a directory with every episode's media, every poster (in
 /// "Posters") and an "Info.plist", a reference file whose locations all point inside the bundle.
 ///
-/// An episode that cannot be fetched is warned about and left out; a poster that cannot is warned
-/// about and left out of its entry. Files already in the directory stay unless a download replaces
-/// them. Nothing is written outside the directory, whatever the source's names look like.
+/// QELBundleNames.h says how the files are named. An episode that cannot be fetched is warned about
+/// and left out; a poster that cannot is warned about and left out of its entry. Files already in
+/// the directory stay unless a download replaces them. Nothing is written outside the directory,
+/// whatever the source's names look like.
 class QELBundlePodcastGenerator : public QELPodcastGenerator {
  public:
   /// Builds the bundle at `outputPath`. Fails without an output path (code 1), when the directory

@@ -9,7 +9,7 @@
 /// A record that fetches what it refers to: it starts the download, receives its events and waits
 /// for its end.
 ///
-/// What counts as a failed transfer is decided by platform/net: see Download.h.
+/// When a transfer counts as failed is decided below, in platform/net/Download.h.
 class QELFetcher : protected platform::DownloadReceiver {
  public:
   QELFetcher(const QELFetcher&) = delete;
@@ -17,7 +17,6 @@ class QELFetcher : protected platform::DownloadReceiver {
 
  protected:
   QELFetcher() = default;
-  ~QELFetcher() override = default;
 
   /// Puts what the reference leads to at the path, and returns once it is there or has failed
   /// (false). A path is copied, never over an existing file; a URL is downloaded over whatever is

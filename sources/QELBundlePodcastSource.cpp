@@ -3,6 +3,7 @@
 #include "cli/common/QELError.h"
 #include "cli/common/QELReferenceType.h"
 #include "model/QELPodcastKeys.h"
+#include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
 #include "platform/text/Text.h"
 
@@ -21,8 +22,9 @@ std::optional<std::string> absolutePath(const std::string& path, platform::Error
 
 std::unique_ptr<QELBundlePodcastSource> QELBundlePodcastSource::initWithPath(
     const std::string& path) {
-  auto referenceFile =
-      QELReferenceFilePodcastSource::initWithPath(platform::joinedPath(path, "Info.plist"));
+  const std::string referencePath = platform::joinedPath(path, "Info.plist");
+  if (!platform::fileExists(path) || !platform::fileExists(referencePath)) return nullptr;
+  auto referenceFile = QELReferenceFilePodcastSource::initWithPath(referencePath);
   platform::ErrorSlot dropped;
   if (!referenceFile || !referenceFile->loadSourceWithError(dropped)) return nullptr;
   return std::make_unique<QELBundlePodcastSource>(path, std::move(referenceFile));

@@ -6,9 +6,11 @@
 
 #include <cerrno>
 #include <cstddef>
+#include <filesystem>
 #include <memory>
 #include <span>
 #include <string_view>
+#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -19,11 +21,6 @@
 
 namespace platform {
 namespace {
-
-bool isDirectory(const std::string& path) {
-  struct stat status {};
-  return ::stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
-}
 
 /// Lets the kernel copy as much as it will. Whatever it refuses, or takes for the end of the file
 /// without being there, is left to the caller, who learns the reason by going on from here.
@@ -95,14 +92,14 @@ bool createDirectories(const std::string& path, ErrorSlot& error) {
     begin = path.find_first_not_of('/', end);
     // What exists is not tried, since a read-only file system may refuse before it looks; and
     // another process may have been quicker.
-    if (!isDirectory(prefix) && ::mkdir(prefix.c_str(), 0777) != 0) {
-      const int failure = errno;
-      if (!isDirectory(prefix)) {
-        const bool isParent = begin != std::string::npos;
-        error = posixError(failure == EEXIST && isParent ? ENOTDIR : failure);
-        return false;
-      }
-    }
+    std::error_code ignored;
+    if (std::filesystem::is_directory(prefix, ignored)) continue;
+    if (::mkdir(prefix.c_str(), 0777) == 0) continue;
+    const int failure = errno;
+    if (std::filesystem::is_directory(prefix, ignored)) continue;
+    const bool isParent = begin != std::string::npos;
+    error = posixError(failure == EEXIST && isParent ? ENOTDIR : failure);
+    return false;
   }
   return true;
 }

@@ -162,10 +162,8 @@ struct XMLParser::Run {
                                     const XML_Char* /*systemID*/, const XML_Char* /*publicID*/,
                                     const XML_Char* /*notation*/) {
     Run& run = *static_cast<Run*>(pointer);
-    // One that is external has no value.
-    const std::string_view text = value == nullptr
-                                      ? std::string_view()
-                                      : std::string_view(value, static_cast<std::size_t>(length));
+    // One that is external has no value, and the length 0.
+    const std::string_view text(value, static_cast<std::size_t>(length));
     if (!run.budget.takeEntity(isParameter == 0, text)) {
       run.refuseExpansion("too many entities made of entities");
     }

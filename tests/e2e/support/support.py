@@ -111,7 +111,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     if memory_limit is not None:
         if is_sanitized():
             env["ASAN_OPTIONS"] = f"exitcode={SANITIZER_STATUS}:hard_rss_limit_mb={memory_limit >> 20}"
-        else:
+        elif not is_emulated():  # most would be the emulator's own
             shell.insert(0, f"ulimit -v {memory_limit >> 10} &&")
     if len(shell) > 1:  # a shell prepares the process: Python's own way is unsafe beside a server's threads
         prefix = ("/bin/sh", "-c", " ".join(shell), *prefix)
@@ -124,6 +124,11 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
 def is_sanitized():
     """Whether the executable has its own idea of the address space, which a limit would break."""
     return b"__asan_init" in Path(tool()).read_bytes()
+
+
+def is_emulated():
+    """Whether the tool is for another processor, so that a script starts it."""
+    return Path(tool()).read_bytes().startswith(b"#!")
 
 
 def unprivileged(directory):

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <string>
 #include <thread>
 #include <vector>
@@ -24,16 +25,31 @@ TEST(AtomicValueTest, LoadedValueStaysWhenAnotherIsStored) {
   EXPECT_EQ(loaded, "one");
 }
 
+/// Lets other threads run in the middle of every copy.
+struct TwoHalves {
+  explicit TwoHalves(int number = 0) : first(number), second(number) {}
+  TwoHalves(const TwoHalves& other) { *this = other; }
+  TwoHalves& operator=(const TwoHalves& other) {
+    first = other.first;
+    std::this_thread::sleep_for(std::chrono::microseconds(100));
+    second = other.second;
+    return *this;
+  }
+  ~TwoHalves() = default;
+
+  int first = 0;
+  int second = 0;
+};
+
 TEST(AtomicValueTest, ThreadsReadAndWriteWholeValues) {
-  platform::AtomicValue<std::string> value;
+  platform::AtomicValue<TwoHalves> value;
   std::vector<std::thread> threads;
-  for (char letter = 'a'; letter < 'e'; ++letter) {
-    threads.emplace_back([&value, letter] {
-      const std::string mine(40, letter);
-      for (int round = 0; round < 2000; ++round) {
-        value.store(mine);
-        const std::string seen = value.load();
-        ASSERT_EQ(seen, std::string(40, seen.front()));
+  for (int number = 0; number < 4; ++number) {
+    threads.emplace_back([&value, number] {
+      for (int round = 0; round < 50; ++round) {
+        value.store(TwoHalves(number));
+        const TwoHalves seen = value.load();
+        ASSERT_EQ(seen.first, seen.second);
       }
     });
   }

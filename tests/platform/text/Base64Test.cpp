@@ -30,8 +30,9 @@ TEST(Base64Test, WhiteSpaceIsIgnoredWhereverItStands) {
 }
 
 TEST(Base64Test, OtherTextsAreNone) {
-  for (const char* text : {"Z", "Zg", "Zg=", "Zg===", "Zm8", "Zm9v=", "====", "Zg==Zg==", "Z-__",
-                           "Zm9v!", "Zm9\xC3\xA4", "Zm\x0B==", "\xFFm9v"}) {
+  for (const char* text :
+       {"Z", "Zg", "Zg=", "Zg===", "Zm8", "Zm9v=", "====", "Zg==Zg==", "Zg==Zm9v", "Z=g=", "Z-__",
+        "Zm9v!", "Zm9\xC3\xA4", "Zm\x0B==", "\xFFm9v"}) {
     EXPECT_EQ(platform::bytesFromBase64(text), std::nullopt) << text;
   }
   EXPECT_EQ(platform::bytesFromBase64(std::string_view("Zm\0v", 4)), std::nullopt);
