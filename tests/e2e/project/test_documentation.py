@@ -236,7 +236,7 @@ class ManualPageTest(unittest.TestCase):
         """The messages of the sources, as patterns; what others say may stand before one."""
         found = set()
         for folder in ("cli", "model", "sources", "generators", "platform/files"):
-            for source in (ROOT / folder).glob("*.cpp"):
+            for source in (ROOT / folder).glob("*.[ch]*"):
                 for maker in self.MAKER.findall(source.read_text(encoding="utf-8")):
                     found |= set(self.MESSAGE.findall(maker))
         self.assertGreater(len(found), 30)

@@ -105,10 +105,8 @@ TEST_F(TemporaryFileTest, CreationFailsWithTheCause) {
   }};
   for (const auto& [destination, expected] : rows) {
     SCOPED_TRACE(destination);
-    ErrorSlot error;
-    EXPECT_FALSE(file_.create(destination, error));
-    ASSERT_TRUE(error);
-    EXPECT_EQ(error->description, expected);
+    EXPECT_FALSE(file_.create(destination, error_));
+    EXPECT_EQ(description(), expected);
     EXPECT_EQ(file_.descriptor(), -1);
   }
   EXPECT_THAT(directory_.names(), ElementsAre("file"));
