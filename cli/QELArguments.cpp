@@ -9,10 +9,6 @@ namespace {
 
 constexpr std::array<std::string_view, 3> kCommands = {"createbundle", "createfeed", "parsefeed"};
 
-bool isCommand(std::string_view word) {
-  return std::find(kCommands.begin(), kCommands.end(), word) != kCommands.end();
-}
-
 }  // namespace
 
 QELArguments QELScanArguments(std::span<const char* const> arguments) {
@@ -25,21 +21,12 @@ QELArguments QELScanArguments(std::span<const char* const> arguments) {
 
   while (const std::optional<std::string> argument = next()) {
     if (argument->starts_with('-')) {
-      switch (argument->size() > 1 ? (*argument)[1] : '\0') {
-        case 'd':
-          scanned.outputPath = next();
-          break;
-        case 'f':
-          scanned.feedFormat = next();
-          break;
-        case 'i':
-          scanned.readStandardInput = true;
-          break;
-        default:
-          break;
-      }
+      const std::string_view option = std::string_view(*argument).substr(1, 1);
+      if (option == "d") scanned.outputPath = next();
+      if (option == "f") scanned.feedFormat = next();
+      if (option == "i") scanned.readStandardInput = true;
     } else if (!scanned.command) {
-      if (!isCommand(*argument)) {
+      if (std::find(kCommands.begin(), kCommands.end(), *argument) == kCommands.end()) {
         scanned.unknownCommand = argument;
         return scanned;
       }

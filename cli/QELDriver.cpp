@@ -55,7 +55,13 @@ std::string targetPath(const QELArguments& arguments) {
   return arguments.outputPath.value_or(std::string(platform::kStandardOutputPath));
 }
 
-int run(const QELArguments& arguments) {
+}  // namespace
+
+int QELRun(std::span<const char* const> commandLine) {
+  const QELArguments arguments = QELScanArguments(commandLine);
+  if (arguments.unknownCommand) {
+    return fail("Command `%s' not recognized.\n", {arguments.unknownCommand});
+  }
   QELShouldReportProgress = arguments.command == "createbundle" || arguments.outputPath.has_value();
 
   if (!QELValidateSource(arguments.source, arguments.readStandardInput)) {
@@ -67,19 +73,7 @@ int run(const QELArguments& arguments) {
   if (!made) {
     return fail("Could not initialize podcast source with string \"%s\".\n", {arguments.source});
   }
-  QELPodcastSource& source = kept(std::move(made));
-
-  return QELRunCommand(arguments, source);
-}
-
-}  // namespace
-
-int QELRun(std::span<const char* const> arguments) {
-  const QELArguments scanned = QELScanArguments(arguments);
-  if (scanned.unknownCommand) {
-    return fail("Command `%s' not recognized.\n", {scanned.unknownCommand});
-  }
-  return run(scanned);
+  return QELRunCommand(arguments, kept(std::move(made)));
 }
 
 int QELRunCommand(const QELArguments& arguments, QELPodcastSource& source) {

@@ -9,11 +9,11 @@ class QELFeedPodcastGenerator;
 class QELPodcastSource;
 class QELReferenceFilePodcastGenerator;
 
-/// One whole run of the tool: scans the arguments (without the program's name), loads the source,
-/// writes what the command asks for and returns the exit status, 0 or 1.
+/// One whole run of the tool: scans the command line (without the program's name), loads the
+/// source, writes what the command asks for and returns the exit status, 0 or 1.
 ///
 /// Every failure is one message on standard error. Null pointers do not occur among the arguments.
-int QELRun(std::span<const char* const> arguments);
+int QELRun(std::span<const char* const> commandLine);
 
 /// The part of a run that has its source: loads it and carries out the command. The exit status.
 int QELRunCommand(const QELArguments& arguments, QELPodcastSource& source);

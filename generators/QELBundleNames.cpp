@@ -9,12 +9,6 @@
 #include "platform/text/Splitting.h"
 #include "platform/xml/XMLEscaping.h"
 
-namespace {
-
-constexpr std::size_t kLongestName = 255;  // bytes, what file systems allow
-
-}  // namespace
-
 std::optional<std::string> QELFileName(const QELMediaReference& reference) {
   if (reference.url) {
     return platform::percentDecoded(platform::lastPathComponent(reference.url->encodedPath()));
@@ -38,6 +32,7 @@ std::string QELNameWithExtension(std::string_view base, std::string_view extensi
 }
 
 bool QELIsSaneName(std::string_view name) {
+  constexpr std::size_t kLongestName = 255;  // bytes, what file systems allow
   return QELNamesFile(name) && name.size() <= kLongestName &&
          !platform::isTemporaryFileName(name) && name.find('/') == std::string_view::npos &&
          platform::isXMLText(name);

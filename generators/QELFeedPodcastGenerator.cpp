@@ -69,18 +69,6 @@ void appendTextChild(XMLElement element, std::string_view name, const std::optio
   if (text) element.appendChild(name, *text);
 }
 
-void appendPoster(XMLElement element, const std::optional<Text>& url) {
-  if (url) element.appendChild("orvane:image").appendAttribute("href", *url);
-}
-
-void appendChannelImage(XMLElement channel, const QELPodcastSource& podcast,
-                        const std::optional<Text>& posterURL) {
-  if (!posterURL) return;
-  const XMLElement image = channel.appendChild("image");
-  image.appendChild("url", *posterURL);
-  appendTextChild(image, "title", podcast.title());
-}
-
 void appendEnclosure(XMLElement item, const QELEpisode& episode) {
   const std::optional<Text> url = resolvedURL(episode.location(), episode.referenceType());
   if (!url) return;
@@ -120,10 +108,14 @@ void populate(XMLElement element, const Item& item, bool stampNow) {
     }
   }
 
-  const std::optional<Text> posterURL =
-      resolvedURL(item.posterLocation(), item.posterReferenceType());
-  if constexpr (isPodcast<Item>) appendChannelImage(element, item, posterURL);
-  appendPoster(element, posterURL);
+  if (const auto posterURL = resolvedURL(item.posterLocation(), item.posterReferenceType())) {
+    if constexpr (isPodcast<Item>) {
+      const XMLElement image = element.appendChild("image");
+      image.appendChild("url", *posterURL);
+      appendTextChild(image, "title", item.title());
+    }
+    element.appendChild("orvane:image").appendAttribute("href", *posterURL);
+  }
   if constexpr (isPodcast<Item>) {
     appendTextChild(element, "link", item.location());
   } else {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "cli/common/QELError.h"
 #include "model/QELPodcastSource.h"
 #include "platform/text/ErrorRecord.h"
 
@@ -14,5 +15,8 @@ class QELPodcastGenerator {
 
   /// Builds the output. False with the slot filled on failure. The base, which has no output,
   /// always fails with code 1.
-  virtual bool generateFromSource(QELPodcastSource& source, platform::ErrorSlot& error);
+  virtual bool generateFromSource(QELPodcastSource& /*source*/, platform::ErrorSlot& error) {
+    error = QELError(1, "Attempt to generate with an abstract generator");
+    return false;
+  }
 };

@@ -17,7 +17,6 @@ class QELFetcher : protected platform::DownloadReceiver {
 
  protected:
   QELFetcher() = default;
-  ~QELFetcher() override = default;
 
   /// Puts what the reference leads to at the path, and returns once it is there or has failed
   /// (false). A path is copied, never over an existing file; a URL is downloaded over whatever is

@@ -1,7 +1,9 @@
 #pragma once
 
 #include <optional>
+#include <utility>
 
+#include "cli/common/QELReferenceType.h"
 #include "platform/net/URL.h"
 #include "platform/text/Text.h"
 
@@ -11,7 +13,10 @@
 /// the one that is fetched (QELFetcher.h), and is parsed only once.
 struct QELMediaReference {
   /// Exactly the reference type "remote" means a URL; any other and none mean a path.
-  QELMediaReference(platform::OptionalText where, const platform::OptionalText& referenceType);
+  QELMediaReference(platform::OptionalText where, const platform::OptionalText& referenceType)
+      : location(std::move(where)), isRemote(referenceType == kReferenceTypeRemote) {
+    if (location && isRemote) url = platform::URL::parse(*location);
+  }
 
   platform::OptionalText location;
   bool isRemote;

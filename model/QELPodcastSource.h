@@ -28,9 +28,6 @@ class QELPodcastSource : private QELFetcher {
   /// File-name extensions in lower case.
   using FileTypes = std::vector<std::string>;
 
-  QELPodcastSource() = default;
-  ~QELPodcastSource() override = default;
-
   /// Fills the fields from wherever the source's kind reads them. On failure returns false with the
   /// slot filled, the fields as they were. The base, which has nothing to read, always fails with
   /// code 1.

@@ -42,19 +42,18 @@ std::optional<std::string_view> leadingUuid(std::optional<std::string_view> text
 }  // namespace
 
 std::optional<std::string_view> FeedParser::MarkerSearch::textBehindMarker(std::string_view text) {
-  if (!found_) {
-    const std::size_t place = text.find(marker_, searched_);
-    if (place == std::string_view::npos) {
-      // A marker may have begun in the last bytes.
-      searched_ = std::max(searched_, text.size() - std::min(text.size(), marker_.size() - 1));
-      return std::nullopt;
-    }
-    found_ = place + marker_.size();
+  const std::size_t found = text.find(marker_, start_);
+  if (found == std::string_view::npos) {
+    // A marker may have begun in the last bytes.
+    start_ = std::max(start_, text.size() - std::min(text.size(), marker_.size() - 1));
+    return std::nullopt;
   }
-  return text.substr(*found_);
+  start_ = found;
+  return text.substr(found + marker_.size());
 }
 
-std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(std::optional<std::string> data) {
+std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(
+    std::optional<platform::ByteSource> data) {
   if (!data) return nullptr;
   return std::unique_ptr<FeedParser>(new FeedParser(std::move(*data)));
 }

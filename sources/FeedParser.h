@@ -39,7 +39,7 @@
 class FeedParser : private platform::XMLParserEvents {
  public:
   /// A parser of the bytes, which it gives up as it reads them; null for absent data.
-  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<std::string> data);
+  static std::unique_ptr<FeedParser> parserWithFeedData(std::optional<platform::ByteSource> data);
 
   /// Hands each item's dictionary over, in document order, once nothing is added to it any more,
   /// instead of keeping it. For feeds of tens of thousands of items, whose records are made at
@@ -60,7 +60,7 @@ class FeedParser : private platform::XMLParserEvents {
   const std::vector<platform::Dictionary>& episodes() const { return episodes_; }
 
  private:
-  /// The first place of a marker in a text that only grows at its end; no byte is looked at twice,
+  /// The first place of a marker in a text that only grows at its end; nothing is searched twice,
   /// so that asking again and again costs no more than asking once.
   class MarkerSearch {
    public:
@@ -71,11 +71,10 @@ class FeedParser : private platform::XMLParserEvents {
 
    private:
     std::string_view marker_;
-    std::optional<std::size_t> found_;
-    std::size_t searched_ = 0;
+    std::size_t start_ = 0;  // of the marker, or of where it may still begin
   };
 
-  explicit FeedParser(std::string data) : feedParser_(std::move(data), *this) {}
+  explicit FeedParser(platform::ByteSource data) : feedParser_(std::move(data), *this) {}
 
   void didStartElement(const platform::XMLName& name,
                        const platform::XMLAttributes& attributes) override;

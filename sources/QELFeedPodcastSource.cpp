@@ -33,8 +33,8 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   }
 
   platform::ErrorSlot said;
-  std::optional<std::string> bytes = platform::readResource(*feedURL_, said);
-  if (!bytes || bytes->empty()) {
+  std::optional<platform::ByteSource> bytes = platform::readResource(*feedURL_, said);
+  if (!bytes || bytes->head(said).empty()) {
     fillSlot(error, std::move(said), "Could not load or read the specified feed URL");
     return false;
   }

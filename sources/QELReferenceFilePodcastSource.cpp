@@ -14,15 +14,6 @@ namespace {
 using platform::Dictionary;
 using platform::PropertyListValue;
 
-std::shared_ptr<const QELEpisodeList> episodesFromArray(const PropertyListValue::Array& array) {
-  auto episodes = std::make_shared<QELEpisodeList>();
-  episodes->reserve(array.size());
-  for (const PropertyListValue& element : array) {
-    episodes->push_back(QELEpisode::episodeWithDictionary(element.asDictionary()));
-  }
-  return episodes;
-}
-
 /// The texts of a list; an element that is no text is left out. Absent when the key is missing or
 /// holds no list.
 std::optional<QELPodcastSource::FileTypes> fileTypesForKey(const Dictionary& dictionary,
@@ -51,7 +42,7 @@ std::unique_ptr<QELReferenceFilePodcastSource> QELReferenceFilePodcastSource::in
     const std::string& path) {
   // What is wrong with the file is not told apart here.
   platform::ErrorSlot error;
-  std::optional<std::string> bytes = platform::readWholeFile(path, error);
+  std::optional<platform::ByteSource> bytes = platform::openWholeFile(path, error);
   if (!bytes) return nullptr;
   std::optional<platform::PropertyListFault> fault;
   auto value = platform::readPropertyList(std::move(*bytes), fault);
@@ -75,9 +66,14 @@ bool QELReferenceFilePodcastSource::loadSourceWithError(platform::ErrorSlot& err
   for (const QELPodcastKey& field : QELPodcastKeys()) {
     (this->*field.setValue)(platform::textForKey(*refData_, field.key));
   }
-  const PropertyListValue* episodes = platform::valueForKey(*refData_, "Episodes");
-  if (const PropertyListValue::Array* array = episodes ? episodes->asArray() : nullptr) {
-    setEpisodes(episodesFromArray(*array));
+  const PropertyListValue* value = platform::valueForKey(*refData_, "Episodes");
+  if (const PropertyListValue::Array* array = value ? value->asArray() : nullptr) {
+    auto episodes = std::make_shared<QELEpisodeList>();
+    episodes->reserve(array->size());
+    for (const PropertyListValue& element : *array) {
+      episodes->push_back(QELEpisode::episodeWithDictionary(element.asDictionary()));
+    }
+    setEpisodes(std::move(episodes));
   }
   setAllowedPosterFileTypes(fileTypesForKey(*refData_, "AllowedPosterTypes"));
   setAllowedEpisodeFileTypes(fileTypesForKey(*refData_, "AllowedEpisodeTypes"));

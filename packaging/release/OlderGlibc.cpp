@@ -49,6 +49,7 @@ int _dl_find_object(void* address, dl_find_object* result) noexcept {
     }
     if (!holdsAddress || frames == 0) return 0;
     *wanted->result = {};
+    // NOLINTNEXTLINE(performance-no-int-to-ptr): addresses are numbers here
     wanted->result->dlfo_eh_frame = reinterpret_cast<void*>(frames);
     return 1;
   };

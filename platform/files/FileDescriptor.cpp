@@ -6,44 +6,21 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <utility>
 
 namespace platform {
 namespace {
 
 constexpr std::uint64_t kChunkSize = std::uint64_t{64} << 10U;
 
-bool waitFor(int descriptor, short events) {
-  pollfd request{descriptor, events, 0};
-  int count = -1;
-  do {
-    count = ::poll(&request, 1, -1);
-  } while (count < 0 && errno == EINTR);
-  return count > 0;
-}
-
 /// Whether a call that failed can be made again: it was interrupted, or has to wait, which is done
 /// here. A standard stream is non-blocking where another process that shares it made it so.
 bool canTryAgain(int descriptor, short events) {
-  return errno == EINTR || (errno == EAGAIN && waitFor(descriptor, events));
+  pollfd request{descriptor, events, 0};
+  if (errno == EAGAIN && ::poll(&request, 1, -1) > 0) return true;
+  return errno == EINTR;  // of the call or of the wait
 }
 
 }  // namespace
-
-FileDescriptor::~FileDescriptor() {
-  close();
-}
-
-FileDescriptor::FileDescriptor(FileDescriptor&& other) noexcept
-    : descriptor_(std::exchange(other.descriptor_, -1)) {}
-
-FileDescriptor& FileDescriptor::operator=(FileDescriptor&& other) noexcept {
-  if (this != &other) {
-    close();
-    descriptor_ = std::exchange(other.descriptor_, -1);
-  }
-  return *this;
-}
 
 FileDescriptor FileDescriptor::open(const std::string& path, int flags, unsigned mode) {
   if (path.find('\0') != std::string::npos) {
@@ -55,10 +32,6 @@ FileDescriptor FileDescriptor::open(const std::string& path, int flags, unsigned
     descriptor = ::open(path.c_str(), flags | O_CLOEXEC | O_NOCTTY, mode);
   } while (descriptor < 0 && errno == EINTR);
   return FileDescriptor(descriptor);
-}
-
-FileDescriptor FileDescriptor::duplicated() const {
-  return FileDescriptor(::fcntl(descriptor_, F_DUPFD_CLOEXEC, 0));
 }
 
 bool FileDescriptor::close() {

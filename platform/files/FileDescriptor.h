@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <utility>
 
 namespace platform {
 
@@ -13,11 +14,13 @@ class FileDescriptor {
  public:
   FileDescriptor() = default;
   explicit FileDescriptor(int descriptor) : descriptor_(descriptor) {}
-  ~FileDescriptor();
-  FileDescriptor(FileDescriptor&& other) noexcept;
-  FileDescriptor& operator=(FileDescriptor&& other) noexcept;
-  FileDescriptor(const FileDescriptor&) = delete;
-  FileDescriptor& operator=(const FileDescriptor&) = delete;
+  ~FileDescriptor() { close(); }
+  FileDescriptor(FileDescriptor&& other) noexcept
+      : descriptor_(std::exchange(other.descriptor_, -1)) {}
+  FileDescriptor& operator=(FileDescriptor other) noexcept {
+    std::swap(descriptor_, other.descriptor_);
+    return *this;
+  }
 
   /// open(2) with the flags given and those that every file of ours has. Not open after a failure;
   /// a path that holds a NUL is one (EINVAL).
@@ -26,8 +29,6 @@ class FileDescriptor {
   bool isOpen() const { return descriptor_ >= 0; }
   /// The descriptor, -1 when not open.
   int get() const { return descriptor_; }
-  /// A second descriptor of the same open file: its offset and its lock are shared.
-  FileDescriptor duplicated() const;
   /// False when what was written may not have got through. Not open afterwards in any case.
   bool close();
 

@@ -6,7 +6,12 @@
 
 #include <cerrno>
 #include <cstddef>
+#include <filesystem>
+#include <memory>
+#include <span>
 #include <string_view>
+#include <system_error>
+#include <utility>
 #include <vector>
 
 #include "platform/files/FileDescriptor.h"
@@ -16,11 +21,6 @@
 
 namespace platform {
 namespace {
-
-bool isDirectory(const std::string& path) {
-  struct stat status {};
-  return ::stat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
-}
 
 /// Lets the kernel copy as much as it will. Whatever it refuses, or takes for the end of the file
 /// without being there, is left to the caller, who learns the reason by going on from here.
@@ -57,19 +57,27 @@ bool mayBeSymbolicLink(const std::string& path) {
   return errno != ENOENT && errno != ENOTDIR;
 }
 
-std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error) {
-  const std::optional<RegularFile> file = RegularFile::open(path, error);
-  if (!file) return std::nullopt;
+std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& error) {
+  std::optional<RegularFile> opened = RegularFile::open(path, error);
+  if (!opened) return std::nullopt;
+  const auto file = std::make_shared<RegularFile>(std::move(*opened));
+  const auto tooLarge = [] { return posixError(EFBIG, "The file is larger than 2 GiB"); };
+  if (file->size() > kWholeReadLimit) {
+    error = tooLarge();
+    return std::nullopt;
+  }
   // The whole is read once and then kept by us: it need not stay in the system's cache as well.
   ::posix_fadvise(file->descriptor(), 0, 0, POSIX_FADV_NOREUSE);
-  std::string bytes;
-  const bool isTooLarge = file->size() > kWholeReadLimit;
-  if (!isTooLarge && readToEnd(file->descriptor(), file->size(), kWholeReadLimit, bytes)) {
-    return bytes;
-  }
-  error = isTooLarge || errno == EFBIG ? posixError(EFBIG, "The file is larger than 2 GiB")
-                                       : posixError(errno);
-  return std::nullopt;
+  return ByteSource(file->size(), [file, tooLarge, size = std::uint64_t{0}](
+                                      std::span<char> room, ErrorSlot& failure) mutable {
+    std::optional<std::size_t> count = file->read(room, failure);
+    size += count.value_or(0);
+    if (size > kWholeReadLimit) {
+      failure = tooLarge();
+      count.reset();
+    }
+    return count;
+  });
 }
 
 bool createDirectories(const std::string& path, ErrorSlot& error) {
@@ -84,14 +92,14 @@ bool createDirectories(const std::string& path, ErrorSlot& error) {
     begin = path.find_first_not_of('/', end);
     // What exists is not tried, since a read-only file system may refuse before it looks; and
     // another process may have been quicker.
-    if (!isDirectory(prefix) && ::mkdir(prefix.c_str(), 0777) != 0) {
-      const int failure = errno;
-      if (!isDirectory(prefix)) {
-        const bool isParent = begin != std::string::npos;
-        error = posixError(failure == EEXIST && isParent ? ENOTDIR : failure);
-        return false;
-      }
-    }
+    std::error_code ignored;
+    if (std::filesystem::is_directory(prefix, ignored)) continue;
+    if (::mkdir(prefix.c_str(), 0777) == 0) continue;
+    const int failure = errno;
+    if (std::filesystem::is_directory(prefix, ignored)) continue;
+    const bool isParent = begin != std::string::npos;
+    error = posixError(failure == EEXIST && isParent ? ENOTDIR : failure);
+    return false;
   }
   return true;
 }

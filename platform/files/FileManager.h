@@ -4,6 +4,7 @@
 #include <optional>
 #include <string>
 
+#include "platform/text/ByteSource.h"
 #include "platform/text/ErrorRecord.h"
 
 namespace platform {
@@ -18,9 +19,10 @@ bool fileExists(const std::string& path);
 /// there and cannot be looked at.
 bool mayBeSymbolicLink(const std::string& path);
 
-/// The whole content of a regular file. Anything else (directory, device, FIFO, socket), a file
-/// over kWholeReadLimit and a failed read give no value and fill the slot.
-std::optional<std::string> readWholeFile(const std::string& path, ErrorSlot& error);
+/// The whole content of a regular file, read as it is wanted. Anything else (directory, device,
+/// FIFO, socket) and a file over kWholeReadLimit give no value and fill the slot; a file that grows
+/// beyond the limit meanwhile fails like one that cannot be read any further.
+std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& error);
 
 /// Creates the directory and all missing parents; an existing directory is accepted.
 bool createDirectories(const std::string& path, ErrorSlot& error);

@@ -19,17 +19,6 @@ namespace {
 constexpr std::string_view kWorkingDirectory = ".";
 constexpr std::string_view kParentDirectory = "..";
 
-/// Where the path's last component begins and ends in it.
-struct ComponentRange {
-  std::size_t begin;
-  std::size_t end;
-};
-
-ComponentRange lastComponentRange(std::string_view path) {
-  const std::size_t end = path.find_last_not_of('/') + 1;
-  return {path.substr(0, end).rfind('/') + 1, end};
-}
-
 /// The position of the dot before the extension, npos without one. A name of dots alone ("..") has
 /// none.
 std::size_t extensionDot(std::string_view component) {
@@ -59,8 +48,8 @@ std::string withTildeExpanded(std::string_view path) {
 }  // namespace
 
 std::string_view lastPathComponent(std::string_view path) {
-  const auto [begin, end] = lastComponentRange(path);
-  return path.substr(begin, end - begin);
+  const std::string_view trimmedPath = path.substr(0, path.find_last_not_of('/') + 1);
+  return trimmedPath.substr(trimmedPath.rfind('/') + 1);
 }
 
 std::string_view pathExtension(std::string_view path) {
@@ -70,9 +59,10 @@ std::string_view pathExtension(std::string_view path) {
 }
 
 std::string_view pathWithoutExtension(std::string_view path) {
-  const std::size_t dot = extensionDot(lastPathComponent(path));
-  return dot == std::string_view::npos ? path
-                                       : path.substr(0, lastComponentRange(path).begin + dot);
+  const std::string_view component = lastPathComponent(path);
+  const std::size_t dot = extensionDot(component);
+  if (dot == std::string_view::npos) return path;
+  return path.substr(0, static_cast<std::size_t>(component.data() - path.data()) + dot);
 }
 
 std::string joinedPath(std::string_view parent, std::string_view child) {

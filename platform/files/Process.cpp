@@ -50,7 +50,7 @@ void prepareProcess() {
   }
   keepFreedMemory();
   std::set_new_handler(&endForWantOfMemory);
-  Memory::serveLibraries();
+  Memory::serveICU();
 }
 
 }  // namespace platform

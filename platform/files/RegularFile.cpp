@@ -4,7 +4,6 @@
 #include <sys/stat.h>
 
 #include <cerrno>
-#include <utility>
 
 #include "platform/files/PosixError.h"
 
@@ -19,9 +18,6 @@ bool isRegular(const struct stat& status, ErrorSlot& error) {
 }
 
 }  // namespace
-
-RegularFile::RegularFile(FileDescriptor descriptor, std::uint64_t size)
-    : descriptor_(std::move(descriptor)), size_(size) {}
 
 std::optional<RegularFile> RegularFile::open(const std::string& path, ErrorSlot& error) {
   // Opening a device can act on it, so it is looked at before, and again afterwards in case it was

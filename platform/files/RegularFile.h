@@ -5,6 +5,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <utility>
 
 #include "platform/files/FileDescriptor.h"
 #include "platform/text/ErrorRecord.h"
@@ -25,7 +26,8 @@ class RegularFile {
   std::optional<std::size_t> read(std::span<char> buffer, ErrorSlot& error);
 
  private:
-  RegularFile(FileDescriptor descriptor, std::uint64_t size);
+  RegularFile(FileDescriptor descriptor, std::uint64_t size)
+      : descriptor_(std::move(descriptor)), size_(size) {}
 
   FileDescriptor descriptor_;
   std::uint64_t size_;

@@ -34,9 +34,7 @@ constexpr std::array kEndingSignals = {SIGINT, SIGTERM, SIGHUP};
 /// Empty, and errno set, when the system gives no random bytes.
 std::string hiddenName() {
   std::array<unsigned char, kRandomBytes> random{};
-  if (::getentropy(random.data(), random.size()) != 0) {
-    return {};
-  }
+  if (::getentropy(random.data(), random.size()) != 0) return {};
   std::string name(kNamePrefix);
   for (const unsigned char byte : random) {
     name += kHexDigits[byte >> 4U];
@@ -60,14 +58,6 @@ bool isNamed(int descriptor, const std::string& path) {
   struct stat named {};
   return ::fstat(descriptor, &open) == 0 && ::lstat(path.c_str(), &named) == 0 &&
          open.st_dev == named.st_dev && open.st_ino == named.st_ino;
-}
-
-struct DirectoryCloser {
-  void operator()(DIR* directory) const { ::closedir(directory); }
-};
-
-int moveReplacing(const char* from, const char* to) {
-  return ::rename(from, to);
 }
 
 int moveNew(const char* from, const char* to) {
@@ -130,19 +120,14 @@ class TemporaryFile::Registry {
     *link = std::exchange(file.next_, nullptr);
   }
 
-  [[noreturn]] static void removeAllAndExit(int status) {
-    const Hold hold;
-    unlinkAll();
-    ::_exit(status);
-  }
-
- private:
+  /// Only while the list is held.
   static void unlinkAll() {
     for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
       ::unlink(file->path_.c_str());
     }
   }
 
+ private:
   static void acquire() {
     while (busy_.test_and_set(std::memory_order_acquire)) {
     }
@@ -216,7 +201,7 @@ bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
 }
 
 bool TemporaryFile::commitReplacing(ErrorSlot& error) {
-  return commit(&moveReplacing, error);
+  return commit(&::rename, error);
 }
 
 bool TemporaryFile::commitNew(ErrorSlot& error) {
@@ -225,7 +210,7 @@ bool TemporaryFile::commitNew(ErrorSlot& error) {
 
 bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorSlot& error) {
   // The second descriptor keeps the lock until the file has its final name.
-  const FileDescriptor lockHolder = descriptor_.duplicated();
+  const FileDescriptor lockHolder(::fcntl(descriptor_.get(), F_DUPFD_CLOEXEC, 0));
   if (!lockHolder.isOpen() || !descriptor_.close() ||
       move(path_.c_str(), destination_.c_str()) != 0) {
     error = posixError(errno);
@@ -238,7 +223,9 @@ bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorS
 }
 
 void TemporaryFile::removeAllAndExit(int status) {
-  Registry::removeAllAndExit(status);
+  const Registry::Hold hold;
+  Registry::unlinkAll();
+  ::_exit(status);
 }
 
 void TemporaryFile::discard() {
@@ -259,9 +246,8 @@ bool isTemporaryFileName(std::string_view name) {
 }
 
 void removeStaleTemporaryFiles(const std::string& directory) {
-  // Not by <filesystem>, which ends the process where it gets no memory.
   const std::string parent = directory.empty() ? "." : directory;
-  const std::unique_ptr<DIR, DirectoryCloser> entries(::opendir(parent.c_str()));
+  const std::unique_ptr<DIR, int (*)(DIR*)> entries(::opendir(parent.c_str()), &::closedir);
   if (!entries) return;
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string_view name = entry->d_name;

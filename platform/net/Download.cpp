@@ -8,21 +8,19 @@
 
 #include "platform/files/RegularFile.h"
 #include "platform/files/TemporaryFile.h"
-#include "platform/net/EventSource.h"
+#include "platform/net/EventLoop.h"
 #include "platform/net/NetworkTransfer.h"
 
 namespace platform {
-namespace {
-
-constexpr std::size_t kFileChunkSize = std::size_t{256} * 1024;
-
-}  // namespace
 
 /// Gathers what happened to a download and hands it to the receiver, one event at a time.
-class Download::Transfer : public EventSource {
+class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
  public:
-  Transfer(Download& download, std::string destination, DownloadReceiver& receiver)
-      : download_(download), destination_(std::move(destination)), receiver_(receiver) {}
+  Transfer(Download& download, URL url, std::string destination, DownloadReceiver& receiver)
+      : url_(std::move(url)),
+        download_(download),
+        destination_(std::move(destination)),
+        receiver_(receiver) {}
 
   bool hasEvent() const override { return response_.has_value() || writtenLength_ > 0; }
   void deliverEvent() final;
@@ -32,17 +30,19 @@ class Download::Transfer : public EventSource {
   /// an error when that failed.
   virtual bool advance(ErrorSlot& error) = 0;
 
-  bool beginFile(std::int64_t expectedLength, ErrorSlot& error) {
+  bool begin(std::int64_t expectedLength, std::string_view, ErrorSlot& error) final {
     if (!file_.create(destination_, error)) return false;
     response_ = expectedLength;
     return true;
   }
 
-  bool append(std::string_view bytes, ErrorSlot& error) {
+  bool take(std::string_view bytes, ErrorSlot& error) final {
     if (!file_.write(bytes, error)) return false;
     writtenLength_ += bytes.size();
     return true;
   }
+
+  URL url_;
 
  private:
   void finish(ErrorSlot error);
@@ -81,11 +81,9 @@ void Download::Transfer::finish(ErrorSlot error) {
   }
 }
 
-class Download::NetworkDownload final : public Transfer, private NetworkTransfer::Sink {
+class Download::NetworkDownload final : public Transfer {
  public:
-  NetworkDownload(const URL& url, const std::string& destination, Download& download,
-                  DownloadReceiver& receiver)
-      : Transfer(download, destination, receiver), network_(url, nullptr, *this) {}
+  using Transfer::Transfer;
 
   bool hasEvent() const override { return Transfer::hasEvent() || network_.hasEnded(); }
 
@@ -94,31 +92,24 @@ class Download::NetworkDownload final : public Transfer, private NetworkTransfer
     error = network_.error();
     return false;
   }
-  bool begin(std::int64_t expectedLength, std::string_view, ErrorSlot& error) override {
-    return beginFile(expectedLength, error);
-  }
-  bool take(std::string_view bytes, ErrorSlot& error) override { return append(bytes, error); }
 
-  NetworkTransfer network_;
+  NetworkTransfer network_{url_, nullptr, *this};
 };
 
 class Download::FileDownload final : public Transfer {
  public:
-  FileDownload(const URL& url, const std::string& destination, Download& download,
-               DownloadReceiver& receiver)
-      : Transfer(download, destination, receiver), path_(url.path()) {}
+  using Transfer::Transfer;
 
   bool hasEvent() const override { return true; }
 
  private:
   bool advance(ErrorSlot& error) override {
     if (source_) return copyChunk(error);
-    source_ = RegularFile::open(path_, error);
-    return source_ && beginFile(static_cast<std::int64_t>(source_->size()), error);
+    source_ = RegularFile::open(url_.path(), error);
+    return source_ && begin(static_cast<std::int64_t>(source_->size()), {}, error);
   }
 
   bool copyChunk(ErrorSlot& error) {
-    if (buffer_.empty()) buffer_.resize(kFileChunkSize);
     const std::optional<std::size_t> length = source_->read(buffer_, error);
     if (!length) return false;
     if (*length == 0) {
@@ -128,20 +119,19 @@ class Download::FileDownload final : public Transfer {
       return false;
     }
     copiedLength_ += *length;
-    return append({buffer_.data(), *length}, error);
+    return take({buffer_.data(), *length}, error);
   }
 
-  std::string path_;
   std::optional<RegularFile> source_;
-  std::vector<char> buffer_;
+  std::vector<char> buffer_ = std::vector<char>(std::size_t{256} << 10U);
   std::uint64_t copiedLength_ = 0;
 };
 
 Download::Download(const URL& url, const std::string& destination, DownloadReceiver& receiver) {
   if (url.scheme() == "file") {
-    transfer_ = std::make_unique<FileDownload>(url, destination, *this, receiver);
+    transfer_ = std::make_unique<FileDownload>(*this, url, destination, receiver);
   } else {
-    transfer_ = std::make_unique<NetworkDownload>(url, destination, *this, receiver);
+    transfer_ = std::make_unique<NetworkDownload>(*this, url, destination, receiver);
   }
 }
 

@@ -1,6 +1,5 @@
 #include "platform/net/EventLoop.h"
 
-#include "platform/net/EventSource.h"
 #include "platform/net/NetworkTransfer.h"
 
 namespace platform {

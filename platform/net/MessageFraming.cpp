@@ -11,11 +11,6 @@
 namespace platform {
 namespace {
 
-constexpr std::string_view kNoNumber = "The announced length is no number";
-constexpr std::string_view kTooLarge = "The announced length cannot be true";
-constexpr std::string_view kTwoLengths = "The announced lengths contradict each other";
-constexpr std::string_view kUnknownCoding =
-    "The body comes in a transfer coding that was not asked for";
 constexpr std::string_view kBrokenField = "The header does not tell where the body ends";
 
 }  // namespace
@@ -43,44 +38,35 @@ void MessageFraming::takeLine(std::string_view line) {
     fault_ = kBrokenField;
     return;
   }
-  const std::string_view value = line.substr(colon + 1);
-  if (field_ == Field::kLength) {
-    takeLengths(value);
-  } else {
-    takeCodings(value);
+  for (const std::string_view piece : splitAt(line.substr(colon + 1), ',')) {
+    if (field_ == Field::kLength) {
+      takeLength(trimmed(piece));
+    } else {
+      takeCoding(lowercased(trimmed(piece)));
+    }
   }
 }
 
-std::optional<std::uint64_t> MessageFraming::length() const {
-  return isChunked_ ? std::nullopt : length_;
-}
-
-void MessageFraming::takeLengths(std::string_view value) {
+void MessageFraming::takeLength(std::string_view digits) {
   constexpr std::uint64_t kLargest = std::numeric_limits<std::int64_t>::max();
-  for (const std::string_view piece : splitAt(value, ',')) {
-    const std::string_view digits = trimmed(piece);
-    const char* const end = digits.data() + digits.size();
-    std::uint64_t length = 0;
-    const std::from_chars_result result = std::from_chars(digits.data(), end, length);
-    if (result.ptr != end || result.ec == std::errc::invalid_argument) {
-      fault_ = kNoNumber;
-    } else if (result.ec == std::errc::result_out_of_range || length > kLargest) {
-      fault_ = kTooLarge;
-    } else if (length_ && *length_ != length) {
-      fault_ = kTwoLengths;
-    }
-    length_ = length;
+  const char* const end = digits.data() + digits.size();
+  std::uint64_t length = 0;
+  const std::from_chars_result result = std::from_chars(digits.data(), end, length);
+  if (result.ptr != end || result.ec == std::errc::invalid_argument) {
+    fault_ = "The announced length is no number";
+  } else if (result.ec == std::errc::result_out_of_range || length > kLargest) {
+    fault_ = "The announced length cannot be true";
+  } else if (length_ && *length_ != length) {
+    fault_ = "The announced lengths contradict each other";
   }
+  length_ = length;
 }
 
-void MessageFraming::takeCodings(std::string_view value) {
-  for (const std::string_view piece : splitAt(value, ',')) {
-    const std::string coding = lowercased(trimmed(piece));
-    if (coding == "chunked") {
-      isChunked_ = true;
-    } else if (!coding.empty() && coding != "identity") {
-      fault_ = kUnknownCoding;
-    }
+void MessageFraming::takeCoding(std::string_view name) {
+  if (name == "chunked") {
+    isChunked_ = true;
+  } else if (!name.empty() && name != "identity") {
+    fault_ = "The body comes in a transfer coding that was not asked for";
   }
 }
 

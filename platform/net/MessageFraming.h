@@ -21,13 +21,13 @@ class MessageFraming {
   std::string_view fault() const { return fault_; }
 
   /// The announced length; absent without one, and for a body in chunks, which end by themselves.
-  std::optional<std::uint64_t> length() const;
+  std::optional<std::uint64_t> length() const { return isChunked_ ? std::nullopt : length_; }
 
  private:
   enum class Field { kLength, kCoding, kOther };
 
-  void takeLengths(std::string_view value);
-  void takeCodings(std::string_view value);
+  void takeLength(std::string_view digits);
+  void takeCoding(std::string_view name);
 
   Field field_ = Field::kOther;  // of the last line
   std::optional<std::uint64_t> length_;

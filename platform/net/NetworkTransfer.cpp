@@ -75,31 +75,21 @@ class NetworkTransfer::Connections {
   }
 
  private:
-  struct Closer {
-    void operator()(CURLM* handle) const { library().multiCleanup(handle); }
-  };
-
-  std::unique_ptr<CURLM, Closer> handle_{library().multiInit()};
+  std::unique_ptr<CURLM, decltype(library().multiCleanup)> handle_{library().multiInit(),
+                                                                   library().multiCleanup};
   std::vector<NetworkTransfer*> running_;
 };
-
-void NetworkTransfer::HandleCloser::operator()(CURL* handle) const {
-  library().easyCleanup(handle);
-}
 
 NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink)
     : sink_(sink) {
   if (url.scheme() != "http" && url.scheme() != "https") {
     error_ = transferError(CURLE_UNSUPPORTED_PROTOCOL,
                            "URLs of the scheme \"" + url.scheme() + "\" are not supported");
-    ended_ = true;
-    return;
-  }
-  if (TransferLibrary::error()) {
+  } else {
     error_ = TransferLibrary::error();
-    ended_ = true;
-    return;
   }
+  ended_ = error_.has_value();
+  if (ended_) return;
   Connections& connections = Connections::ofThisThread();
   CURLcode result = configure(url, acceptedEncoding);
   if (result == CURLE_OK) result = connections.add(*this);
@@ -119,7 +109,7 @@ std::size_t NetworkTransfer::callback(char* bytes, std::size_t size, std::size_t
 }
 
 CURLcode NetworkTransfer::configure(const URL& url, const char* acceptedEncoding) {
-  handle_.reset(library().easyInit());
+  handle_ = {library().easyInit(), library().easyCleanup};
   CURLcode result = CURLE_OK;
   const auto set = [this, &result](CURLoption option, auto value) {
     if (result == CURLE_OK) result = library().easySetopt(handle_.get(), option, value);
@@ -165,6 +155,9 @@ void NetworkTransfer::end(CURLcode result) {
   Connections::ofThisThread().remove(*this);
   ended_ = true;
   if (error_) return;
+  curl_off_t firstByteTime = 0;
+  library().easyGetinfo(handle_.get(), CURLINFO_STARTTRANSFER_TIME_T, &firstByteTime);
+  const bool isInHeader = firstByteTime > 0 && !begun_;
   // A failed status is the cause, however its page ended.
   const bool hasFailedStatus = !begun_ && (result == CURLE_OK || status() >= 400);
   if (!begun_ && result == CURLE_OK && status() == 200) {
@@ -173,27 +166,13 @@ void NetworkTransfer::end(CURLcode result) {
     error_ = {"HTTP", status(), "HTTP status " + std::to_string(status())};
   } else if (result == CURLE_ABORTED_BY_CALLBACK) {
     error_ = transferError(CURLE_FILESIZE_EXCEEDED, "The page of a redirect is larger than 16 MiB");
-  } else if (result == CURLE_OUT_OF_MEMORY && isInHeader()) {
+  } else if (result == CURLE_OUT_OF_MEMORY && isInHeader) {
     // What the library says of a line beyond its limit.
     error_ = transferError(result, "A line of the answer's header is too long");
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
     error_ = transferError(result, detail.empty() ? library().easyStrerror(result) : detail);
   }
-}
-
-bool NetworkTransfer::isInHeader() const {
-  curl_off_t firstByteTime = 0;
-  library().easyGetinfo(handle_.get(), CURLINFO_STARTTRANSFER_TIME_T, &firstByteTime);
-  return firstByteTime > 0 && !begun_;
-}
-
-std::optional<std::string> NetworkTransfer::headerValue(const char* name) const {
-  curl_header* header = nullptr;
-  if (library().easyHeader(handle_.get(), name, 0, CURLH_HEADER, -1, &header) != CURLHE_OK) {
-    return std::nullopt;
-  }
-  return header->value;
 }
 
 bool NetworkTransfer::didReceiveHeaderLine(std::string_view line) {
@@ -218,8 +197,10 @@ bool NetworkTransfer::didReceiveHeader() {
   if (status != 200) return true;
   begun_ = true;
   const std::optional<std::uint64_t> length = framing_.length();
+  curl_header* coding = nullptr;
+  library().easyHeader(handle_.get(), "Content-Encoding", 0, CURLH_HEADER, -1, &coding);
   return sink_.begin(length ? static_cast<std::int64_t>(*length) : -1,
-                     headerValue("Content-Encoding").value_or(""), error_);
+                     coding != nullptr ? coding->value : "", error_);
 }
 
 bool NetworkTransfer::didReceiveBody(std::string_view bytes) {

@@ -52,17 +52,10 @@ class NetworkTransfer {
 
  private:
   class Connections;
-  struct HandleCloser {
-    void operator()(CURL* handle) const;
-  };
 
   CURLcode configure(const URL& url, const char* acceptedEncoding);
   void end(CURLcode result);
   int status() const;
-  /// Whether the end came before the body, but not before the first byte of the answer.
-  bool isInHeader() const;
-  /// Of the final response so far; absent when it has no such header.
-  std::optional<std::string> headerValue(const char* name) const;
   bool didReceiveHeaderLine(std::string_view line);
   bool didReceiveHeader();
   bool didReceiveBody(std::string_view bytes);
@@ -79,7 +72,7 @@ class NetworkTransfer {
   std::uint64_t headerSize_ = 0;   // of all answers so far, trailers included
   std::uint64_t ignoredSize_ = 0;  // of the body of another status
   std::array<char, CURL_ERROR_SIZE> errorText_{};
-  std::unique_ptr<CURL, HandleCloser> handle_;
+  std::unique_ptr<CURL, void (*)(CURL*)> handle_{nullptr, nullptr};
 };
 
 }  // namespace platform

@@ -8,6 +8,7 @@
 
 #include "platform/net/GzipDecoder.h"
 #include "platform/net/NetworkTransfer.h"
+#include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
 #include "platform/text/Splitting.h"
 
@@ -30,10 +31,9 @@ class BodyCollector : public NetworkTransfer::Sink {
   bool begin(std::int64_t expectedLength, std::string_view contentEncoding,
              ErrorSlot& error) override {
     if (!beginDecoding(lowercased(contentEncoding), error)) return false;
-    if (decoder_) return true;
-    if (expectedLength <= 0) return true;
+    if (decoder_ || expectedLength <= 0) return true;
     const auto length = static_cast<std::uint64_t>(expectedLength);
-    if (length > limit_) return failAsTooLarge(error);
+    if (length > limit_) return refuseAsTooLarge(error);
     // The announcement may be a lie; beyond this the body grows as its bytes come.
     constexpr std::uint64_t kLargestReservation = std::uint64_t{16} << 20U;
     body_.reserve(static_cast<std::size_t>(std::min(length, kLargestReservation)));
@@ -45,33 +45,26 @@ class BodyCollector : public NetworkTransfer::Sink {
     if (!decoder_) return append(bytes, error);
     const auto sink = [this, &error](std::string_view piece) { return append(piece, error); };
     if (decoder_->decode(bytes, sink)) return true;
-    if (!error) {
-      error = transferError(CURLE_BAD_CONTENT_ENCODING, "The compressed body is malformed");
-    }
-    return false;
+    return !error && refuseCoding("The compressed body is malformed", error);
   }
 
   /// The body once all bytes have come.
   std::optional<std::string> finish(ErrorSlot& error) {
-    if (decoder_ && !decoder_->isWhole()) {
-      error = transferError(CURLE_BAD_CONTENT_ENCODING, "The compressed body is cut short");
-      return std::nullopt;
-    }
-    return std::move(body_);
+    if (!decoder_ || decoder_->isWhole()) return std::move(body_);
+    refuseCoding("The compressed body is cut short", error);
+    return std::nullopt;
   }
 
  private:
   /// Servers name codings that are none ("utf-8"), so only those that are known to need decoding
   /// are refused; what an unknown name stands for shows in the document.
   bool beginDecoding(const std::string& codings, ErrorSlot& error) {
-    const std::string names = replacingAll(codings, " ", "");
-    for (const std::string_view piece : splitAt(names, ',')) {
-      const bool isGzip = isOneOf(piece, {"gzip", "x-gzip"});
+    for (const std::string_view piece : splitAt(codings, ',')) {
+      const std::string_view name = trimmed(piece);
+      const bool isGzip = isOneOf(name, {"gzip", "x-gzip"});
       if ((isGzip && decoder_) ||
-          isOneOf(piece, {"br", "compress", "x-compress", "deflate", "zstd"})) {
-        error = transferError(CURLE_BAD_CONTENT_ENCODING,
-                              "The body comes in a content coding that was not asked for");
-        return false;
+          isOneOf(name, {"br", "compress", "x-compress", "deflate", "zstd"})) {
+        return refuseCoding("The body comes in a content coding that was not asked for", error);
       }
       if (isGzip) decoder_.emplace();
     }
@@ -79,7 +72,7 @@ class BodyCollector : public NetworkTransfer::Sink {
   }
 
   bool append(std::string_view bytes, ErrorSlot& error) {
-    if (bytes.size() > limit_ - body_.size()) return failAsTooLarge(error);
+    if (bytes.size() > limit_ - body_.size()) return refuseAsTooLarge(error);
     const std::uint64_t size = body_.size() + bytes.size();
     if (size > kAnyRatioSize && size / kLargestRatio > receivedSize_) {
       error = transferError(CURLE_FILESIZE_EXCEEDED,
@@ -90,7 +83,12 @@ class BodyCollector : public NetworkTransfer::Sink {
     return true;
   }
 
-  bool failAsTooLarge(ErrorSlot& error) const {
+  static bool refuseCoding(std::string_view cause, ErrorSlot& error) {
+    error = transferError(CURLE_BAD_CONTENT_ENCODING, cause);
+    return false;
+  }
+
+  bool refuseAsTooLarge(ErrorSlot& error) const {
     error = transferError(CURLE_FILESIZE_EXCEEDED,
                           "The resource is larger than " + std::to_string(limit_) + " bytes");
     return false;
@@ -104,8 +102,8 @@ class BodyCollector : public NetworkTransfer::Sink {
 
 }  // namespace
 
-std::optional<std::string> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit) {
-  if (url.scheme() == "file") return readWholeFile(url.path(), error);
+std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit) {
+  if (url.scheme() == "file") return openWholeFile(url.path(), error);
 
   BodyCollector collector(limit);
   const NetworkTransfer transfer(url, "gzip", collector);

@@ -2,22 +2,23 @@
 
 #include <cstdint>
 #include <optional>
-#include <string>
 
 #include "platform/files/FileManager.h"
 #include "platform/net/URL.h"
+#include "platform/text/ByteSource.h"
 #include "platform/text/ErrorRecord.h"
 
 namespace platform {
 
-/// Reads the whole resource of a URL (http, https, file:) into memory in one blocking call.
+/// The whole resource of a URL: read into memory in one blocking call over http and https, as it is
+/// wanted from a file.
 ///
 /// http and https: a final status of 200 is success and nothing else is; at most 20 redirects, to
 /// http and https only; a compressed body is asked for and decompressed; a body cut short is a
 /// failure. On any failure gives no value and fills the slot. More than `limit` bytes, counted
 /// after decompression, are a failure too, and so are more than 64 MiB that are over 100 times
-/// their compressed size; a file: URL has the limit kWholeReadLimit.
-std::optional<std::string> readResource(const URL& url, ErrorSlot& error,
-                                        std::uint64_t limit = kWholeReadLimit);
+/// their compressed size. For a file: URL see openWholeFile.
+std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error,
+                                       std::uint64_t limit = kWholeReadLimit);
 
 }  // namespace platform

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <string>
 #include <string_view>
-#include <type_traits>
 #include <utility>
 
 #include "platform/text/Memory.h"
@@ -37,34 +36,15 @@ ErrorRecord transferError(CURLcode code, std::string_view description) {
   return {"transfer", code, std::move(shown)};
 }
 
-TransferLibrary::TransferLibrary() {
+TransferLibrary::Symbol TransferLibrary::find(const char* name) {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
-  void* const library = dlopen(kFile, RTLD_LAZY | RTLD_LOCAL);
-  if (library == nullptr) {
-    error_ = loadingError();
-    return;
-  }
-  const auto find = [this, library](auto& function, const char* name) {
-    function = reinterpret_cast<std::decay_t<decltype(function)>>(dlsym(library, name));
-    if (function == nullptr && !error_) error_ = loadingError();
-  };
-  find(globalInit, "curl_global_init_mem");
-  find(easyInit, "curl_easy_init");
-  find(easyCleanup, "curl_easy_cleanup");
-  find(easySetopt, "curl_easy_setopt");
-  find(easyGetinfo, "curl_easy_getinfo");
-  find(easyHeader, "curl_easy_header");
-  find(easyStrerror, "curl_easy_strerror");
-  find(multiInit, "curl_multi_init");
-  find(multiCleanup, "curl_multi_cleanup");
-  find(multiAddHandle, "curl_multi_add_handle");
-  find(multiRemoveHandle, "curl_multi_remove_handle");
-  find(multiPoll, "curl_multi_poll");
-  find(multiPerform, "curl_multi_perform");
-  find(multiInfoRead, "curl_multi_info_read");
-  find(url, "curl_url");
-  find(urlCleanup, "curl_url_cleanup");
-  find(urlSet, "curl_url_set");
+  static void* const file = dlopen(kFile, RTLD_LAZY | RTLD_LOCAL);
+  void* const address = file != nullptr ? dlsym(file, name) : nullptr;
+  if (address == nullptr && !error_) error_ = loadingError();
+  return {address};
+}
+
+TransferLibrary::TransferLibrary() {
   if (error_) return;
   const CURLcode result =
       globalInit(CURL_GLOBAL_DEFAULT, &Memory::allocate, &Memory::release, &Memory::reallocate,

@@ -27,29 +27,41 @@ class TransferLibrary {
   /// Why there are no functions; empty when there are.
   static const ErrorSlot& error() { return instance().error_; }
 
-  decltype(&::curl_global_init_mem) globalInit = nullptr;
-  decltype(&::curl_easy_init) easyInit = nullptr;
-  decltype(&::curl_easy_cleanup) easyCleanup = nullptr;
-  decltype(&::curl_easy_setopt) easySetopt = nullptr;
-  decltype(&::curl_easy_getinfo) easyGetinfo = nullptr;
-  decltype(&::curl_easy_header) easyHeader = nullptr;
-  decltype(&::curl_easy_strerror) easyStrerror = nullptr;
-  decltype(&::curl_multi_init) multiInit = nullptr;
-  decltype(&::curl_multi_cleanup) multiCleanup = nullptr;
-  decltype(&::curl_multi_add_handle) multiAddHandle = nullptr;
-  decltype(&::curl_multi_remove_handle) multiRemoveHandle = nullptr;
-  decltype(&::curl_multi_poll) multiPoll = nullptr;
-  decltype(&::curl_multi_perform) multiPerform = nullptr;
-  decltype(&::curl_multi_info_read) multiInfoRead = nullptr;
-  decltype(&::curl_url) url = nullptr;
-  decltype(&::curl_url_cleanup) urlCleanup = nullptr;
-  decltype(&::curl_url_set) urlSet = nullptr;
-
  private:
+  /// The address of a function of whatever type.
+  struct Symbol {
+    void* address;
+    template <typename Function>
+    operator Function*() const {
+      return reinterpret_cast<Function*>(address);
+    }
+  };
+
   TransferLibrary();
   static const TransferLibrary& instance();
+  /// Looks a function up. The first failure becomes the error.
+  Symbol find(const char* name);
 
-  ErrorSlot error_;
+  ErrorSlot error_;  // before the functions, as finding them fills it
+
+ public:
+  decltype(&::curl_global_init_mem) globalInit = find("curl_global_init_mem");
+  decltype(&::curl_easy_init) easyInit = find("curl_easy_init");
+  decltype(&::curl_easy_cleanup) easyCleanup = find("curl_easy_cleanup");
+  decltype(&::curl_easy_setopt) easySetopt = find("curl_easy_setopt");
+  decltype(&::curl_easy_getinfo) easyGetinfo = find("curl_easy_getinfo");
+  decltype(&::curl_easy_header) easyHeader = find("curl_easy_header");
+  decltype(&::curl_easy_strerror) easyStrerror = find("curl_easy_strerror");
+  decltype(&::curl_multi_init) multiInit = find("curl_multi_init");
+  decltype(&::curl_multi_cleanup) multiCleanup = find("curl_multi_cleanup");
+  decltype(&::curl_multi_add_handle) multiAddHandle = find("curl_multi_add_handle");
+  decltype(&::curl_multi_remove_handle) multiRemoveHandle = find("curl_multi_remove_handle");
+  decltype(&::curl_multi_poll) multiPoll = find("curl_multi_poll");
+  decltype(&::curl_multi_perform) multiPerform = find("curl_multi_perform");
+  decltype(&::curl_multi_info_read) multiInfoRead = find("curl_multi_info_read");
+  decltype(&::curl_url) url = find("curl_url");
+  decltype(&::curl_url_cleanup) urlCleanup = find("curl_url_cleanup");
+  decltype(&::curl_url_set) urlSet = find("curl_url_set");
 };
 
 }  // namespace platform

@@ -4,9 +4,11 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <system_error>
 
 #include "platform/net/TransferLibrary.h"
 #include "platform/text/ASCII.h"
@@ -21,11 +23,22 @@ bool isPercentTriplet(std::string_view text, std::size_t at) {
          hexDigitValue(text[at + 2]) >= 0;
 }
 
-void appendPercentEncoded(std::string& output, char c) {
-  const auto byte = static_cast<unsigned char>(c);
-  output += '%';
-  output += kCapitalHexDigits[byte >> 4U];
-  output += kCapitalHexDigits[byte & 0xFU];
+/// The text with all bytes percent-encoded but those that the predicate keeps.
+template <typename Predicate>
+std::string percentEncoded(std::string_view text, Predicate isKept) {
+  std::string encoded;
+  encoded.reserve(text.size());
+  for (const char c : text) {
+    if (isKept(c)) {
+      encoded += c;
+      continue;
+    }
+    const auto byte = static_cast<unsigned char>(c);
+    encoded += '%';
+    encoded += kCapitalHexDigits[byte >> 4U];
+    encoded += kCapitalHexDigits[byte & 0xFU];
+  }
+  return encoded;
 }
 
 /// Only characters that RFC 3986 knows, and those of well-formed UTF-8 that are no control
@@ -97,15 +110,11 @@ std::optional<Authority> authorityOf(std::string_view text) {
 
 /// Decimal digits of a number up to 65535 behind a colon; none at all is the scheme's own port.
 bool isPort(std::string_view text) {
-  if (text.empty()) return true;
-  if (text.front() != ':') return false;
-  unsigned number = 0;
-  for (const char c : text.substr(1)) {
-    if (!isASCIIDigit(c)) return false;
-    number = number * 10 + static_cast<unsigned>(c - '0');
-    if (number > 65535) return false;
-  }
-  return true;
+  if (text.empty() || text == ":") return true;
+  const char* const end = text.data() + text.size();
+  std::uint16_t number = 0;
+  const std::from_chars_result result = std::from_chars(text.data() + 1, end, number);
+  return text.front() == ':' && result.ec == std::errc() && result.ptr == end;
 }
 
 bool isWellFormed(const Authority& authority) {
@@ -145,16 +154,7 @@ std::optional<std::string> hostInASCII(std::string_view host) {
 }
 
 std::string nonASCIIEncoded(std::string_view text) {
-  std::string encoded;
-  encoded.reserve(text.size());
-  for (const char c : text) {
-    if (isASCII(c)) {
-      encoded += c;
-    } else {
-      appendPercentEncoded(encoded, c);
-    }
-  }
-  return encoded;
+  return percentEncoded(text, [](char c) { return isASCII(c); });
 }
 
 bool isAcceptedByTransferLibrary(const std::string& encodedText) {
@@ -226,16 +226,10 @@ std::string percentDecoded(std::string_view text) {
 
 std::string fileURLText(std::string_view absolutePath) {
   constexpr std::string_view kAllowedMarks = "-._~!$&'()*+,;=:@/";
-  std::string text = "file://";
-  text.reserve(text.size() + absolutePath.size());
-  for (const char c : absolutePath) {
-    if (isASCIILetter(c) || isASCIIDigit(c) || kAllowedMarks.find(c) != std::string_view::npos) {
-      text += c;
-    } else {
-      appendPercentEncoded(text, c);
-    }
-  }
-  return text;
+  return "file://" + percentEncoded(absolutePath, [=](char c) {
+           return isASCIILetter(c) || isASCIIDigit(c) ||
+                  kAllowedMarks.find(c) != std::string_view::npos;
+         });
 }
 
 }  // namespace platform

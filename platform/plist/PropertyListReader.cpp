@@ -7,14 +7,18 @@
 
 namespace platform {
 
-std::optional<PropertyListValue> readPropertyList(std::string bytes,
+std::optional<PropertyListValue> readPropertyList(ByteSource bytes,
                                                   std::optional<PropertyListFault>& fault) {
-  if (bytes.empty()) {
-    fault = PropertyListFault{.description = "an empty property list"};
-    return std::nullopt;
+  ErrorSlot error;
+  const std::string_view head = bytes.head(error);
+  if (head.starts_with("bplist")) {
+    const std::optional<std::string> all = bytes.readAll(error);
+    if (all) return readBinaryPropertyList(*all, fault);
+  } else if (!head.empty()) {
+    return readXMLPropertyList(std::move(bytes), fault);
   }
-  if (bytes.starts_with("bplist")) return readBinaryPropertyList(bytes, fault);
-  return readXMLPropertyList(std::move(bytes), fault);
+  fault = PropertyListFault{.description = error ? error->description : "an empty property list"};
+  return std::nullopt;
 }
 
 }  // namespace platform

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "platform/plist/PropertyListValue.h"
+#include "platform/text/ByteSource.h"
 #include "platform/xml/TextPosition.h"
 
 namespace platform {
@@ -35,7 +36,7 @@ struct PropertyListFault {
 /// are no Unicode (lone surrogates, bytes over 127 in ASCII) become U+FFFD. Where a dictionary has
 /// a key twice, the last one counts. The binary form's null, fill and UID objects have no place in
 /// a property list and are refused; a set is read as an array.
-std::optional<PropertyListValue> readPropertyList(std::string bytes,
+std::optional<PropertyListValue> readPropertyList(ByteSource bytes,
                                                   std::optional<PropertyListFault>& fault);
 
 }  // namespace platform

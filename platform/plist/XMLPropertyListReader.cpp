@@ -94,7 +94,7 @@ constexpr auto kElements = std::to_array<Element>({
 /// Reads one list.
 class Reader final : private XMLParserEvents {
  public:
-  explicit Reader(std::string bytes) : parser_(std::move(bytes), *this) {}
+  explicit Reader(ByteSource bytes) : parser_(std::move(bytes), *this) {}
 
   Value read(std::optional<PropertyListFault>& fault) {
     std::optional<XMLFault> found;
@@ -199,7 +199,7 @@ class Reader final : private XMLParserEvents {
 
 }  // namespace
 
-std::optional<PropertyListValue> readXMLPropertyList(std::string bytes,
+std::optional<PropertyListValue> readXMLPropertyList(ByteSource bytes,
                                                      std::optional<PropertyListFault>& fault) {
   return Reader(std::move(bytes)).read(fault);
 }

@@ -1,14 +1,13 @@
 #pragma once
 
 #include <optional>
-#include <string>
 
 #include "platform/plist/PropertyListReader.h"
 
 namespace platform {
 
 /// Reads the XML form of a property list, for readPropertyList; without a value, with the fault.
-std::optional<PropertyListValue> readXMLPropertyList(std::string bytes,
+std::optional<PropertyListValue> readXMLPropertyList(ByteSource bytes,
                                                      std::optional<PropertyListFault>& fault);
 
 }  // namespace platform

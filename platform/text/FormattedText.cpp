@@ -21,7 +21,8 @@ void appendNumber(std::string& result, Number... numberAndFormat) {
   result.append(static_cast<const char*>(characters.data()), end);
 }
 
-void append(std::string& result, const FormatArgument::Value& value) {
+void append(std::string& result, const FormatArgument& argument) {
+  const auto& value = argument.value;
   if (const auto* text = std::get_if<std::optional<std::string_view>>(&value)) {
     result.append(text->value_or("(null)"));
   } else if (const auto* number = std::get_if<std::int64_t>(&value)) {
@@ -49,7 +50,7 @@ std::string formattedText(std::string_view format,
         std::find_if(kPlaceholders.begin(), kPlaceholders.end(),
                      [&](std::string_view known) { return format.starts_with(known); });
     if (placeholder != kPlaceholders.end()) {
-      append(result, argument == arguments.end() ? FormatArgument::Value() : (argument++)->value());
+      append(result, argument == arguments.end() ? std::nullopt : *argument++);
       format.remove_prefix(placeholder->size());
     } else {
       result.push_back('%');  // of "%%", or of something that is no placeholder and stays

@@ -11,26 +11,15 @@
 namespace platform {
 
 /// One value for a placeholder of `formattedText`.
-class FormatArgument {
- public:
-  template <typename TextType>
-  requires std::convertible_to<const TextType&, std::string_view> FormatArgument(
-      const TextType& text)
-      : value_(std::optional<std::string_view>(std::string_view(text))) {}
+struct FormatArgument {
   /// An absent text is inserted as "(null)".
-  template <typename TextType>
-  requires std::convertible_to<const TextType&, std::string_view> FormatArgument(
-      const std::optional<TextType>& text)
-      : value_(text ? std::optional<std::string_view>(std::string_view(*text)) : std::nullopt) {}
-  FormatArgument(std::signed_integral auto number) : value_(std::int64_t{number}) {}
-  FormatArgument(std::unsigned_integral auto number) : value_(std::uint64_t{number}) {}
-  FormatArgument(double number) : value_(number) {}
+  template <std::convertible_to<std::optional<std::string_view>> TextType>
+  FormatArgument(const TextType& text) : value(std::optional<std::string_view>(text)) {}
+  FormatArgument(std::signed_integral auto number) : value(std::int64_t{number}) {}
+  FormatArgument(std::unsigned_integral auto number) : value(std::uint64_t{number}) {}
+  FormatArgument(double number) : value(number) {}
 
-  using Value = std::variant<std::optional<std::string_view>, std::int64_t, std::uint64_t, double>;
-  const Value& value() const { return value_; }
-
- private:
-  Value value_;
+  std::variant<std::optional<std::string_view>, std::int64_t, std::uint64_t, double> value;
 };
 
 /// The format with its placeholders replaced by the arguments in order, as printf does it: "%@" and

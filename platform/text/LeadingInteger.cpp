@@ -8,19 +8,13 @@
 #include "platform/text/Characters.h"
 
 namespace platform {
-namespace {
-
-bool isLineBreak(std::int32_t character) {
-  return character >= '\n' && character <= '\r';
-}
-
-}  // namespace
 
 std::int64_t leadingInteger(std::string_view text) {
   std::size_t start = 0;
   for (std::size_t position = 0; position < text.size(); start = position) {
     const std::int32_t character = nextCharacter(text, position);
-    if (!isHorizontalWhitespace(character) && !isLineBreak(character)) break;
+    const bool isLineBreak = character >= '\n' && character <= '\r';
+    if (!isLineBreak && !isHorizontalWhitespace(character)) break;
   }
   text.remove_prefix(start);
   if (text.starts_with('+')) {

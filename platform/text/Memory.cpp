@@ -49,7 +49,7 @@ void Memory::release(void* block) {
   std::free(block);
 }
 
-void Memory::serveLibraries() {
+void Memory::serveICU() {
   UErrorCode status = U_ZERO_ERROR;
   u_setMemoryFunctions(
       nullptr, [](const void*, std::size_t size) { return allocate(size); },

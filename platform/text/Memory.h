@@ -20,7 +20,7 @@ class Memory {
 
   /// Gives ICU, which has one source of memory for the whole process, this one. To be called before
   /// its first use; without it, ICU uses the C library's.
-  static void serveLibraries();
+  static void serveICU();
 };
 
 }  // namespace platform

@@ -13,8 +13,6 @@
 #include <limits>
 #include <utility>
 
-#include "platform/time/TimeZone.h"
-
 namespace platform {
 namespace {
 
@@ -55,47 +53,36 @@ icu::Locale locale(std::string_view name) {
 
 }  // namespace
 
-class DateFormatter::Implementation {
- public:
-  explicit Implementation(std::string_view pattern)
-      : format_(icu::UnicodeString::fromUTF8(icu::StringPiece(pattern)), locale(localeVariable()),
-                status_) {
-    if (U_FAILURE(status_) != 0) return;
-    // The calendars of some locales are not Gregorian, or count their years otherwise; those that
-    // are follow the rules of GregorianCalendar before the year 1582 too.
-    std::unique_ptr<icu::Calendar> calendar(format_.getCalendar()->clone());
-    if (auto* gregorian = dynamic_cast<icu::GregorianCalendar*>(calendar.get())) {
-      gregorian->setGregorianChange(std::numeric_limits<UDate>::lowest(), status_);
-      format_.adoptCalendar(calendar.release());
-    }
+DateFormatter::DateFormatter(std::string_view pattern) {
+  UErrorCode status = U_ZERO_ERROR;
+  format_ = std::make_unique<icu::SimpleDateFormat>(
+      icu::UnicodeString::fromUTF8(icu::StringPiece(pattern)), locale(localeVariable()), status);
+  if (U_FAILURE(status) != 0) {
+    format_.reset();
+    return;
   }
-
-  std::string format(PointInTime date) const {
-    std::string result;
-    if (U_FAILURE(status_) != 0) return result;
-    const std::unique_ptr<icu::Calendar> calendar(format_.getCalendar()->clone());
-    calendar->adoptTimeZone(new icu::SimpleTimeZone(
-        static_cast<std::int32_t>(zone_.offsetAt(date) * kMillisecondsPerSecond), {}));
-    UErrorCode status = U_ZERO_ERROR;
-    calendar->setTime(static_cast<UDate>(date.time_since_epoch().count()), status);
-    icu::UnicodeString text;
-    icu::FieldPosition position;
-    return format_.format(*calendar, text, position).toUTF8String(result);
+  // The calendars of some locales are not Gregorian, or count their years otherwise; those that
+  // are follow the rules of GregorianCalendar before the year 1582 too.
+  std::unique_ptr<icu::Calendar> calendar(format_->getCalendar()->clone());
+  if (auto* gregorian = dynamic_cast<icu::GregorianCalendar*>(calendar.get())) {
+    gregorian->setGregorianChange(std::numeric_limits<UDate>::lowest(), status);
+    format_->adoptCalendar(calendar.release());
   }
-
- private:
-  UErrorCode status_ = U_ZERO_ERROR;
-  icu::SimpleDateFormat format_;
-  TimeZone zone_ = TimeZone::local();
-};
-
-DateFormatter::DateFormatter(std::string_view pattern)
-    : implementation_(std::make_unique<Implementation>(pattern)) {}
+}
 
 DateFormatter::~DateFormatter() = default;
 
 std::string DateFormatter::format(PointInTime date) const {
-  return implementation_->format(date);
+  std::string result;
+  if (!format_) return result;
+  const std::unique_ptr<icu::Calendar> calendar(format_->getCalendar()->clone());
+  calendar->adoptTimeZone(new icu::SimpleTimeZone(
+      static_cast<std::int32_t>(zone_.offsetAt(date) * kMillisecondsPerSecond), {}));
+  UErrorCode status = U_ZERO_ERROR;
+  calendar->setTime(static_cast<UDate>(date.time_since_epoch().count()), status);
+  icu::UnicodeString text;
+  icu::FieldPosition position;
+  return format_->format(*calendar, text, position).toUTF8String(result);
 }
 
 }  // namespace platform

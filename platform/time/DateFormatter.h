@@ -1,10 +1,17 @@
 #pragma once
 
+#include <unicode/uversion.h>
+
 #include <memory>
 #include <string>
 #include <string_view>
 
 #include "platform/time/PointInTime.h"
+#include "platform/time/TimeZone.h"
+
+U_NAMESPACE_BEGIN
+class SimpleDateFormat;
+U_NAMESPACE_END
 
 namespace platform {
 
@@ -23,8 +30,8 @@ class DateFormatter {
   std::string format(PointInTime date) const;
 
  private:
-  class Implementation;
-  std::unique_ptr<Implementation> implementation_;
+  std::unique_ptr<icu::SimpleDateFormat> format_;  // null when the pattern cannot be used
+  TimeZone zone_ = TimeZone::local();
 };
 
 }  // namespace platform

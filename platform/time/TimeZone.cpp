@@ -5,76 +5,48 @@
 
 #include <cstdlib>
 #include <ctime>
+#include <memory>
 #include <mutex>
 
 namespace platform {
 
-class TimeZone::Rules {
- public:
-  virtual ~Rules() = default;
-  virtual std::int64_t offsetAt(PointInTime date) const = 0;
-  virtual std::int64_t offsetAtLocalTime(LocalTime time) const = 0;
-};
-
 namespace {
 
-/// The rules of a zone of the database.
-class DatabaseRules final : public TimeZone::Rules {
- public:
-  explicit DatabaseRules(std::unique_ptr<const icu::TimeZone> zone) : zone_(std::move(zone)) {}
+using Duration = PointInTime::duration;
 
-  std::int64_t offsetAt(PointInTime date) const override {
-    return offset(date.time_since_epoch(), false);
-  }
-  std::int64_t offsetAtLocalTime(TimeZone::LocalTime time) const override {
-    return offset(time.time_since_epoch(), true);
-  }
+/// The offset by the rules of a zone of the database.
+std::int64_t databaseOffset(const icu::TimeZone& zone, Duration time, bool isLocalTime) {
+  constexpr std::int64_t kMillisecondsPerSecond = 1000;
+  UErrorCode status = U_ZERO_ERROR;
+  std::int32_t standard = 0;
+  std::int32_t daylight = 0;
+  zone.getOffset(static_cast<UDate>(time.count()), static_cast<UBool>(isLocalTime), standard,
+                 daylight, status);
+  return (std::int64_t{standard} + daylight) / kMillisecondsPerSecond;
+}
 
- private:
-  std::int64_t offset(PointInTime::duration time, bool isLocalTime) const {
-    constexpr std::int64_t kMillisecondsPerSecond = 1000;
-    UErrorCode status = U_ZERO_ERROR;
-    std::int32_t standard = 0;
-    std::int32_t daylight = 0;
-    zone_->getOffset(static_cast<UDate>(time.count()), static_cast<UBool>(isLocalTime), standard,
-                     daylight, status);
-    return (std::int64_t{standard} + daylight) / kMillisecondsPerSecond;
-  }
-
-  std::unique_ptr<const icu::TimeZone> zone_;
-};
-
-/// The rules that the C library made of TZ or of the system's settings when it last read them.
-class CLibraryRules final : public TimeZone::Rules {
- public:
-  std::int64_t offsetAt(PointInTime date) const override {
-    return offset(std::chrono::floor<std::chrono::seconds>(date.time_since_epoch()));
-  }
-
-  std::int64_t offsetAtLocalTime(TimeZone::LocalTime time) const override {
-    // Clocks are never more than this ahead of GMT or behind it, nor changed twice within it.
-    constexpr std::chrono::hours kFarthestOffset{25};
-    const auto seconds = std::chrono::floor<std::chrono::seconds>(time.time_since_epoch());
-    const std::int64_t before = offset(seconds - kFarthestOffset);
-    const std::int64_t after = offset(seconds + kFarthestOffset);
-    // In a gap, the offset after it leads to a time before it; in an overlap, to the later time.
-    return offset(seconds - std::chrono::seconds(after)) == after ? after : before;
-  }
-
- private:
-  static std::int64_t offset(std::chrono::seconds sinceEpoch) {
+/// The offset by the rules that the C library made of TZ or of the system's settings when it last
+/// read them.
+std::int64_t libraryOffset(Duration time, bool isLocalTime) {
+  const auto offsetAt = [](std::chrono::seconds sinceEpoch) {
     static_assert(sizeof(time_t) == sizeof(std::int64_t));
-    const time_t time = sinceEpoch.count();
+    const time_t date = sinceEpoch.count();
     struct tm fields {};
-    localtime_r(&time, &fields);  // the years of every PointInTime are within those of struct tm
-    return fields.tm_gmtoff;
-  }
-};
+    localtime_r(&date, &fields);  // the years of every PointInTime are within those of struct tm
+    return std::int64_t{fields.tm_gmtoff};
+  };
+  const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
+  if (!isLocalTime) return offsetAt(seconds);
+  // Clocks are never more than this ahead of GMT or behind it, nor changed twice within it.
+  constexpr std::chrono::hours kFarthestOffset{25};
+  const std::int64_t before = offsetAt(seconds - kFarthestOffset);
+  const std::int64_t after = offsetAt(seconds + kFarthestOffset);
+  // In a gap, the offset after it leads to a time before it; in an overlap, to the later time.
+  return offsetAt(seconds - std::chrono::seconds(after)) == after ? after : before;
+}
 
-using SharedRules = std::shared_ptr<const TimeZone::Rules>;
-
-/// The rules of the zone of the database; null when there is none.
-SharedRules databaseRules(std::string_view name) {
+/// The zone of the database; null when there is none.
+std::unique_ptr<const icu::TimeZone> databaseZone(std::string_view name) {
   if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
   // ICU makes a zone of any name: of "GMT+5" an offset, of an unknown one the zone Etc/Unknown.
   const icu::UnicodeString id = icu::UnicodeString::fromUTF8(icu::StringPiece(name));
@@ -83,8 +55,7 @@ SharedRules databaseRules(std::string_view name) {
   UErrorCode status = U_ZERO_ERROR;
   icu::TimeZone::getCanonicalID(id, canonicalID, isInDatabase, status);
   if (U_FAILURE(status) != 0 || isInDatabase == 0) return nullptr;
-  return std::make_shared<const DatabaseRules>(
-      std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id)));
+  return std::unique_ptr<const icu::TimeZone>(icu::TimeZone::createTimeZone(id));
 }
 
 /// A text of TZ that may name a zone of the database: ":name" or a path into the database.
@@ -95,19 +66,10 @@ std::string_view zoneName(std::string_view variable) {
   return found == std::string_view::npos ? variable : variable.substr(found + kDatabase.size());
 }
 
-/// The rules that TZ means, which is absent when it is not set.
-SharedRules localRules(const std::optional<std::string>& variable) {
-  // ICU's own database has the names also where none is installed for the C library.
-  SharedRules rules = variable ? databaseRules(zoneName(*variable)) : nullptr;
-  if (rules) return rules;
-  tzset();
-  return std::make_shared<const CLibraryRules>();
-}
-
-/// The zones in use by name, and the table of abbreviations.
+/// The zones of the database in use by name, the local one, and the table of abbreviations.
 struct Registry {
-  std::mutex mutex;
-  std::map<std::string, TimeZone, std::less<>> named;
+  std::recursive_mutex mutex;
+  std::map<std::string, std::unique_ptr<const icu::TimeZone>, std::less<>> named;
   std::optional<std::string> localVariable;
   std::optional<TimeZone> local;
   TimeZone::AbbreviationTable abbreviations;
@@ -120,28 +82,34 @@ Registry& registry() {
 
 }  // namespace
 
-TimeZone TimeZone::withOffset(std::int64_t seconds) {
-  return TimeZone(seconds);
-}
-
 std::optional<TimeZone> TimeZone::named(std::string_view name) {
   Registry& zones = registry();
   const std::lock_guard lock(zones.mutex);
-  if (const auto known = zones.named.find(name); known != zones.named.end()) return known->second;
-  SharedRules rules = databaseRules(name);
-  if (!rules) return std::nullopt;
-  return zones.named.emplace(name, TimeZone(std::move(rules))).first->second;
+  auto known = zones.named.find(name);
+  if (known == zones.named.end()) {
+    std::unique_ptr<const icu::TimeZone> made = databaseZone(name);
+    if (!made) return std::nullopt;
+    known = zones.named.emplace(name, std::move(made)).first;
+  }
+  return TimeZone([zone = known->second.get()](Duration time, bool isLocalTime) {
+    return databaseOffset(*zone, time, isLocalTime);
+  });
 }
 
 TimeZone TimeZone::local() {
   const char* value = std::getenv("TZ");
+  std::optional<std::string> variable;
+  if (value != nullptr) variable = value;
   Registry& zones = registry();
   const std::lock_guard lock(zones.mutex);
-  const bool isCurrent = value != nullptr ? zones.localVariable == std::string_view(value)
-                                          : !zones.localVariable.has_value();
-  if (!zones.local || !isCurrent) {
-    zones.localVariable = value != nullptr ? std::optional<std::string>(value) : std::nullopt;
-    zones.local = TimeZone(localRules(zones.localVariable));
+  if (!zones.local || zones.localVariable != variable) {
+    zones.localVariable = variable;
+    // ICU's own database has the names also where none is installed for the C library.
+    zones.local = variable ? named(zoneName(*variable)) : std::nullopt;
+    if (!zones.local) {
+      tzset();
+      zones.local = TimeZone(&libraryOffset);
+    }
   }
   return *zones.local;
 }
@@ -154,22 +122,9 @@ void TimeZone::setAbbreviationTable(const AbbreviationTable& table) {
 
 std::optional<TimeZone> TimeZone::withAbbreviation(std::string_view abbreviation) {
   Registry& zones = registry();
-  std::string name;
-  {
-    const std::lock_guard lock(zones.mutex);
-    const auto entry = zones.abbreviations.find(abbreviation);
-    if (entry == zones.abbreviations.end()) return std::nullopt;
-    name = entry->second;
-  }
-  return named(name);
-}
-
-std::int64_t TimeZone::offsetAt(PointInTime date) const {
-  return rules_ ? rules_->offsetAt(date) : fixedOffset_;
-}
-
-std::int64_t TimeZone::offsetAtLocalTime(LocalTime time) const {
-  return rules_ ? rules_->offsetAtLocalTime(time) : fixedOffset_;
+  const std::lock_guard lock(zones.mutex);
+  const auto entry = zones.abbreviations.find(abbreviation);
+  return entry != zones.abbreviations.end() ? named(entry->second) : std::nullopt;
 }
 
 }  // namespace platform

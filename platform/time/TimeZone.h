@@ -2,8 +2,8 @@
 
 #include <chrono>
 #include <cstdint>
+#include <functional>
 #include <map>
-#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -23,7 +23,9 @@ namespace platform {
 class TimeZone {
  public:
   /// A zone always `seconds` ahead of GMT (behind, when negative).
-  static TimeZone withOffset(std::int64_t seconds);
+  static TimeZone withOffset(std::int64_t seconds) {
+    return TimeZone([seconds](PointInTime::duration, bool) { return seconds; });
+  }
   /// The zone of the database with this name ("America/New_York"); absent when there is none.
   static std::optional<TimeZone> named(std::string_view name);
   /// The zone of the machine, as TZ (now) or without it the system's settings give it. TZ may be
@@ -43,21 +45,22 @@ class TimeZone {
   /// What the clocks of a zone show.
   using LocalTime = std::chrono::local_time<PointInTime::duration>;
   /// How many seconds the zone is ahead of GMT at the point in time.
-  std::int64_t offsetAt(PointInTime date) const;
+  std::int64_t offsetAt(PointInTime date) const { return offset_(date.time_since_epoch(), false); }
   /// The same when the zone's clocks show the local time. Of a time that they show twice it is the
   /// later one, and one that they skip counts on from before the gap: half past two is half past
   /// three.
-  std::int64_t offsetAtLocalTime(LocalTime time) const;
-
-  /// The rules of a zone that is not a fixed offset.
-  class Rules;
+  std::int64_t offsetAtLocalTime(LocalTime time) const {
+    return offset_(time.time_since_epoch(), true);
+  }
 
  private:
-  explicit TimeZone(std::int64_t fixedOffset) : fixedOffset_(fixedOffset) {}
-  explicit TimeZone(std::shared_ptr<const Rules> rules) : rules_(std::move(rules)) {}
+  /// The offset at a time since 1970 by GMT or by the zone's own clocks. No more than a pointer or
+  /// a number is captured, so that copies need no memory.
+  using Offset = std::function<std::int64_t(PointInTime::duration time, bool isLocalTime)>;
 
-  std::int64_t fixedOffset_ = 0;
-  std::shared_ptr<const Rules> rules_;  // null for a fixed offset
+  explicit TimeZone(Offset offset) : offset_(std::move(offset)) {}
+
+  Offset offset_;
 };
 
 }  // namespace platform

@@ -35,11 +35,6 @@ std::string_view encodingOfZeros(std::string_view bytes) {
   return {};
 }
 
-std::string_view withoutLeadingWhitespace(std::string_view text) {
-  text.remove_prefix(std::min(text.find_first_not_of(kWhitespace), text.size()));
-  return text;
-}
-
 bool isEncodingName(std::string_view name) {
   return !name.empty() && isASCIILetter(name.front()) && std::ranges::all_of(name, [](char c) {
     return isASCIILetter(c) || isASCIIDigit(c) || "._-"sv.find(c) != std::string_view::npos;
@@ -50,15 +45,15 @@ bool isEncodingName(std::string_view name) {
 /// is malformed, which is then the parser's to tell.
 std::string_view declaredEncoding(std::string_view bytes) {
   constexpr std::string_view kDeclarationStart = "<?xml";
-  std::string_view text = withoutLeadingWhitespace(bytes);
+  std::string_view text = trimmed(bytes);
   if (!text.starts_with(kDeclarationStart)) return {};
   text = text.substr(kDeclarationStart.size(), text.find('>') - kDeclarationStart.size());
   while (true) {
-    text = withoutLeadingWhitespace(text);
+    text = trimmed(text);
     const std::string_view name = text.substr(0, text.find_first_of("= \t\r\n"));
-    text = withoutLeadingWhitespace(text.substr(name.size()));
+    text = trimmed(text.substr(name.size()));
     if (!text.starts_with('=')) return {};
-    text = withoutLeadingWhitespace(text.substr(1));
+    text = trimmed(text.substr(1));
     if (!text.starts_with('"') && !text.starts_with('\'')) return {};
     const std::size_t end = text.find(text.front(), 1);
     if (end == std::string_view::npos) return {};
@@ -87,7 +82,9 @@ DocumentEncoding DocumentEncoding::of(std::string_view bytes) {
   if (!shown.empty()) return {.name = std::string(shown)};
   const std::string_view label = declaredEncoding(bytes);
   if (label.empty()) return {.name = "UTF-8"};
-  return {.name = encodingMeantBy(label), .label = label};
+  return {.name = encodingMeantBy(label),
+          .label = std::string(label),
+          .position = positionBehind({bytes.data(), label.data()})};
 }
 
 }  // namespace platform

@@ -5,6 +5,8 @@
 #include <string>
 #include <string_view>
 
+#include "platform/xml/TextPosition.h"
+
 namespace platform {
 
 /// The encoding that the first bytes of an XML document tell.
@@ -16,8 +18,9 @@ struct DocumentEncoding {
   std::optional<std::string> name;
   /// The bytes of the byte order mark.
   std::size_t markLength = 0;
-  /// The name as the declaration writes it, inside of the bytes; empty where no name decided.
-  std::string_view label = {};
+  /// The name as the declaration writes it, and where; empty where no name decided.
+  std::string label = {};
+  TextPosition position = {};
 
   /// White space may stand before the declaration. One that claims ISO-8859-1 or US-ASCII gives
   /// windows-1252, which is what such documents mean; one that claims UTF-16 or UTF-32, and can be

@@ -12,12 +12,14 @@ namespace platform {
 /// declared with all of its element's, and goes through these at each such element. It bounds what
 /// entities deliver only at a hundred times the document, and attributes by default not at all.
 ///
-/// Each function counts one part of the document; false when it is one too many.
+/// Each function that takes counts one part of the document; false when it is one too many.
 class ExpansionBudget {
  public:
-  explicit ExpansionBudget(std::size_t documentSize)
-      : elementsLeft_(kElementsAllowance + kElementsPerByte * documentSize),
-        textLeft_(kTextAllowance + kTextPerByte * documentSize) {}
+  /// The document has so many more bytes.
+  void grow(std::size_t size) {
+    elementsLeft_ += kElementsPerByte * size;
+    textLeft_ += kTextPerByte * size;
+  }
 
   /// An entity is declared. One that is a parameter or external is never resolved.
   bool takeEntity(bool isResolved, std::string_view value) {
@@ -65,8 +67,8 @@ class ExpansionBudget {
   bool hasDeclarations_ = false;
   std::size_t nestingEntities_ = 0;
   std::size_t attributes_ = 0;
-  std::size_t elementsLeft_;
-  std::size_t textLeft_;
+  std::size_t elementsLeft_ = kElementsAllowance;
+  std::size_t textLeft_ = kTextAllowance;
 };
 
 }  // namespace platform

@@ -3,6 +3,9 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <cstdint>
+
+#include "platform/text/Characters.h"
 
 namespace platform {
 namespace {
@@ -53,24 +56,9 @@ constexpr std::string_view reference(char character) {
 // The length of the character that the text begins with, which is not ASCII; 0 when it is
 // malformed, or none that XML can hold.
 std::size_t lengthOfAllowedCharacter(std::string_view text) {
-  const auto byteAt = [text](std::size_t index) {
-    return static_cast<char32_t>(static_cast<unsigned char>(text[index]));
-  };
-  const char32_t lead = byteAt(0);
-  if (lead < 0xC2 || lead > 0xF4) return 0;
-  const std::size_t length = lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
-  if (text.size() < length) return 0;
-
-  char32_t character = lead & (0x7FU >> length);
-  for (std::size_t index = 1; index < length; ++index) {
-    if ((byteAt(index) & 0xC0U) != 0x80) return 0;
-    character = character << 6U | (byteAt(index) & 0x3FU);
-  }
-  const bool isOverlong =
-      (length == 3 && character < 0x800) || (length == 4 && character < 0x10000);
-  const bool isSurrogate = character >= 0xD800 && character <= 0xDFFF;
-  const bool isExcluded = character == 0xFFFE || character == 0xFFFF || character > 0x10FFFF;
-  return isOverlong || isSurrogate || isExcluded ? 0 : length;
+  std::size_t length = 0;
+  const std::int32_t character = nextCharacter(text, length);
+  return character < 0x80 || character == 0xFFFE || character == 0xFFFF ? 0 : length;
 }
 
 void appendEscaped(std::string& output, std::string_view text, const ByteRules& rules) {

@@ -3,6 +3,7 @@
 #include <expat.h>
 
 #include <algorithm>
+#include <cstring>
 #include <memory>
 #include <type_traits>
 
@@ -15,57 +16,64 @@
 namespace platform {
 namespace {
 
+constexpr XML_Memory_Handling_Suite kMemory = {&Memory::allocate, &Memory::reallocate,
+                                               &Memory::release};
+
 constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 
-/// The library takes its input in ints and copies it into a buffer that it grows by doubling, to
-/// 1 GiB at most. A document that fits is one piece, which spares the library's counting of lines,
-/// too: that takes a third of the time. A tag that a piece of a larger one cuts is scanned anew
-/// with the next piece, which is therefore as large as what waits, so that the scanning stays
-/// linear.
+/// The library parses what lies in its own buffer, which it grows by doubling, as far as an int
+/// counts. A document that fits is read whole, which spares the library's counting of lines, too:
+/// that takes a tenth of the time. A tag that a piece of a larger one cuts waits in the buffer, and
+/// is scanned anew with each further piece.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
-/// The library can double its buffer as long as what waits and the next piece stay below 1 GiB.
-constexpr std::size_t kWaitingLimit = (std::size_t{1} << 30) - kPieceSize;
+
+/// A document that is larger than was expected has all that is skipped in its first piece.
+constexpr std::uint64_t kSmallestSize = std::uint64_t{64} << 10;
 
 XMLName nameOf(const XML_Char* name) {
   const std::string_view qualified(name);
   return {qualified, qualified.substr(qualified.find(':') + 1)};
 }
 
-/// Makes the document UTF-8 and removes its byte order mark. False, with the fault, when its
-/// encoding is not known.
-bool makeUTF8(std::string& document, std::optional<XMLFault>& fault) {
-  const DocumentEncoding encoding = DocumentEncoding::of(document);
-  if (encoding.name == "UTF-8") {
-    document.erase(0, encoding.markLength);
-    return true;
+XMLFault faultOfReading(const ErrorSlot& error) {
+  return {.description = error->description, .reading = error};
+}
+
+/// Makes the document UTF-8. False, with the fault, when its encoding is not known.
+bool makeUTF8(ByteSource& document, std::optional<XMLFault>& fault) {
+  ErrorSlot error;
+  std::string_view head = document.head(error);
+  DocumentEncoding encoding = DocumentEncoding::of(head);
+  // The declaration may end behind the head.
+  const bool isTold = encoding.name == "UTF-8" && head.find('>') != std::string_view::npos;
+  if (isTold) return true;
+
+  std::optional<std::string> bytes;
+  if (!error) bytes = document.readAll(error);
+  if (!bytes) {
+    fault = faultOfReading(error);
+    return false;
   }
-  std::optional<std::string> converted;
-  if (encoding.name) {
-    converted =
-        convertedToUTF8(std::string_view(document).substr(encoding.markLength), *encoding.name);
+  encoding = DocumentEncoding::of(*bytes);
+  if (encoding.name && encoding.name != "UTF-8") {
+    bytes = convertedToUTF8(std::string_view(*bytes).substr(encoding.markLength), *encoding.name);
   }
-  if (converted) {
-    document = std::move(*converted);
+  if (encoding.name && bytes) {
+    document = ByteSource(std::move(*bytes));
     return true;
   }
   constexpr std::size_t kShownLength = 64;  // the names of encodings are shorter
-  const std::string_view label = encoding.label;
-  fault =
-      XMLFault{.code = XML_ERROR_UNKNOWN_ENCODING,
-               .description = "unknown encoding \"" + std::string(label.substr(0, kShownLength)) +
-                              (label.size() > kShownLength ? "...\"" : "\""),
-               .position = positionBehind({document.data(), label.data()})};
+  fault = XMLFault{.code = XML_ERROR_UNKNOWN_ENCODING,
+                   .description = "unknown encoding \"" + encoding.label.substr(0, kShownLength) +
+                                  (encoding.label.size() > kShownLength ? "...\"" : "\""),
+                   .position = encoding.position};
   return false;
 }
-
-struct ParserFreer {
-  void operator()(XML_Parser parser) const { XML_ParserFree(parser); }
-};
 
 }  // namespace
 
 ErrorRecord XMLFault::record() const {
-  return {"XML", code, description + " at " + position.text()};
+  return reading.value_or(ErrorRecord{"XML", code, description + " at " + position.text()});
 }
 
 std::optional<std::string_view> XMLAttributes::value(std::string_view name) const {
@@ -77,58 +85,53 @@ std::optional<std::string_view> XMLAttributes::value(std::string_view name) cons
 
 /// One run of the library's parser over a document, which is UTF-8.
 struct XMLParser::Run {
-  Run(XMLParser& parser, std::string utf8)
-      : owner(parser), document(std::move(utf8)), budget(document.size()) {
-    const XML_Memory_Handling_Suite memory = {&Memory::allocate, &Memory::reallocate,
-                                              &Memory::release};
-    // The text is UTF-8 by now, whatever its declaration says.
-    handle.reset(XML_ParserCreate_MM("UTF-8", &memory, nullptr));
+  explicit Run(XMLParser& parser) : owner(parser) {
     XML_SetUserData(handle.get(), this);
     XML_SetElementHandler(handle.get(), startElement, endElement);
     XML_SetCharacterDataHandler(handle.get(), characters);
     XML_SetEntityDeclHandler(handle.get(), declareEntity);
     XML_SetAttlistDeclHandler(handle.get(), declareAttribute);
     owner.run_ = this;
-
-    next = std::min(document.find_first_not_of(kWhitespace), document.size());
-    origin = positionBehind(std::string_view(document).substr(0, next));
-    // Programs that put white space in front put it in front of a mark, too.
-    if (std::string_view(document).substr(next).starts_with(kUTF8Mark)) next += kUTF8Mark.size();
   }
   ~Run() { owner.run_ = nullptr; }
   Run(const Run&) = delete;
   Run& operator=(const Run&) = delete;
 
-  /// False when the library found a fault or an event ended the run.
+  /// False when the library found a fault, an event ended the run, or reading failed.
   bool feed() {
     // A mark in front keeps the library from guessing at UTF-16.
-    bool succeeded = XML_Parse(handle.get(), kUTF8Mark.data(), static_cast<int>(kUTF8Mark.size()),
-                               XML_FALSE) == XML_STATUS_OK;
-    const bool isWhole = document.size() - next <= owner.largestWholeSize_;
-    bool isLast = false;
-    while (succeeded && !isLast) {
-      const std::size_t rest = document.size() - next;
-      const std::size_t size = isWhole ? rest : std::min(rest, nextPieceSize());
-      void* buffer = XML_GetBuffer(handle.get(), static_cast<int>(size));
+    XML_Parse(handle.get(), kUTF8Mark.data(), static_cast<int>(kUTF8Mark.size()), XML_FALSE);
+    const std::uint64_t expected = std::max(owner.document_.expectedSize(), kSmallestSize);
+    // The byte beyond what is expected lets the end be seen.
+    std::size_t size = expected < owner.largestWholeSize_ ? expected + 1 : kPieceSize;
+    for (bool isFirst = true;; isFirst = false) {
+      auto* const buffer = static_cast<char*>(XML_GetBuffer(handle.get(), static_cast<int>(size)));
       if (buffer == nullptr) return false;
-      document.copy(static_cast<char*>(buffer), size, next);
-      next += size;
-      given += size;
-      isLast = next == document.size();
-      // The library has its own copy of the rest: what is read from it needs the room.
-      if (isLast) std::string().swap(document);
-      succeeded = XML_ParseBuffer(handle.get(), static_cast<int>(size), static_cast<int>(isLast)) ==
-                  XML_STATUS_OK;
+      ErrorSlot error;
+      const std::optional<std::size_t> count = owner.document_.read({buffer, size}, error);
+      if (!count) {
+        fault = faultOfReading(error);
+        return false;
+      }
+      budget.grow(*count);
+      const bool isLast = *count < size;
+      const std::size_t skipped = isFirst ? skip({buffer, *count}) : 0;
+      if (skipped > 0) std::memmove(buffer, buffer + skipped, *count - skipped);
+      const XML_Status status = XML_ParseBuffer(handle.get(), static_cast<int>(*count - skipped),
+                                                static_cast<int>(isLast));
+      if (status != XML_STATUS_OK || isLast) return status == XML_STATUS_OK;
+      size = kPieceSize;
     }
-    return succeeded;
   }
 
-  std::size_t nextPieceSize() const {
-    const XML_Index understood = XML_GetCurrentByteIndex(handle.get());
-    if (understood < 0) return kPieceSize;
-    const std::size_t waiting = given - std::min(given, static_cast<std::size_t>(understood));
-    const std::size_t room = kWaitingLimit - std::min(kWaitingLimit, waiting);
-    return std::max(kPieceSize, std::min(waiting, room));
+  /// The length of the marks and of the white space before a document's first character.
+  std::size_t skip(std::string_view document) {
+    std::size_t size = document.starts_with(kUTF8Mark) ? kUTF8Mark.size() : 0;
+    const std::size_t start =
+        std::min(document.find_first_not_of(kWhitespace, size), document.size());
+    origin = positionBehind(document.substr(size, start - size));
+    // Programs that put white space in front put it in front of a mark, too.
+    return start + (document.substr(start).starts_with(kUTF8Mark) ? kUTF8Mark.size() : 0);
   }
 
   /// The fault at the library's place, unless there is one already.
@@ -159,10 +162,8 @@ struct XMLParser::Run {
                                     const XML_Char* /*systemID*/, const XML_Char* /*publicID*/,
                                     const XML_Char* /*notation*/) {
     Run& run = *static_cast<Run*>(pointer);
-    // One that is external has no value.
-    const std::string_view text = value == nullptr
-                                      ? std::string_view()
-                                      : std::string_view(value, static_cast<std::size_t>(length));
+    // One that is external has no value, and the length 0.
+    const std::string_view text(value, static_cast<std::size_t>(length));
     if (!run.budget.takeEntity(isParameter == 0, text)) {
       run.refuseExpansion("too many entities made of entities");
     }
@@ -203,23 +204,22 @@ struct XMLParser::Run {
   }
 
   XMLParser& owner;
-  std::string document;                  // emptied once the library has all of it
-  std::size_t next = 0;                  // where in the document the next piece begins
-  std::size_t given = kUTF8Mark.size();  // the bytes that the library has
   TextPosition origin;  // of the library's first character, behind white space that is skipped
   ExpansionBudget budget;
   std::optional<XMLFault> fault;
-  std::unique_ptr<std::remove_pointer_t<XML_Parser>, ParserFreer> handle;
+  // The text is UTF-8 by now, whatever its declaration says.
+  std::unique_ptr<std::remove_pointer_t<XML_Parser>, decltype(&XML_ParserFree)> handle{
+      XML_ParserCreate_MM("UTF-8", &kMemory, nullptr), &XML_ParserFree};
 };
 
 bool XMLParser::parse(std::optional<XMLFault>& fault) {
-  std::string document = std::move(bytes_);
-  if (!makeUTF8(document, fault)) return false;
-  Run run(*this, std::move(document));
+  if (!makeUTF8(document_, fault)) return false;
+  Run run(*this);
   if (run.feed()) return true;
-  const XML_Error code = XML_GetErrorCode(run.handle.get());
-  run.fail(code, code == XML_ERROR_NO_MEMORY ? "a tag or text too long for the parser"
-                                             : XML_ErrorString(code));
+  if (const XML_Error code = XML_GetErrorCode(run.handle.get()); !run.fault) {
+    run.fail(code, code == XML_ERROR_NO_MEMORY ? "a tag or text too long for the parser"
+                                               : XML_ErrorString(code));
+  }
   fault = std::move(run.fault);
   return false;
 }

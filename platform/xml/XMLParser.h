@@ -7,6 +7,7 @@
 #include <string_view>
 #include <utility>
 
+#include "platform/text/ByteSource.h"
 #include "platform/text/ErrorRecord.h"
 #include "platform/xml/TextPosition.h"
 
@@ -16,10 +17,11 @@ namespace platform {
 struct XMLFault {
   std::int64_t code = 0;    // the library's
   std::string description;  // "mismatched tag"
-  TextPosition position;
+  TextPosition position = {};
+  ErrorSlot reading = {};  // why it could not be read, if that is what is wrong
 
   /// The same for whoever shows a sentence: "mismatched tag at line 3, column 7", of the domain
-  /// "XML".
+  /// "XML"; or why it could not be read.
   ErrorRecord record() const;
 };
 
@@ -56,7 +58,7 @@ class XMLParserEvents {
   virtual void foundCharacters(std::string_view text) = 0;
 };
 
-/// An event-driven parser of XML 1.0 over a document in memory, in one pass:
+/// An event-driven parser of XML 1.0 over a document, in one pass:
 ///
 ///   struct Counter : XMLParserEvents {
 ///     void didStartElement(const XMLName& name, const XMLAttributes&) override {
@@ -83,12 +85,11 @@ class XMLParser {
   /// What the library can take at once, and what takes least time.
   static constexpr std::size_t kLargestWholeSize = std::size_t{1023} << 20U;
 
-  /// The receiver must outlive `parse`. Move the bytes in where nobody else needs them: the parser
-  /// gives them up as soon as it can, so that they do not lie beside all that is read from them. A
-  /// document of more than `largestWholeSize` bytes is read in pieces, with the same events.
-  XMLParser(std::string bytes, XMLParserEvents& events,
+  /// The receiver must outlive `parse`. A document of more than `largestWholeSize` bytes is read in
+  /// pieces, with the same events.
+  XMLParser(ByteSource document, XMLParserEvents& events,
             std::size_t largestWholeSize = kLargestWholeSize)
-      : bytes_(std::move(bytes)), events_(events), largestWholeSize_(largestWholeSize) {}
+      : document_(std::move(document)), events_(events), largestWholeSize_(largestWholeSize) {}
 
   /// Runs the whole parse on the calling thread; called once at most. On a malformed document
   /// returns false with its first fault; the events that came before it have been delivered.
@@ -101,7 +102,7 @@ class XMLParser {
  private:
   struct Run;
 
-  std::string bytes_;
+  ByteSource document_;
   XMLParserEvents& events_;
   std::size_t largestWholeSize_;
   Run* run_ = nullptr;  // while parse() runs

@@ -15,11 +15,11 @@ void XMLElement::appendChild(std::string_view name, std::string_view text) const
   writer_->startElement(depth_, name);
   writer_->output_ += '>';
   appendEscapedText(writer_->output_, text);
-  writer_->append("</", name, ">\n");
+  writer_->output_.append("</").append(name).append(">\n");
 }
 
 void XMLElement::appendAttribute(std::string_view name, std::string_view value) const {
-  writer_->append(" ", name, "=\"");
+  writer_->output_.append(" ").append(name).append("=\"");
   appendEscapedAttribute(writer_->output_, value);
   writer_->output_ += '"';
 }
@@ -51,15 +51,9 @@ void XMLWriter::endElements(std::size_t depth) {
       isTagOpen_ = false;
     } else {
       indent();
-      append("</", name, ">\n");
+      output_.append("</").append(name).append(">\n");
     }
   }
-}
-
-void XMLWriter::append(std::string_view first, std::string_view second, std::string_view third) {
-  output_ += first;
-  output_ += second;
-  output_ += third;
 }
 
 void XMLWriter::indent() {

@@ -76,7 +76,6 @@ class XMLWriter {
   friend class XMLElement;
   void startElement(std::size_t depth, std::string_view name);
   void endElements(std::size_t depth);
-  void append(std::string_view first, std::string_view second, std::string_view third);
   void indent();
 
   std::string& output_;

@@ -79,10 +79,10 @@ class QELBundlePodcastGeneratorTest : public testing::Test {
   Dictionary generate() {
     platform::ErrorSlot error = failureAt(bundlePath().string());
     EXPECT_EQ(error, std::nullopt);
-    const auto bytes = platform::readWholeFile((bundlePath() / "Info.plist").string(), error);
+    auto bytes = platform::openWholeFile((bundlePath() / "Info.plist").string(), error);
     if (!bytes) return {};
     std::optional<platform::PropertyListFault> fault;
-    const auto value = platform::readPropertyList(*bytes, fault);
+    const auto value = platform::readPropertyList(std::move(*bytes), fault);
     return value && value->asDictionary() ? *value->asDictionary() : Dictionary();
   }
 

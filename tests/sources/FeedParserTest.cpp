@@ -52,7 +52,7 @@ TEST(FeedParserTest, AbsentDataGivesNoParser) {
 }
 
 TEST(FeedParserTest, FreshParserIsEmpty) {
-  const auto parser = FeedParser::parserWithFeedData("<rss/>");
+  const auto parser = FeedParser::parserWithFeedData(std::string("<rss/>"));
   EXPECT_EQ(parser->feedType(), std::nullopt);
   EXPECT_EQ(parser->feedAttributes(), Dictionary());
   EXPECT_TRUE(parser->episodes().empty());
@@ -267,7 +267,7 @@ TEST(FeedParserTest, DocumentWithoutRssIsRefused) {
   for (const char* document :
        {"<feed xmlns=\"http://www.w3.org/2005/Atom\"><title>a</title></feed>", "<html/>", "<RSS/>",
         "<opml><body/></opml>"}) {
-    const auto parser = FeedParser::parserWithFeedData(document);
+    const auto parser = FeedParser::parserWithFeedData(std::string(document));
     platform::ErrorSlot error;
     EXPECT_FALSE(parser->parseWithError(error)) << document;
     EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 3, "The feed was neither RSS nor Atom"}));
@@ -276,7 +276,8 @@ TEST(FeedParserTest, DocumentWithoutRssIsRefused) {
 
 TEST(FeedParserTest, TypeThatIsSetFromOutsideDecides) {
   for (const std::string type : {"atom", "opml"}) {
-    const auto parser = FeedParser::parserWithFeedData("<feed><title>a</title></feed>");
+    const auto parser =
+        FeedParser::parserWithFeedData(std::string("<feed><title>a</title></feed>"));
     parser->setFeedType(type);
     platform::ErrorSlot error;
     EXPECT_EQ(parser->parseWithError(error), type == "atom") << type;
@@ -289,7 +290,7 @@ TEST(FeedParserTest, TypeThatIsSetFromOutsideDecides) {
 }
 
 TEST(FeedParserTest, MalformedXMLFailsWithTheParsersRecord) {
-  const auto parser = FeedParser::parserWithFeedData("<rss>\n<channel></rss>");
+  const auto parser = FeedParser::parserWithFeedData(std::string("<rss>\n<channel></rss>"));
   platform::ErrorSlot error;
   EXPECT_FALSE(parser->parseWithError(error));
   ASSERT_TRUE(error);
@@ -316,7 +317,8 @@ TEST(FeedParserTest, ReceiverGetsEachItemOnceItIsWhole) {
 }
 
 TEST(FeedParserTest, ReceiverHasGotTheItemsBeforeAFault) {
-  const auto parser = FeedParser::parserWithFeedData("<rss><item><title>a</title></item><item>");
+  const auto parser =
+      FeedParser::parserWithFeedData(std::string("<rss><item><title>a</title></item><item>"));
   std::vector<Dictionary> received;
   parser->setItemReceiver([&received](const Dictionary& item) { received.push_back(item); });
   platform::ErrorSlot error;

@@ -15,7 +15,7 @@ inline constexpr long kPollCall = SYS_poll;
 inline constexpr long kPollCall = SYS_ppoll;
 #endif
 
-/// Whether system calls can be refused here; an emulator of another processor cannot do without any.
+/// Whether system calls can be refused here. An emulator of another processor needs them all.
 inline bool canRefuseSystemCalls() {
   return ::prctl(PR_GET_SECCOMP) >= 0;
 }

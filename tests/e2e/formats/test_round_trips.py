@@ -131,11 +131,10 @@ class TextTest(RoundTripTestCase):
         self.assertEqual(self.through_feed(podcast), kept)
 
     def test_20_megabytes_in_one_text(self):
-        for name, piece in (("ASCII", "0123456789abcde\n"), ("markup", "<&>\r\t\"']]>"), ("three bytes each", "夜の散歩")):
-            with self.subTest(name):
-                text = piece * (20_000_000 // len(piece.encode()))
-                podcast = {"PodcastName": "n", "Episodes": [{"EpisodeDescription": text}]}
-                self.assertTrue(self.through_feed(podcast) == podcast, "the text differs")
+        piece = "0123456789abcde\n<&>\r\t\"']]>夜の散歩"
+        text = piece * (20_000_000 // len(piece.encode()))
+        podcast = {"PodcastName": "n", "Episodes": [{"EpisodeDescription": text}]}
+        self.assertTrue(self.through_feed(podcast) == podcast, "the text differs")
 
     def test_10_thousand_episodes(self):
         podcast = {"Episodes": [{"EpisodeName": f"Episode {number}", "EpisodeUUID": f"u{number}",

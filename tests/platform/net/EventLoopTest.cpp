@@ -9,7 +9,6 @@
 #include <thread>
 
 #include "platform/net/Download.h"
-#include "platform/net/EventSource.h"
 #include "tests/support/HTTPTestServer.h"
 
 namespace platform {

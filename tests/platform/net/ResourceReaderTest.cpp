@@ -30,7 +30,8 @@ class ResourceReaderTest : public ::testing::Test {
   /// The resource, or the domain, code and description of the failure in one text.
   static std::string read(const std::string& url, std::uint64_t limit = kWholeReadLimit) {
     ErrorSlot error;
-    const std::optional<std::string> resource = readResource(URL::parse(url).value(), error, limit);
+    std::optional<ByteSource> source = readResource(URL::parse(url).value(), error, limit);
+    const std::optional<std::string> resource = source ? source->readAll(error) : std::nullopt;
     EXPECT_NE(resource.has_value(), error.has_value());
     if (resource) return *resource;
     return error->domain + " " + std::to_string(error->code) + ": " + error->description;

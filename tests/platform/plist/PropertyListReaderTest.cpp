@@ -11,6 +11,8 @@
 namespace platform {
 namespace {
 
+using namespace std::string_literals;
+
 TEST(PropertyListReaderTest, TheFirstBytesTellTheForm) {
   BinaryPropertyList list;
   expectOutcomes({
@@ -25,7 +27,7 @@ TEST(PropertyListReaderTest, TheFirstBytesTellTheForm) {
 
 TEST(PropertyListReaderTest, AFaultHoldsItsPlaceApart) {
   std::optional<PropertyListFault> fault;
-  EXPECT_FALSE(readPropertyList("<plist>\n<dict>\n  <true/></dict></plist>", fault));
+  EXPECT_FALSE(readPropertyList("<plist>\n<dict>\n  <true/></dict></plist>"s, fault));
   EXPECT_EQ(fault->description, "a value without a key in a dictionary");
   EXPECT_EQ(fault->position, (TextPosition{.line = 3, .column = 3}));
   EXPECT_EQ(fault->object, std::nullopt);

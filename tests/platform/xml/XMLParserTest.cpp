@@ -67,7 +67,7 @@ TEST(XMLParserTest, LocalNameFollowsTheFirstColon) {
     std::string seen;
   } names;
   std::optional<XMLFault> fault;
-  ASSERT_TRUE(XMLParser("<a><b:c><d:e:f/></b:c></a>", names).parse(fault)) << fault->description;
+  ASSERT_TRUE(XMLParser("<a><b:c><d:e:f/></b:c></a>"s, names).parse(fault)) << fault->description;
   EXPECT_EQ(names.seen, "a=a b:c=c d:e:f=e:f /d:e:f=e:f /b:c=c /a=a ");
 }
 
@@ -84,7 +84,7 @@ TEST(XMLParserTest, AttributesAreFoundByQualifiedName) {
     void foundCharacters(std::string_view) override {}
   } values;
   std::optional<XMLFault> fault;
-  EXPECT_TRUE(XMLParser("<r href='1' x:href='2' empty=''/>", values).parse(fault));
+  EXPECT_TRUE(XMLParser("<r href='1' x:href='2' empty=''/>"s, values).parse(fault));
 }
 
 TEST(XMLParserTest, FaultsAreNamedWithLineAndColumn) {
@@ -172,7 +172,7 @@ TEST(XMLParserTest, FaultsAreNamedWithLineAndColumn) {
 TEST(XMLParserTest, AFaultHoldsItsPlaceApart) {
   XMLEventRecorder recorder;
   std::optional<XMLFault> fault;
-  EXPECT_FALSE(XMLParser("<r>\n<a>\n  </b>\n</r>", recorder).parse(fault));
+  EXPECT_FALSE(XMLParser("<r>\n<a>\n  </b>\n</r>"s, recorder).parse(fault));
   EXPECT_EQ(fault->description, "mismatched tag");
   EXPECT_EQ(fault->position, (TextPosition{.line = 3, .column = 5}));
 }
@@ -180,7 +180,7 @@ TEST(XMLParserTest, AFaultHoldsItsPlaceApart) {
 TEST(XMLParserTest, EventsBeforeAFaultAreDelivered) {
   XMLEventRecorder recorder;
   std::optional<XMLFault> fault;
-  EXPECT_FALSE(XMLParser("<r><a>text</a></b>", recorder).parse(fault));
+  EXPECT_FALSE(XMLParser("<r><a>text</a></b>"s, recorder).parse(fault));
   EXPECT_EQ(recorder.events, "<r><a>text</a>");
 }
 
@@ -287,6 +287,56 @@ TEST(XMLParserTest, AFaultHasTheSamePlaceInPieces) {
     EXPECT_EQ(fault->record().description,
               "not well-formed (invalid token) at line 70000001, column 4");
   }
+}
+
+/// The text and then a failure, or its end.
+ByteSource sourceOf(std::string text, std::uint64_t expectedSize, bool fails) {
+  return {expectedSize,
+          [text = std::move(text), fails](std::span<char> room,
+                                          ErrorSlot& error) mutable -> std::optional<std::size_t> {
+            if (text.empty() && fails) {
+              error = ErrorRecord{"test", 1, "no more"};
+              return std::nullopt;
+            }
+            const std::size_t size = text.copy(room.data(), room.size());
+            text.erase(0, size);
+            return size;
+          }};
+}
+
+TEST(XMLParserTest, TheExpectedSizeMayBeWrong) {
+  for (const std::string& start :
+       {""s, "\xEF\xBB\xBF"s, "\n\n"s, "<?xml version='1.0' encoding='KOI8-R'?>"s}) {
+    const std::string document = start + "<r a='b'>text</r>";
+    for (const std::uint64_t size : {0U, 1U, 5U, 30U, 1000U}) {
+      XMLEventRecorder recorder;
+      std::optional<XMLFault> fault;
+      EXPECT_TRUE(XMLParser(sourceOf(document, size, false), recorder).parse(fault))
+          << fault->description << start << size;
+      EXPECT_EQ(recorder.events, "<r a=b>text</r>") << start << size;
+    }
+  }
+}
+
+TEST(XMLParserTest, ADocumentThatCannotBeReadIsAFaultWithThatCause) {
+  for (const std::string_view document :
+       {"", "<r>", "<r/>", "<?xml version='1.0' encoding='KOI8-R'?><r/>"}) {
+    XMLEventRecorder recorder;
+    std::optional<XMLFault> fault;
+    EXPECT_FALSE(XMLParser(sourceOf(std::string(document), 100, true), recorder).parse(fault));
+    EXPECT_EQ(fault->record(), (ErrorRecord{"test", 1, "no more"})) << document;
+    EXPECT_FALSE(fault->description.empty()) << document;
+  }
+}
+
+TEST(XMLParserTest, WhatTheLibraryCannotHoldIsAFault) {
+  // More than its buffer takes; it need not come.
+  constexpr std::size_t kTooMuch = 2'147'000'000;
+  XMLEventRecorder recorder;
+  std::optional<XMLFault> fault;
+  EXPECT_FALSE(XMLParser(sourceOf("<r/>", kTooMuch, false), recorder, kTooMuch + 1).parse(fault));
+  EXPECT_EQ(fault->record().description,
+            "a tag or text too long for the parser at line 1, column 1");
 }
 
 TEST(XMLParserTest, AbortEndsTheParseAtThePlaceOfTheEvent) {
