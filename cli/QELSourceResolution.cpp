@@ -38,8 +38,8 @@ bool QELValidateSource(std::optional<std::string_view> source, bool readStandard
 std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput() {
   static std::shared_ptr<const platform::PropertyListValue> cached;
   if (!cached) {
-    std::optional<platform::PropertyListFault>
-        ignored;  // what is wrong with the input is not told apart here
+    // What is wrong with the input is not told apart here.
+    std::optional<platform::PropertyListFault> ignored;
     if (auto value = platform::readPropertyList(platform::readStandardInput(), ignored)) {
       cached = std::make_shared<const platform::PropertyListValue>(std::move(*value));
     }

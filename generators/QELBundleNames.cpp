@@ -1,12 +1,12 @@
 #include "generators/QELBundleNames.h"
 
+#include <algorithm>
 #include <cstddef>
 
 #include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/net/URL.h"
 #include "platform/text/FormattedText.h"
-#include "platform/text/Splitting.h"
 #include "platform/xml/XMLEscaping.h"
 
 std::optional<std::string> QELFileName(const QELMediaReference& reference) {
@@ -22,9 +22,11 @@ bool QELNamesFile(std::string_view name) {
 }
 
 std::string QELBaseName(std::string_view name) {
-  // Colons of the name go before slashes become colons: only the latter are to be seen.
-  return platform::replacingAll(
-      platform::replacingAll(platform::pathWithoutExtension(name), ":", ""), "/", ":");
+  std::string base(platform::pathWithoutExtension(name));
+  // Colons go first; otherwise those that slashes become would go, too.
+  std::erase(base, ':');
+  std::ranges::replace(base, '/', ':');
+  return base;
 }
 
 std::string QELNameWithExtension(std::string_view base, std::string_view extension) {

@@ -15,7 +15,7 @@ class QELNameLedger {
   std::string reserve(const std::string& name);
 
  private:
-  // Sorted: names that all hash alike can be made, and would make a hash table slow.
+  /// Sorted: names that all hash alike can be made, and would make a hash table slow.
   std::set<std::string> taken_;
   /// For a name asked for again, the number to try next: a name once taken stays so, hence no lower
   /// number can have become free.

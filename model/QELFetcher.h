@@ -9,7 +9,7 @@
 /// A record that fetches what it refers to: it starts the download, receives its events and waits
 /// for its end.
 ///
-/// When a transfer counts as failed is decided below, in platform/net/Download.h.
+/// When a transfer counts as failed is decided below, in platform/net/NetworkTransfer.cpp.
 class QELFetcher : protected platform::DownloadReceiver {
  public:
   QELFetcher(const QELFetcher&) = delete;

@@ -9,8 +9,8 @@ platform::OptionalText QELReferenceType(std::optional<std::string_view> location
   static const platform::Text remote(kReferenceTypeRemote);
 
   if (!location || location->empty()) return std::nullopt;
-  // No prefix that is looked for takes more characters than this, and no character's lower case
-  // depends on what follows it here.
+  // The prefixes have five characters at most, and to lower-case just these gives the same as to
+  // lower-case all.
   const std::string start = platform::lowercased(platform::firstCharacters(*location, 5));
   return start.starts_with("http") || start.starts_with("file:") ? remote : local;
 }

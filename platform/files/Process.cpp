@@ -18,8 +18,8 @@
 namespace platform {
 namespace {
 
-/// What one stage of a run gives back, such as the bytes of a feed, the next one soon asks for. It
-/// would cost a tenth of the run to have the system take it and clear it anew.
+/// Freed memory stays with the process: the next stage of a run needs it, and to give it back and
+/// get it anew would cost a tenth of the run.
 void keepFreedMemory() {
 #ifdef __GLIBC__
   constexpr int kNever = -1;
@@ -30,7 +30,7 @@ void keepFreedMemory() {
 #endif
 }
 
-/// The new-handler. It runs on any thread, amid whatever asked for memory, and asks for none.
+/// The new-handler. It runs on any thread, amid whatever asked for memory, and depends on none.
 [[noreturn]] void endForWantOfMemory() {
   static std::atomic_flag isEnding;
   while (isEnding.test_and_set()) ::pause();  // another thread ends the process

@@ -21,8 +21,8 @@
 namespace platform {
 namespace {
 
-// The name is short, so that it fits wherever the final name does, and random, so that runs that
-// share a directory do not meet.
+/// The name is short, so that it fits wherever the final name does, and random, so that runs that
+/// share a directory do not meet.
 constexpr std::string_view kNamePrefix = ".qel-";
 constexpr std::string_view kNameSuffix = ".part";
 constexpr std::size_t kRandomBytes = 8;

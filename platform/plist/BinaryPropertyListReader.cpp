@@ -300,7 +300,7 @@ class Reader {
 
   /// Whether that many items of that width lie between the object's content and the objects' end.
   bool holds(const Object& object, std::uint64_t count, std::size_t width) const {
-    // The content of an object begins at the end of the objects at most.
+    // The content never begins beyond the end of the objects, so the difference cannot wrap.
     return count <= (tableOffset_ - object.content) / width;
   }
 
@@ -322,8 +322,9 @@ class Reader {
 
   /// Keeps the first fault that is told, of the object if one is named; returns false.
   bool fail(std::string description, std::optional<std::uint64_t> object = std::nullopt) {
-    if (!fault_)
+    if (!fault_) {
       fault_ = PropertyListFault{.description = std::move(description), .object = object};
+    }
     return false;
   }
 

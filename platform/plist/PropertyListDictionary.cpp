@@ -34,7 +34,7 @@ void sortKeepingLast(PropertyListDictionary::Entries& entries) {
   };
   if (isInOrder()) return;
   std::stable_sort(entries.begin(), entries.end(), comesBefore);
-  // Seen from behind, the last of equal keys is the first.
+  // Run backwards, std::unique keeps the last of equal keys.
   const auto kept =
       std::unique(entries.rbegin(), entries.rend(),
                   [](const Entry& left, const Entry& right) { return left.first == right.first; });

@@ -18,10 +18,11 @@ inline constexpr const char* kPropertyListTooDeep =
 
 /// What is wrong with a property list, and where; without a place it is the list as a whole.
 struct PropertyListFault {
-  std::string description;                              // "a key without a value in a dictionary"
-  std::optional<TextPosition> position = std::nullopt;  // in the XML form
-  std::optional<std::uint64_t> object =
-      std::nullopt;  // in the binary form: the number of the object
+  std::string description;  // "a key without a value in a dictionary"
+  /// In the XML form.
+  std::optional<TextPosition> position = std::nullopt;
+  /// In the binary form: the number of the object.
+  std::optional<std::uint64_t> object = std::nullopt;
 };
 
 /// Reads a property list in its XML form (the DTD "PropertyList 1.0", any encoding) or its binary

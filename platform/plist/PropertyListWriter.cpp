@@ -35,7 +35,7 @@ class Writer {
   explicit Writer(const ByteSink& sink) : sink_(sink) {}
 
   bool write(const Dictionary& root) {
-    // It is not indented inside of "plist", so it is what the XML writer takes for the root.
+    // The "plist" around it is written by hand: its content is not indented.
     output_ += kHead;
     open(xml_.appendRoot("dict"), root);
     bool accepted = true;

@@ -99,8 +99,8 @@ class Reader final : private XMLParserEvents {
   Value read(std::optional<PropertyListFault>& fault) {
     std::optional<XMLFault> found;
     if (parser_.parse(found)) return builder_.takeRoot();
-    fault = PropertyListFault{.description = std::move(found->description),
-                              .position = found->position};
+    fault = PropertyListFault{.description = std::move(found->description)};
+    if (!found->reading) fault->position = found->position;
     return std::nullopt;
   }
 

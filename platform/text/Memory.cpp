@@ -22,7 +22,7 @@ void* insist(Request request) {
   return block;
 }
 
-// The null pointer that may stand for an empty block is none of a refusal.
+/// malloc(0) may give a null pointer without having failed, so one byte at least is asked for.
 std::size_t atLeastOne(std::size_t size) {
   return std::max<std::size_t>(size, 1);
 }

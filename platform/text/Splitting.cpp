@@ -43,16 +43,4 @@ std::vector<std::string_view> splitAtWhitespace(std::string_view text, std::size
   return pieces;
 }
 
-std::string replacingAll(std::string_view text, std::string_view target,
-                         std::string_view replacement) {
-  std::string result;
-  result.reserve(text.size());
-  for (std::size_t found = text.find(target); found != std::string_view::npos;
-       found = text.find(target)) {
-    result.append(text.substr(0, found)).append(replacement);
-    text.remove_prefix(found + target.size());
-  }
-  return result.append(text);
-}
-
 }  // namespace platform

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <cstddef>
-#include <string>
 #include <string_view>
 #include <vector>
 
@@ -17,9 +16,5 @@ std::vector<std::string_view> splitAt(std::string_view text, char separator,
 /// separate. Every single white-space character separates, so two in a row enclose an empty piece.
 std::vector<std::string_view> splitAtWhitespace(std::string_view text,
                                                 std::size_t most = std::string_view::npos);
-
-/// The text with every occurrence of `target` (not empty) replaced, left to right.
-std::string replacingAll(std::string_view text, std::string_view target,
-                         std::string_view replacement);
 
 }  // namespace platform

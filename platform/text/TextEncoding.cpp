@@ -17,12 +17,12 @@ struct ConverterCloser {
 };
 using Converter = std::unique_ptr<UConverter, ConverterCloser>;
 
-// An empty name would stand for the default encoding of the process, and a NUL would cut the name.
+/// An empty name would stand for the default encoding of the process, and a NUL would cut the name.
 bool isPlausibleName(std::string_view encoding) {
   return !encoding.empty() && encoding.find('\0') == std::string_view::npos;
 }
 
-// The library's own substitution writes U+001A for some encodings.
+/// The library's own substitution writes U+001A for some encodings.
 void writeReplacementCharacter(const void* /*context*/, UConverterToUnicodeArgs* arguments,
                                const char* /*bytes*/, std::int32_t /*length*/,
                                UConverterCallbackReason reason, UErrorCode* status) {

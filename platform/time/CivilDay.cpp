@@ -5,7 +5,7 @@
 namespace platform {
 namespace {
 
-// After so many years, and days, the calendar repeats itself.
+/// After so many years, and days, the calendar repeats itself.
 constexpr std::int64_t kYearsPerEra = 400;
 constexpr std::int64_t kDaysPerEra = 146097;
 

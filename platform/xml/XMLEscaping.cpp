@@ -10,8 +10,8 @@
 namespace platform {
 namespace {
 
-// What becomes of each byte: itself, a reference, nothing, or what the character shows that it
-// begins.
+/// Tells the bytes that are copied as they are from the special ones: those that become a reference
+/// or nothing, and those from 0x80 on, where the whole character must be checked.
 class ByteRules {
  public:
   explicit constexpr ByteRules(bool isAttribute) {
@@ -31,7 +31,7 @@ class ByteRules {
 constexpr ByteRules kTextRules(false);
 constexpr ByteRules kAttributeRules(true);
 
-// Empty for what is left out.
+/// Empty for what is left out.
 constexpr std::string_view reference(char character) {
   switch (character) {
     case '&':

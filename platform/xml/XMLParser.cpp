@@ -27,7 +27,8 @@ constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 /// is scanned anew with each further piece.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
 
-/// A document that is larger than was expected has all that is skipped in its first piece.
+/// At least so many bytes are read first, so that marks and white space to skip lie in the first
+/// piece also where a document is larger than expected.
 constexpr std::uint64_t kSmallestSize = std::uint64_t{64} << 10;
 
 XMLName nameOf(const XML_Char* name) {

@@ -82,7 +82,8 @@ class XMLParserEvents {
 /// declare it and is not standalone: then it gives no characters either.
 class XMLParser {
  public:
-  /// What the library can take at once, and what takes least time.
+  /// Up to this size a document is parsed in one buffer: the fastest way, and the most that expat
+  /// takes.
   static constexpr std::size_t kLargestWholeSize = std::size_t{1023} << 20U;
 
   /// The receiver must outlive `parse`. A document of more than `largestWholeSize` bytes is read in

@@ -53,18 +53,4 @@ TEST(SplittingTest, SplitAtWhitespaceKnowsTheSpaceSeparators) {
   }
 }
 
-TEST(SplittingTest, ReplacingAll) {
-  const struct {
-    std::string_view text, target, replacement, result;
-  } rows[] = {
-      {"", "a", "b", ""},        {"abc", "x", "y", "abc"}, {"a:b:c", ":", "", "abc"},
-      {"::", ":", "//", "////"}, {"aaa", "aa", "b", "ba"}, {"aXbX", "X", "XX", "aXXbXX"},
-      {"äöä", "ä", "a", "aöa"},  {"abc", "abc", "", ""},
-  };
-  for (const auto& row : rows) {
-    EXPECT_EQ(platform::replacingAll(row.text, row.target, row.replacement), row.result)
-        << row.text << " | " << row.target;
-  }
-}
-
 }  // namespace
