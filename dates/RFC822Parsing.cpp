@@ -103,7 +103,9 @@ std::optional<platform::PointInTime> dateWithRFC822String(std::optional<std::str
 std::optional<platform::TimeZone> timeZoneWithMilitaryAbbreviation(
     std::optional<std::string_view> text) {
   if (!text || platform::characterCount(*text) != 1) return std::nullopt;
-  const auto hours = [](int count) { return platform::TimeZone::withOffset(count * 3600); };
+  const auto hours = [](std::int64_t count) {
+    return platform::TimeZone::withOffset(count * 3600);
+  };
   const platform::TimeZone greenwich = hours(0);
   const std::string upper = platform::uppercased(*text);
   const char letter = upper.size() == 1 ? upper.front() : '\0';

@@ -81,17 +81,17 @@ class Writer {
   }
 
   void writeVariant(XMLElement parent, const PropertyListValue& value) {
-    std::visit([this, parent](const auto& held) { write(parent, held); }, value.storage());
+    std::visit([&](const auto& held) { write(parent, held); }, value.storage());
   }
 
-  void write(XMLElement parent, const Text& text) { parent.appendChild("string", text); }
-  void write(XMLElement parent, std::int64_t number) {
+  static void write(XMLElement parent, const Text& text) { parent.appendChild("string", text); }
+  static void write(XMLElement parent, std::int64_t number) {
     parent.appendChild("integer", std::to_string(number));
   }
-  void write(XMLElement parent, std::uint64_t number) {
+  static void write(XMLElement parent, std::uint64_t number) {
     parent.appendChild("integer", std::to_string(number));
   }
-  void write(XMLElement parent, PointInTime date) {
+  static void write(XMLElement parent, PointInTime date) {
     parent.appendChild("date", propertyListDate(date));
   }
   void write(XMLElement parent, const PropertyListValue::Array& array) {
@@ -100,7 +100,7 @@ class Writer {
   void write(XMLElement parent, const Dictionary& dictionary) {
     open(parent.appendChild("dict"), dictionary);
   }
-  void write(XMLElement /*parent*/, const auto& /*other*/) {}
+  static void write(XMLElement /*parent*/, const auto& /*other*/) {}
 
   template <typename Container>
   void open(XMLElement element, const Container& container) {
