@@ -81,7 +81,7 @@ class Writer {
   }
 
   void writeVariant(XMLElement parent, const PropertyListValue& value) {
-    std::visit([&](const auto& held) { write(parent, held); }, value.storage());
+    std::visit([this, parent](const auto& held) { this->write(parent, held); }, value.storage());
   }
 
   static void write(XMLElement parent, const Text& text) { parent.appendChild("string", text); }
