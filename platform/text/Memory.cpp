@@ -38,7 +38,10 @@ void* Memory::allocateZeroed(std::size_t count, std::size_t size) {
 }
 
 void* Memory::reallocate(void* block, std::size_t size) {
-  return insist([=] { return std::realloc(block, atLeastOne(size)); });
+  // A block that realloc refuses to move is still there: g++ would take the next try for a use
+  // after free.
+  void* volatile kept = block;
+  return insist([&] { return std::realloc(kept, atLeastOne(size)); });
 }
 
 char* Memory::duplicate(const char* text) {
