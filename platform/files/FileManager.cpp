@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <array>
 #include <cerrno>
 #include <cstddef>
 #include <filesystem>
@@ -12,7 +13,6 @@
 #include <string_view>
 #include <system_error>
 #include <utility>
-#include <vector>
 
 #include "platform/files/FileDescriptor.h"
 #include "platform/files/PosixError.h"
@@ -35,7 +35,7 @@ void copyInsideKernel(const RegularFile& source, const TemporaryFile& copy) {
 }
 
 bool copyRest(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
-  std::vector<char> buffer(std::size_t{128} << 10U);
+  std::array<char, std::size_t{16} << 10U> buffer;  // on the stack, which may be small
   for (;;) {
     const std::optional<std::size_t> count = source.read(buffer, error);
     if (!count) return false;
