@@ -8,6 +8,26 @@
 
 #include "platform/files/CommandOptions.h"
 #include "platform/files/StandardStreams.h"
+#include "platform/net/URL.h"
+#include "platform/text/ASCII.h"
+#include "platform/text/Case.h"
+
+namespace {
+
+/// Names of ASCII alone, of those that XML allows, are told from mistakes.
+bool isPrefix(std::string_view name) {
+  const auto isOfName = [](char c) {
+    return platform::isASCIILetter(c) || platform::isASCIIDigit(c) || c == '_' || c == '-' ||
+           c == '.';
+  };
+  if (name.empty() || !(platform::isASCIILetter(name.front()) || name.front() == '_')) return false;
+  if (!std::all_of(name.begin(), name.end(), isOfName)) return false;
+  // XML keeps what begins with "xml" to itself.
+  if (platform::lowercased(name).starts_with("xml")) return false;
+  return name != "dc" && name != "qel" && name != "atom";
+}
+
+}  // namespace
 
 QELCommandLine::QELCommandLine(std::string name, std::string usage, std::string summary,
                                std::vector<QELOption> options)
@@ -89,5 +109,14 @@ std::function<bool(const std::string&)> QELTakeText(std::optional<std::string>& 
   return [&text](const std::string& value) {
     text = value;
     return !value.empty();
+  };
+}
+
+std::function<bool(const std::string&)> QELTakeDirectory(QELDirectory& directory) {
+  return [&directory](const std::string& value) {
+    const std::size_t equals = value.find('=');
+    if (equals == std::string::npos) return false;
+    directory = {value.substr(0, equals), value.substr(equals + 1)};
+    return isPrefix(directory.prefix) && platform::URL::parse(directory.uri).has_value();
   };
 }

@@ -8,6 +8,8 @@
 #include <string_view>
 #include <vector>
 
+#include "cli/common/QELDirectory.h"
+
 /// The exit statuses of the companions.
 inline constexpr int kAllWell = 0;
 inline constexpr int kSomethingToLookAt = 1;
@@ -63,5 +65,8 @@ class QELCommandLine {
 /// A `take` that stores true, and one that stores a whole number of at least `least`.
 std::function<bool(const std::string&)> QELTakeFlag(bool& flag);
 std::function<bool(const std::string&)> QELTakeNumber(std::int64_t& number, std::int64_t least);
+/// A `take` that stores "NAME=URI": NAME is a prefix of XML that stands for nothing else in our
+/// feeds, URI an absolute one.
+std::function<bool(const std::string&)> QELTakeDirectory(QELDirectory& directory);
 /// A `take` that stores the text, which is not to be empty.
 std::function<bool(const std::string&)> QELTakeText(std::optional<std::string>& text);

@@ -85,4 +85,18 @@ TEST(QELCommandLineTest, WrongUseIsOneLineThatPointsToTheHelp) {
   }
 }
 
+TEST(QELCommandLineTest, DirectoryIsAPrefixAndItsNamespace) {
+  QELDirectory directory;
+  const auto take = QELTakeDirectory(directory);
+  for (const char* value : {"acme=https://acme.example/ns?a=b", "_a-1.b=urn:x"}) {
+    EXPECT_TRUE(take(value)) << value;
+    EXPECT_EQ(directory.prefix + "=" + directory.uri, value);
+  }
+  for (const char* value :
+       {"", "=", "acme", "acme=", "acme=relative", "=urn:x", "1a=urn:x", "a:b=urn:x", "a b=urn:x",
+        "XmlThing=urn:x", "dc=urn:x", "qel=urn:x", "atom=urn:x", "a=has blank"}) {
+    EXPECT_FALSE(take(value)) << value;
+  }
+}
+
 }  // namespace
