@@ -9,6 +9,7 @@
 #include <optional>
 #include <system_error>
 
+#include "platform/files/Directory.h"
 #include "platform/files/FileDescriptor.h"
 #include "platform/files/PosixError.h"
 #include "platform/files/StandardStreams.h"
@@ -19,8 +20,6 @@ namespace {
 
 /// As many links on the way as Linux follows itself.
 constexpr int kMostLinks = 40;
-
-constexpr mode_t kPermissions = 0777;
 
 bool fail(int code, ErrorSlot& error) {
   error = posixError(code);
@@ -47,11 +46,6 @@ std::optional<std::string> linksResolved(std::string path, ErrorSlot& error) {
   return std::nullopt;
 }
 
-/// Brings to the disk what was written. Some file systems and files know no such thing.
-bool synchronise(int descriptor) {
-  return ::fsync(descriptor) == 0 || errno == EINVAL || errno == EROFS;
-}
-
 bool writeInPlace(const std::string& path, std::string_view bytes, ErrorSlot& error) {
   FileDescriptor file = FileDescriptor::open(path, O_WRONLY | O_TRUNC);
   if (!file.isOpen() || !writeAll(file.get(), bytes) || !file.close()) return fail(errno, error);
@@ -75,21 +69,14 @@ bool replaceFile(const std::string& path, std::string_view bytes, ErrorSlot& err
   const std::optional<std::string> target = linksResolved(path, error);
   if (!target) return false;
   const std::string parent = directoryOf(*target);
-  removeStaleTemporaryFiles(parent);
+  const std::string name = target->substr(parent.size());
+  const std::optional<Directory> directory = Directory::open(parent.empty() ? "." : parent, error);
+  if (!directory) return false;
+  removeStaleTemporaryFiles(*directory);
   TemporaryFile file;
-  if (!file.create(*target, error)) return false;
-  // Where the file system has no permissions, none are lost.
-  if (exists) static_cast<void>(::fchmod(file.descriptor(), status.st_mode & kPermissions));
-  if (!file.write(bytes, error)) return false;
-  if (!synchronise(file.descriptor())) return fail(errno, error);
-  if (!file.commitReplacing(error)) return false;
-
-  // The new name, too. The content is safe either way, so that a directory that cannot be read is
-  // no failure.
-  const FileDescriptor directory =
-      FileDescriptor::open(parent.empty() ? "." : parent, O_RDONLY | O_DIRECTORY);
-  if (directory.isOpen() && !synchronise(directory.get())) return fail(errno, error);
-  return true;
+  return file.create({*directory, name}, error, directory->attributesForSuccessor(name)) &&
+         file.write(bytes, error) && file.sync(error) && file.commitReplacing(error) &&
+         directory->sync(error);
 }
 
 }  // namespace platform
