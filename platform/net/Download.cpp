@@ -16,11 +16,8 @@ namespace platform {
 /// Gathers what happened to a download and hands it to the receiver, one event at a time.
 class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
  public:
-  Transfer(Download& download, URL url, std::string destination, DownloadReceiver& receiver)
-      : url_(std::move(url)),
-        download_(download),
-        destination_(std::move(destination)),
-        receiver_(receiver) {}
+  Transfer(Download& download, URL url, FilePlace place, DownloadReceiver& receiver)
+      : url_(std::move(url)), download_(download), place_(std::move(place)), receiver_(receiver) {}
 
   bool hasEvent() const override { return response_.has_value() || writtenLength_ > 0; }
   void deliverEvent() final;
@@ -31,7 +28,7 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
   virtual bool advance(ErrorSlot& error) = 0;
 
   bool begin(std::int64_t expectedLength, std::string_view, ErrorSlot& error) final {
-    if (!file_.create(destination_, error)) return false;
+    if (!file_.create(place_, error)) return false;
     response_ = expectedLength;
     return true;
   }
@@ -48,7 +45,7 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
   void finish(ErrorSlot error);
 
   Download& download_;
-  std::string destination_;
+  FilePlace place_;
   DownloadReceiver& receiver_;
   TemporaryFile file_;
   std::optional<std::int64_t> response_;  // what is to be delivered
@@ -113,7 +110,7 @@ class Download::FileDownload final : public Transfer {
     const std::optional<std::size_t> length = source_->read(buffer_, error);
     if (!length) return false;
     if (*length == 0) {
-      if (copiedLength_ < source_->size()) {
+      if (copiedLength_ < source_->size() || source_->isShorterNow()) {
         error = transferError(CURLE_PARTIAL_FILE, "The file became shorter while it was read");
       }
       return false;
@@ -127,11 +124,11 @@ class Download::FileDownload final : public Transfer {
   std::uint64_t copiedLength_ = 0;
 };
 
-Download::Download(const URL& url, const std::string& destination, DownloadReceiver& receiver) {
+Download::Download(const URL& url, const FilePlace& place, DownloadReceiver& receiver) {
   if (url.scheme() == "file") {
-    transfer_ = std::make_unique<FileDownload>(*this, url, destination, receiver);
+    transfer_ = std::make_unique<FileDownload>(*this, url, place, receiver);
   } else {
-    transfer_ = std::make_unique<NetworkDownload>(*this, url, destination, receiver);
+    transfer_ = std::make_unique<NetworkDownload>(*this, url, place, receiver);
   }
 }
 

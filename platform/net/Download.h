@@ -2,8 +2,8 @@
 
 #include <cstdint>
 #include <memory>
-#include <string>
 
+#include "platform/files/Directory.h"
 #include "platform/net/URL.h"
 #include "platform/text/ErrorRecord.h"
 
@@ -22,9 +22,9 @@ class DownloadReceiver {
   virtual void didReceiveResponse(Download&, std::int64_t /*expectedLength*/) {}
   /// `length` more bytes have been written.
   virtual void didReceiveDataOfLength(Download&, std::uint64_t /*length*/) {}
-  /// The file stands whole at its path.
+  /// The file stands whole at its place.
   virtual void downloadDidFinish(Download& download) = 0;
-  /// Nothing was changed at the path.
+  /// Nothing was changed at the place.
   virtual void didFailWithError(Download& download, const ErrorRecord& error) = 0;
 };
 
@@ -40,7 +40,7 @@ class DownloadReceiver {
 class Download {
  public:
   /// Starts the transfer; its events come from runEventLoopOnce(). The receiver must outlive it.
-  Download(const URL& url, const std::string& destination, DownloadReceiver& receiver);
+  Download(const URL& url, const FilePlace& place, DownloadReceiver& receiver);
   ~Download();
   Download(const Download&) = delete;
   Download& operator=(const Download&) = delete;

@@ -56,17 +56,6 @@ class FileManagerTest : public testing::Test {
   ErrorSlot error_;
 };
 
-TEST_F(FileManagerTest, IsSymbolicLinkLooksAtThePathItself) {
-  directory_.addFile("file", "");
-  std::filesystem::create_symlink("file", directory_ / "link");
-  std::filesystem::create_symlink("missing", directory_ / "dangling");
-  EXPECT_TRUE(mayBeSymbolicLink(directory_ / "link"));
-  EXPECT_TRUE(mayBeSymbolicLink(directory_ / "dangling"));
-  EXPECT_FALSE(mayBeSymbolicLink(directory_ / "file"));
-  EXPECT_FALSE(mayBeSymbolicLink(directory_.path()));
-  EXPECT_FALSE(mayBeSymbolicLink(directory_ / "missing"));
-}
-
 TEST_F(FileManagerTest, FileExistsFollowsLinks) {
   directory_.addFile("file", "");
   std::filesystem::create_symlink("file", directory_ / "link");
