@@ -54,13 +54,11 @@ def _write(path, content):
         path.write_bytes(content)
 
 
-def _copy(sites_by_path, numbers):
-    names = _files()
+def _copy(files, sites_by_path, numbers):
     for path in [path for path in TREE.rglob("*") if path.is_file()]:
-        if str(path.relative_to(TREE)) not in names:
+        if str(path.relative_to(TREE)) not in files:
             path.unlink()
-    for name in names:
-        content = (ROOT / name).read_bytes()
+    for name, content in files.items():
         if sites_by_path.get(name):
             content = with_faults(content, sites_by_path[name], numbers)
         _write(TREE / name, content)
@@ -93,8 +91,9 @@ def _guilty(output, sites_by_path):
 def _build(jobs, sites_by_path, numbers):
     """Builds, without ever more of the sites until it works. The sites that were left out."""
     left_out = []
+    files = {name: (ROOT / name).read_bytes() for name in _files()}  # which may be edited from now on
     while True:
-        _copy(sites_by_path, numbers)
+        _copy(files, sites_by_path, numbers)
         _configure()
         for target in ("qel_library", "all"):  # the tests only when the product's headers compile
             built = subprocess.run(["cmake", "--build", BUILD, "-j", str(jobs), "--target", target, "--", "-k", "0"],
