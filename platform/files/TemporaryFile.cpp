@@ -261,7 +261,7 @@ bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
 }
 
 bool TemporaryFile::sync(ErrorSlot& error) {
-  if (descriptor_.isOpen() && isSynced(&::fsync, descriptor_.get())) return true;
+  if (descriptor_.isOpen() && isSynced(&::fdatasync, descriptor_.get())) return true;
   error = posixError(descriptor_.isOpen() ? errno : EBADF);
   discard();
   return false;
@@ -278,7 +278,10 @@ void TemporaryFile::applyAttributes() {
 }
 
 bool TemporaryFile::commitReplacing(ErrorSlot& error) {
-  return commit(&moveReplacing, error);
+  struct stat replaced {};
+  const bool isReplacing = descriptor_.isOpen() && ::fstatat(directory_, name_.c_str(), &replaced,
+                                                             AT_SYMLINK_NOFOLLOW) == 0;
+  return (!isReplacing || sync(error)) && commit(&moveReplacing, error);
 }
 
 bool TemporaryFile::commitNew(ErrorSlot& error) {
@@ -337,12 +340,11 @@ bool isTemporaryFileName(std::string_view name) {
 }
 
 void removeStaleTemporaryFiles(const Directory& directory) {
-  FileDescriptor listed =
-      FileDescriptor::openAt(directory.descriptor(), ".", O_RDONLY | O_DIRECTORY);
-  if (!listed.isOpen()) return;
+  FileDescriptor listed(::fcntl(directory.descriptor(), F_DUPFD_CLOEXEC, 0));
   const std::unique_ptr<DIR, int (*)(DIR*)> entries(::fdopendir(listed.get()), &::closedir);
   if (!entries) return;
   listed.release();  // closed with the list
+  ::rewinddir(entries.get());
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string name = entry->d_name;
     if (!isTemporaryFileName(name) || !directory.fileSize(name)) continue;

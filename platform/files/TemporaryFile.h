@@ -40,7 +40,8 @@ class TemporaryFile {
   /// Returns once the content is on the disk.
   bool sync(ErrorSlot& error);
   /// Closes the file, checks that, and moves it to the destination, replacing what is there (but
-  /// never a directory).
+  /// never a directory). What replaces something is on the disk before: after a power cut either of
+  /// the two is there whole.
   bool commitReplacing(ErrorSlot& error);
   /// The same, failing when anything exists at the destination, be it a dangling symbolic link.
   bool commitNew(ErrorSlot& error);
