@@ -8,6 +8,7 @@
 
 #include "platform/files/RegularFile.h"
 #include "platform/files/TemporaryFile.h"
+#include "platform/net/ContentDecoder.h"
 #include "platform/net/EventLoop.h"
 #include "platform/net/NetworkTransfer.h"
 
@@ -30,26 +31,36 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
   /// an error when that failed.
   virtual bool advance(ErrorSlot& error) = 0;
 
-  bool begin(std::int64_t expectedLength, std::string_view, ErrorSlot& error) final {
-    if (!file_.create(destination_, error)) return false;
-    response_ = expectedLength;
+  bool begin(std::int64_t expectedLength, const std::vector<std::string>& contentCodings,
+             ErrorSlot& error) final {
+    if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kRefused, error) ||
+        !file_.create(destination_, error)) {
+      return false;
+    }
+    response_ = decoder_.isCoded() ? -1 : expectedLength;
     return true;
   }
 
   bool take(std::string_view bytes, ErrorSlot& error) final {
-    if (!file_.write(bytes, error)) return false;
-    writtenLength_ += bytes.size();
-    return true;
+    return decoder_.decode(
+        bytes, [this, &error](std::string_view piece) { return write(piece, error); }, error);
   }
 
   URL url_;
 
  private:
+  bool write(std::string_view bytes, ErrorSlot& error) {
+    if (!file_.write(bytes, error)) return false;
+    writtenLength_ += bytes.size();
+    return true;
+  }
+
   void finish(ErrorSlot error);
 
   Download& download_;
   std::string destination_;
   DownloadReceiver& receiver_;
+  ContentDecoder decoder_;
   TemporaryFile file_;
   std::optional<std::int64_t> response_;  // what is to be delivered
   std::uint64_t writtenLength_ = 0;
@@ -68,7 +79,7 @@ void Download::Transfer::deliverEvent() {
 }
 
 void Download::Transfer::finish(ErrorSlot error) {
-  if (!error) file_.commitReplacing(error);
+  if (!error && decoder_.finish(error)) file_.commitReplacing(error);
   // The transfer ends before its last event is told: the receiver may destroy the download, and the
   // event loop has nothing more to expect of it.
   Download& download = download_;
@@ -93,7 +104,7 @@ class Download::NetworkDownload final : public Transfer {
     return false;
   }
 
-  NetworkTransfer network_{url_, nullptr, *this};
+  NetworkTransfer network_{url_, "identity", *this};
 };
 
 class Download::FileDownload final : public Transfer {

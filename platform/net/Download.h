@@ -63,7 +63,8 @@ class DownloadReceiver {
 ///
 /// The bytes are written under a hidden name beside the destination, which is replaced in one step
 /// once they are all there. http and https: a final status of 200 is success and nothing else is;
-/// at most 20 redirects, to http and https only; the body is asked for as it is (no compression).
+/// at most 20 redirects, to http and https only; the body is asked for as it is (no compression),
+/// and one that comes by gzip all the same is decompressed, with an expected length of -1.
 /// file: regular files only. No retry and no time-out. Destroying a running download cancels it.
 ///
 ///     const Download download(*URL::parse("https://example.org/one.mp3"), "one.mp3", receiver);
