@@ -7,13 +7,11 @@
 #include "cli/common/QELError.h"
 #include "cli/common/QELProgress.h"
 #include "cli/common/QELReferenceType.h"
+#include "generators/QELBundleDirectory.h"
 #include "generators/QELBundleNames.h"
 #include "generators/QELNameLedger.h"
 #include "model/QELPodcastKeys.h"
-#include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
-#include "platform/files/TemporaryFile.h"
-#include "platform/plist/PropertyListWriter.h"
 #include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
 #include "platform/text/Text.h"
@@ -24,58 +22,10 @@ using platform::Dictionary;
 using platform::ErrorSlot;
 using platform::Text;
 
-constexpr std::string_view kReferenceFileName = "Info.plist";
-constexpr std::string_view kPostersName = "Posters";
-
 bool allows(const std::optional<QELPodcastSource::FileTypes>& types, std::string_view extension) {
   return !types ||
          std::find(types->begin(), types->end(), platform::lowercased(extension)) != types->end();
 }
-
-/// The directory that is filled, and the paths of the files in it.
-class BundleDirectory {
- public:
-  explicit BundleDirectory(std::string path)
-      : path_(std::move(path)), postersPath_(platform::joinedPath(path_, kPostersName)) {}
-
-  bool create(ErrorSlot& error) const {
-    if (!platform::createDirectories(path_, error)) return false;
-    platform::removeStaleTemporaryFiles(path_);
-    if (leavesBundle()) return true;
-    ErrorSlot ignored;  // a poster that then cannot be saved is warned about
-    platform::createDirectories(postersPath_, ignored);
-    platform::removeStaleTemporaryFiles(postersPath_);
-    return true;
-  }
-
-  /// Absent for a name that no file can have, and for the one that the reference file has.
-  std::optional<std::string> mediaPath(std::string_view name) const {
-    if (!QELIsSaneName(name) || name == kReferenceFileName) return std::nullopt;
-    return platform::joinedPath(path_, name);
-  }
-
-  /// Absent for a name that no file can have, and where "Posters" leads out of the bundle.
-  std::optional<std::string> posterPath(std::string_view name) const {
-    if (!QELIsSaneName(name) || leavesBundle()) return std::nullopt;
-    return platform::joinedPath(postersPath_, name);
-  }
-
-  bool writeReferenceFile(const Dictionary& dictionary) const {
-    ErrorSlot ignored;  // the caller's message does not tell causes apart
-    platform::TemporaryFile file;
-    return file.create(platform::joinedPath(path_, kReferenceFileName), ignored) &&
-           platform::writePropertyList(
-               dictionary, [&](std::string_view bytes) { return file.write(bytes, ignored); }) &&
-           file.commitReplacing(ignored);
-  }
-
- private:
-  /// Nothing is written to, nor removed from, a "Posters" that is a symbolic link.
-  bool leavesBundle() const { return platform::mayBeSymbolicLink(postersPath_); }
-
-  std::string path_;
-  std::string postersPath_;
-};
 
 /// Warns about what is left out of the bundle; absent, as what is left out is.
 template <typename... Arguments>
@@ -88,9 +38,9 @@ std::nullopt_t leftOut(std::string_view format, const Arguments&... arguments) {
 /// reference to it, relative to the bundle; absent without a poster and, after a warning, for one
 /// that could not be fetched.
 template <typename Record>
-std::optional<std::string> fetchPoster(const BundleDirectory& bundle,
-                                       const QELPodcastSource& source, Record& record,
-                                       std::string_view baseName, std::string_view subject) {
+std::optional<std::string> fetchPoster(QELBundleDirectory& bundle, const QELPodcastSource& source,
+                                       Record& record, std::string_view baseName,
+                                       std::string_view subject) {
   const QELMediaReference reference = record.posterReference();
   if (!reference.location) return std::nullopt;
   const platform::OptionalText title = record.title();
@@ -100,14 +50,14 @@ std::optional<std::string> fetchPoster(const BundleDirectory& bundle,
     return leftOut("Unsupported poster image type \"%@\" for %@ \"%@\"", extension, subject, title);
   }
   const std::string posterName = QELNameWithExtension(baseName, extension);
-  const std::optional<std::string> path = name ? bundle.posterPath(posterName) : std::nullopt;
-  if (!path) {
+  const auto place = name ? bundle.posterPlace(posterName) : std::nullopt;
+  if (!place) {
     return leftOut("Could not generate sane path for poster image for %@ \"%@\"", subject, title);
   }
-  if (!record.savePosterToPath(*path, reference)) {
+  if (!bundle.save(*place, [&] { return record.savePosterTo(*place, reference); })) {
     return leftOut("Could not save or download poster image for %@ \"%@\"", subject, title);
   }
-  return platform::joinedPath(kPostersName, posterName);
+  return platform::joinedPath(QELBundleDirectory::kPostersName, posterName);
 }
 
 /// Replaces the two keys of a poster by those of the bundle's file, or removes them without one.
@@ -125,9 +75,8 @@ void setPosterKeys(Dictionary& dictionary, const std::string& referenceKey,
 
 /// Fetches the episode's media and poster. Its entry in the reference file; absent, after a
 /// warning, for an episode that is left out.
-std::optional<Dictionary> fetchEpisode(const BundleDirectory& bundle,
-                                       const QELPodcastSource& source, QELEpisode& episode,
-                                       QELNameLedger& names) {
+std::optional<Dictionary> fetchEpisode(QELBundleDirectory& bundle, const QELPodcastSource& source,
+                                       QELEpisode& episode, QELNameLedger& names) {
   const QELMediaReference media = episode.mediaReference();
   const platform::OptionalText title = episode.title();
   if (!media.location) {
@@ -141,10 +90,9 @@ std::optional<Dictionary> fetchEpisode(const BundleDirectory& bundle,
     return leftOut("Invalid file type \"%@\" for episode \"%@\"", extension, title);
   }
   const std::string mediaName = QELNameWithExtension(base, extension);
-  const std::optional<std::string> path =
-      QELNamesFile(*name) ? bundle.mediaPath(mediaName) : std::nullopt;
-  if (!path) return leftOut("Could not generate sane path for episode \"%@\"", title);
-  if (!episode.saveToPath(*path, media)) {
+  const auto place = QELNamesFile(*name) ? bundle.mediaPlace(mediaName) : std::nullopt;
+  if (!place) return leftOut("Could not generate sane path for episode \"%@\"", title);
+  if (!bundle.save(*place, [&] { return episode.saveTo(*place, media); })) {
     return leftOut("Could not save or download episode \"%@\"", title);
   }
   const auto poster = fetchPoster(bundle, source, episode, base, "episode");
@@ -164,9 +112,9 @@ bool QELBundlePodcastGenerator::generateFromSource(QELPodcastSource& source, Err
     error = QELError(1, "No output path was provided");
     return false;
   }
-  const BundleDirectory bundle(*outputPath_);
+  QELBundleDirectory bundle;
   ErrorSlot cause;
-  if (!bundle.create(cause)) {
+  if (!bundle.open(*outputPath_, cause)) {
     error = QELError(
         2, cause ? platform::formattedText("Could not create bundle: %@", {cause->description})
                  : "Could not create bundle because of an unspecified filesystem error");

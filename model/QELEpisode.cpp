@@ -105,16 +105,16 @@ std::string QELEpisode::description() const {
   return platform::formattedText("<%@: \"%@\">", {"QELEpisode", title()});
 }
 
-bool QELEpisode::saveToPath(const std::string& path, const QELMediaReference& media) {
-  return fetchToPath(media, path, [this] {
+bool QELEpisode::saveTo(const platform::FilePlace& place, const QELMediaReference& media) {
+  return fetchTo(place, media, [this] {
     QELProgress("N", "Downloading episode entitled \"%@\" (%lu bytes)...", title(),
                 contentLength());
     downloadingPoster_ = false;
   });
 }
 
-bool QELEpisode::savePosterToPath(const std::string& path, const QELMediaReference& poster) {
-  return fetchToPath(poster, path, [this] {
+bool QELEpisode::savePosterTo(const platform::FilePlace& place, const QELMediaReference& poster) {
+  return fetchTo(place, poster, [this] {
     QELProgress("N", "Downloading poster for episode entitled \"%@\"...", title());
     downloadingPoster_ = true;
   });

@@ -105,15 +105,14 @@ class QELEpisode : private QELFetcher {
   /// media are copied, never over an existing file; remote ones are downloaded over whatever is
   /// there, with a byte counter among the progress lines, and the size that the server announces
   /// becomes the content length.
-  bool saveToPath(const std::string& path) { return saveToPath(path, mediaReference()); }
+  bool saveToPath(const std::string& path) { return saveTo(path, mediaReference()); }
   /// The same for the episode's poster, without a counter. The size announced for a poster becomes
   /// the content length too.
-  bool savePosterToPath(const std::string& path) {
-    return savePosterToPath(path, posterReference());
-  }
-  /// The same for the caller who already has the reference, since a name was made from it.
-  bool saveToPath(const std::string& path, const QELMediaReference& media);
-  bool savePosterToPath(const std::string& path, const QELMediaReference& poster);
+  bool savePosterToPath(const std::string& path) { return savePosterTo(path, posterReference()); }
+  /// The same for the caller who has opened the directory, and already has the reference, since a
+  /// name was made from it.
+  bool saveTo(const platform::FilePlace& place, const QELMediaReference& media);
+  bool savePosterTo(const platform::FilePlace& place, const QELMediaReference& poster);
 
  private:
   using TextField = platform::AtomicValue<OptionalText>;

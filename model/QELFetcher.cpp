@@ -3,15 +3,15 @@
 #include "platform/files/FileManager.h"
 #include "platform/net/EventLoop.h"
 
-bool QELFetcher::fetchToPath(const QELMediaReference& reference, const std::string& path,
-                             const std::function<void()>& willDownload) {
+bool QELFetcher::fetchTo(const platform::FilePlace& place, const QELMediaReference& reference,
+                         const std::function<void()>& willDownload) {
   if (!reference.location) return false;
-  if (!reference.isRemote) return platform::copyFile(reference.location->string(), path);
+  if (!reference.isRemote) return platform::copyFile(reference.location->string(), place);
   if (!reference.url) return false;
 
   willDownload();
   downloadFinished_ = downloadSuccess_ = false;
-  const platform::Download download(*reference.url, path, *this);
+  const platform::Download download(*reference.url, place, *this);
   while (!downloadFinished_ && platform::runEventLoopOnce()) {
   }
   return downloadSuccess_;

@@ -1,9 +1,9 @@
 #pragma once
 
 #include <functional>
-#include <string>
 
 #include "model/QELMediaReference.h"
+#include "platform/files/Directory.h"
 #include "platform/net/Download.h"
 
 /// A record that fetches what it refers to: it starts the download, receives its events and waits
@@ -18,12 +18,12 @@ class QELFetcher : protected platform::DownloadReceiver {
  protected:
   QELFetcher() = default;
 
-  /// Puts what the reference leads to at the path, and returns once it is there or has failed
+  /// Puts what the reference leads to at the place, and returns once it is there or has failed
   /// (false). A path is copied, never over an existing file; a URL is downloaded over whatever is
   /// there, and its events come in between. A missing location and a remote one that is no valid
   /// URL fail at once; `willDownload` is called before a download.
-  bool fetchToPath(const QELMediaReference& reference, const std::string& path,
-                   const std::function<void()>& willDownload);
+  bool fetchTo(const platform::FilePlace& place, const QELMediaReference& reference,
+               const std::function<void()>& willDownload);
 
  private:
   void downloadDidFinish(platform::Download& download) final;

@@ -8,8 +8,9 @@ bool QELPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   return false;
 }
 
-bool QELPodcastSource::savePosterToPath(const std::string& path, const QELMediaReference& poster) {
-  return fetchToPath(poster, path, [this] {
+bool QELPodcastSource::savePosterTo(const platform::FilePlace& place,
+                                    const QELMediaReference& poster) {
+  return fetchTo(place, poster, [this] {
     QELProgress("N", "Downloading poster for podcast entitled \"%@\"...", title());
   });
 }

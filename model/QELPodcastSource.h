@@ -36,11 +36,10 @@ class QELPodcastSource : private QELFetcher {
   /// Puts the podcast's poster at the path and returns once it is there or has failed (false). A
   /// local poster is copied, never over an existing file; a remote one is downloaded over whatever
   /// is there.
-  bool savePosterToPath(const std::string& path) {
-    return savePosterToPath(path, posterReference());
-  }
-  /// The same for the caller who already has `posterReference()`, since a name was made from it.
-  bool savePosterToPath(const std::string& path, const QELMediaReference& poster);
+  bool savePosterToPath(const std::string& path) { return savePosterTo(path, posterReference()); }
+  /// The same for the caller who has opened the directory, and already has `posterReference()`,
+  /// since a name was made from it.
+  bool savePosterTo(const platform::FilePlace& place, const QELMediaReference& poster);
 
   /// Where the poster lies, by `posterLocation` and `posterReferenceType` of this moment.
   QELMediaReference posterReference() const { return {posterLocation_, posterReferenceType_}; }

@@ -23,13 +23,18 @@ bool canTryAgain(int descriptor, short events) {
 }  // namespace
 
 FileDescriptor FileDescriptor::open(const std::string& path, int flags, unsigned mode) {
+  return openAt(AT_FDCWD, path, flags, mode);
+}
+
+FileDescriptor FileDescriptor::openAt(int directory, const std::string& path, int flags,
+                                      unsigned mode) {
   if (path.find('\0') != std::string::npos) {
     errno = EINVAL;
     return {};
   }
   int descriptor = -1;
   do {
-    descriptor = ::open(path.c_str(), flags | O_CLOEXEC | O_NOCTTY, mode);
+    descriptor = ::openat(directory, path.c_str(), flags | O_CLOEXEC | O_NOCTTY, mode);
   } while (descriptor < 0 && errno == EINTR);
   return FileDescriptor(descriptor);
 }
@@ -37,6 +42,14 @@ FileDescriptor FileDescriptor::open(const std::string& path, int flags, unsigned
 bool FileDescriptor::close() {
   const int descriptor = std::exchange(descriptor_, -1);
   return descriptor < 0 || ::close(descriptor) == 0;
+}
+
+bool isSynced(int (*call)(int), int descriptor) {
+  int result = -1;
+  do {
+    result = call(descriptor);
+  } while (result != 0 && errno == EINTR);
+  return result == 0 || errno == EINVAL || errno == ENOSYS || errno == EOPNOTSUPP;
 }
 
 bool writeAll(int descriptor, std::string_view bytes) {

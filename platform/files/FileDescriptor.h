@@ -25,16 +25,25 @@ class FileDescriptor {
   /// open(2) with the flags given and those that every file of ours has. Not open after a failure;
   /// a path that holds a NUL is one (EINVAL).
   static FileDescriptor open(const std::string& path, int flags, unsigned mode = 0);
+  /// openat(2), likewise.
+  static FileDescriptor openAt(int directory, const std::string& path, int flags,
+                               unsigned mode = 0);
 
   bool isOpen() const { return descriptor_ >= 0; }
   /// The descriptor, -1 when not open.
   int get() const { return descriptor_; }
   /// False when what was written may not have got through. Not open afterwards in any case.
   bool close();
+  /// Leaves the descriptor, open or not, to the caller.
+  int release() { return std::exchange(descriptor_, -1); }
 
  private:
   int descriptor_ = -1;
 };
+
+/// Calls fsync, fdatasync or syncfs until no signal interrupts it. What has nothing to tell a disk
+/// counts as told.
+bool isSynced(int (*call)(int), int descriptor);
 
 // These three wait where the descriptor is non-blocking, and go on after a signal.
 

@@ -22,26 +22,39 @@
 namespace platform {
 namespace {
 
-/// Lets the kernel copy as much as it will. Whatever it refuses, or takes for the end of the file
-/// without being there, is left to the caller, who learns the reason by going on from here.
-void copyInsideKernel(const RegularFile& source, const TemporaryFile& copy) {
+/// Lets the kernel copy as much as it will: the number of bytes. Whatever it refuses, or takes for
+/// the end of the file without being there, is left to the caller, who learns the reason by going
+/// on from here.
+std::uint64_t copyInsideKernel(const RegularFile& source, const TemporaryFile& copy) {
   // Small enough that a signal ends a copy promptly.
   constexpr std::size_t kPieceSize = std::size_t{64} << 20U;
+  std::uint64_t length = 0;
   ssize_t count = 0;
   do {
     count =
         ::copy_file_range(source.descriptor(), nullptr, copy.descriptor(), nullptr, kPieceSize, 0);
+    if (count > 0) length += static_cast<std::uint64_t>(count);
   } while (count > 0 || (count < 0 && errno == EINTR));
+  return length;
 }
 
-bool copyRest(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
+/// Fails for a file that became shorter meanwhile: the copy would be of nothing that ever was.
+bool copyAll(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
+  std::uint64_t length = copyInsideKernel(source, copy);
   std::array<char, std::size_t{16} << 10U> buffer;  // on the stack, which may be small
   for (;;) {
     const std::optional<std::size_t> count = source.read(buffer, error);
     if (!count) return false;
-    if (*count == 0) return true;
+    if (*count == 0) return length >= source.size() && !source.isShorterNow();
     if (!copy.write(std::string_view(buffer.data(), *count), error)) return false;
+    length += *count;
   }
+}
+
+bool isTaken(const FilePlace& place) {
+  if (place.directory != nullptr) return place.directory->contains(place.name);
+  struct stat status {};
+  return ::lstat(place.name.c_str(), &status) == 0;
 }
 
 }  // namespace
@@ -49,12 +62,6 @@ bool copyRest(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
 bool fileExists(const std::string& path) {
   struct stat status {};
   return path.find('\0') == std::string::npos && ::stat(path.c_str(), &status) == 0;
-}
-
-bool mayBeSymbolicLink(const std::string& path) {
-  struct stat status {};
-  if (::lstat(path.c_str(), &status) == 0) return S_ISLNK(status.st_mode);
-  return errno != ENOENT && errno != ENOTDIR;
 }
 
 std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& error) {
@@ -104,15 +111,13 @@ bool createDirectories(const std::string& path, ErrorSlot& error) {
   return true;
 }
 
-bool copyFile(const std::string& source, const std::string& destination) {
+bool copyFile(const std::string& source, const FilePlace& place) {
   ErrorSlot error;
   std::optional<RegularFile> original = RegularFile::open(source, error);
-  struct stat status {};
-  if (!original || ::lstat(destination.c_str(), &status) == 0) return false;
+  if (!original || isTaken(place)) return false;
   TemporaryFile copy;
-  if (!copy.create(destination, error)) return false;
-  copyInsideKernel(*original, copy);
-  return copyRest(*original, copy, error) && copy.commitNew(error);
+  return copy.create(place, error, original->attributes()) && copyAll(*original, copy, error) &&
+         copy.sync(error) && copy.commitNew(error);
 }
 
 }  // namespace platform

@@ -4,6 +4,7 @@
 #include <optional>
 #include <string>
 
+#include "platform/files/Directory.h"
 #include "platform/text/ByteSource.h"
 #include "platform/text/ErrorRecord.h"
 
@@ -15,10 +16,6 @@ inline constexpr std::uint64_t kWholeReadLimit = std::uint64_t{2} << 30U;
 /// Whether anything (file, directory, ...) exists at the path, symbolic links followed.
 bool fileExists(const std::string& path);
 
-/// Whether the path itself is a symbolic link, dangling or not; true as well when something is
-/// there and cannot be looked at.
-bool mayBeSymbolicLink(const std::string& path);
-
 /// The whole content of a regular file, read as it is wanted. Anything else (directory, device,
 /// FIFO, socket) and a file over kWholeReadLimit give no value and fill the slot; a file that grows
 /// beyond the limit meanwhile fails like one that cannot be read any further.
@@ -27,8 +24,9 @@ std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& erro
 /// Creates the directory and all missing parents; an existing directory is accepted.
 bool createDirectories(const std::string& path, ErrorSlot& error);
 
-/// Copies a regular file to a path at which nothing exists yet (not even a dangling symbolic link).
-/// The copy appears under its name whole or not at all.
-bool copyFile(const std::string& source, const std::string& destination);
+/// Copies a regular file to a place at which nothing exists yet (not even a dangling symbolic
+/// link). The copy appears under its name whole and on the disk, with the permissions and the time
+/// of the original, or not at all. An original that becomes shorter meanwhile is a failure.
+bool copyFile(const std::string& source, const FilePlace& place);
 
 }  // namespace platform

@@ -34,7 +34,14 @@ std::optional<RegularFile> RegularFile::open(const std::string& path, ErrorSlot&
   }
   if (!isRegular(status, error)) return std::nullopt;
   static_assert(sizeof(status.st_size) == sizeof(std::uint64_t));
-  return RegularFile(std::move(descriptor), static_cast<std::uint64_t>(status.st_size));
+  return RegularFile(std::move(descriptor), static_cast<std::uint64_t>(status.st_size),
+                     {status.st_mode & kPermissions, status.st_mtim});
+}
+
+bool RegularFile::isShorterNow() const {
+  struct stat status {};
+  return ::fstat(descriptor_.get(), &status) != 0 ||
+         static_cast<std::uint64_t>(status.st_size) < size_;
 }
 
 std::optional<std::size_t> RegularFile::read(std::span<char> buffer, ErrorSlot& error) {

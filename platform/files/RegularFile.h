@@ -7,6 +7,7 @@
 #include <string>
 #include <utility>
 
+#include "platform/files/FileAttributes.h"
 #include "platform/files/FileDescriptor.h"
 #include "platform/text/ErrorRecord.h"
 
@@ -22,15 +23,20 @@ class RegularFile {
   int descriptor() const { return descriptor_.get(); }
   /// The size when it was opened; some files (in /proc) claim 0 and hold more.
   std::uint64_t size() const { return size_; }
+  /// What a copy takes over, of the moment when it was opened.
+  const FileAttributes& attributes() const { return attributes_; }
+  /// Whether it is shorter than when it was opened.
+  bool isShorterNow() const;
   /// Reads the next bytes: their number, 0 at the end. No value, and the slot filled, on failure.
   std::optional<std::size_t> read(std::span<char> buffer, ErrorSlot& error);
 
  private:
-  RegularFile(FileDescriptor descriptor, std::uint64_t size)
-      : descriptor_(std::move(descriptor)), size_(size) {}
+  RegularFile(FileDescriptor descriptor, std::uint64_t size, const FileAttributes& attributes)
+      : descriptor_(std::move(descriptor)), size_(size), attributes_(attributes) {}
 
   FileDescriptor descriptor_;
   std::uint64_t size_;
+  FileAttributes attributes_;
 };
 
 }  // namespace platform

@@ -12,6 +12,7 @@
 #include <csignal>
 #include <cstddef>
 #include <cstdio>
+#include <ctime>
 #include <memory>
 #include <utility>
 
@@ -29,7 +30,22 @@ constexpr std::size_t kRandomBytes = 8;
 
 constexpr int kCreationAttempts = 100;
 
-constexpr std::array kEndingSignals = {SIGINT, SIGTERM, SIGHUP};
+/// All signals by which the process ends unless it does something about them. Those that tell of a
+/// fault of its own are left out: what it remembers of its files is not to be trusted then.
+const sigset_t& endingSignals() {
+  static const sigset_t signals = [] {
+    constexpr std::array kOthers = {
+        SIGABRT, SIGBUS,  SIGFPE,  SIGILL,  SIGSEGV, SIGSYS, SIGTRAP,   // faults
+        SIGCHLD, SIGCONT, SIGTSTP, SIGTTIN, SIGTTOU, SIGURG, SIGWINCH,  // do not end it
+        SIGKILL, SIGSTOP, SIGPIPE, SIGXFSZ                              // see prepareProcess
+    };
+    sigset_t result;
+    ::sigfillset(&result);
+    for (const int signal : kOthers) ::sigdelset(&result, signal);
+    return result;
+  }();
+  return signals;
+}
 
 /// Empty, and errno set, when the system gives no random bytes.
 std::string hiddenName() {
@@ -53,20 +69,37 @@ bool lock(int descriptor) {
   return result == 0;
 }
 
-bool isNamed(int descriptor, const std::string& path) {
+bool isNamed(int descriptor, int directory, const std::string& name) {
   struct stat open {};
   struct stat named {};
-  return ::fstat(descriptor, &open) == 0 && ::lstat(path.c_str(), &named) == 0 &&
+  return ::fstat(descriptor, &open) == 0 &&
+         ::fstatat(directory, name.c_str(), &named, AT_SYMLINK_NOFOLLOW) == 0 &&
          open.st_dev == named.st_dev && open.st_ino == named.st_ino;
 }
 
-int moveNew(const char* from, const char* to) {
-  if (::renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0) return 0;
-  if (errno != EINVAL && errno != ENOSYS) return -1;
+bool moveReplacing(int directory, const char* from, const char* to) {
+  return ::renameat(directory, from, directory, to) == 0;
+}
+
+bool moveNew(int directory, const char* from, const char* to) {
+  if (::renameat2(directory, from, directory, to, RENAME_NOREPLACE) == 0) return true;
+  if (errno != EINVAL && errno != ENOSYS) return false;
   // Some file systems (NFS) cannot rename that way. A link is refused for an existing name, too.
-  if (::link(from, to) != 0) return -1;
-  ::unlink(from);
-  return 0;
+  if (::linkat(directory, from, directory, to, 0) == 0) {
+    ::unlinkat(directory, from, 0);
+    return true;
+  }
+  if (errno == EEXIST) return false;
+  // Others (exFAT) have no links either. There an empty file, which is never made over another,
+  // holds the name until it is replaced.
+  const FileDescriptor holder(
+      ::openat(directory, to, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, S_IRUSR | S_IWUSR));
+  if (!holder.isOpen()) return false;
+  if (moveReplacing(directory, from, to)) return true;
+  const int failure = errno;
+  ::unlinkat(directory, to, 0);
+  errno = failure;
+  return false;
 }
 
 }  // namespace
@@ -80,10 +113,7 @@ class TemporaryFile::Registry {
   class Hold {
    public:
     Hold() {
-      sigset_t signals;
-      ::sigemptyset(&signals);
-      for (const int signal : kEndingSignals) ::sigaddset(&signals, signal);
-      ::pthread_sigmask(SIG_BLOCK, &signals, &previous_);
+      ::pthread_sigmask(SIG_BLOCK, &endingSignals(), &previous_);
       acquire();
     }
     ~Hold() {
@@ -100,21 +130,26 @@ class TemporaryFile::Registry {
   /// Installs the handler for the signals that would end the process: one that is ignored (as under
   /// nohup) stays so, and a handler that somebody else installed stays, too.
   static void handleSignals() {
-    struct sigaction action {};
-    action.sa_handler = &Registry::removeAllAndEnd;
-    for (const int signal : kEndingSignals) ::sigaddset(&action.sa_mask, signal);
-    for (const int signal : kEndingSignals) {
-      struct sigaction current {};
-      ::sigaction(signal, nullptr, &current);
-      if (current.sa_handler == SIG_DFL) ::sigaction(signal, &action, nullptr);
-    }
+    static const bool isDone = [] {
+      struct sigaction action {};
+      action.sa_handler = &Registry::removeAllAndEnd;
+      action.sa_mask = endingSignals();
+      for (int signal = 1; signal <= SIGRTMAX; ++signal) {
+        if (::sigismember(&action.sa_mask, signal) != 1) continue;
+        struct sigaction current {};
+        if (::sigaction(signal, nullptr, &current) == 0 && current.sa_handler == SIG_DFL) {
+          ::sigaction(signal, &action, nullptr);
+        }
+      }
+      return true;
+    }();
+    static_cast<void>(isDone);
   }
 
   static void add(TemporaryFile& file, const Hold&) { file.next_ = std::exchange(first_, &file); }
 
   /// The file has been added and not been removed since.
-  static void remove(TemporaryFile& file) {
-    const Hold hold;
+  static void remove(TemporaryFile& file, const Hold&) {
     TemporaryFile** link = &first_;
     while (*link != &file) link = &(*link)->next_;
     *link = std::exchange(file.next_, nullptr);
@@ -123,7 +158,7 @@ class TemporaryFile::Registry {
   /// Only while the list is held.
   static void unlinkAll() {
     for (const TemporaryFile* file = first_; file != nullptr; file = file->next_) {
-      ::unlink(file->path_.c_str());
+      ::unlinkat(file->directory_, file->hiddenName_.c_str(), 0);
     }
   }
 
@@ -153,39 +188,93 @@ TemporaryFile::~TemporaryFile() {
   discard();
 }
 
-bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
+bool TemporaryFile::openDirectory(const FilePlace& place, ErrorSlot& error) {
   discard();
-  const std::string directory = destination.substr(0, destination.rfind('/') + 1);
-  if (destination.size() == directory.size() || destination.find('\0') != std::string::npos) {
-    error = posixError(destination.empty() ? ENOENT : EINVAL);
+  const std::size_t parentLength =
+      place.directory != nullptr ? 0 : place.name.rfind('/') + 1;  // npos + 1 is 0
+  name_ = place.name.substr(parentLength);
+  if (!isFileName(name_)) {
+    error = posixError(place.name.empty() ? ENOENT : EINVAL);
     return false;
   }
-  destination_ = destination;
+  if (place.directory != nullptr) {
+    directory_ = place.directory->descriptor();
+    return true;
+  }
+  ownDirectory_ = FileDescriptor::open(parentLength == 0 ? "." : place.name.substr(0, parentLength),
+                                       O_PATH | O_DIRECTORY);
+  directory_ = ownDirectory_.get();
+  if (directory_ < 0) error = posixError(errno);
+  return directory_ >= 0;
+}
+
+bool TemporaryFile::create(const FilePlace& place, ErrorSlot& error,
+                           const std::optional<FileAttributes>& attributes) {
+  if (!openDirectory(place, error)) return false;
+  attributes_ = attributes;
+  needsLock_ = place.directory == nullptr || !place.directory->isLocked();
+  isPart_ = false;
   Registry::handleSignals();
+  return createHidden(error);
+}
+
+bool TemporaryFile::createPart(const FilePlace& place, const std::string& partName,
+                               std::uint64_t keptSize, ErrorSlot& error) {
+  constexpr unsigned kEveryone = 0666;
+  if (!openDirectory(place, error)) return false;
+  attributes_.reset();
+  needsLock_ = false;
+  isPart_ = true;
+  if (!isFileName(partName)) return fail(EINVAL, error);
+  // Another name of the same file would get the bytes as well; a new file has one.
+  if (keptSize == 0 && ::unlinkat(directory_, partName.c_str(), 0) != 0 && errno != ENOENT) {
+    return fail(errno, error);
+  }
+  const int flags = keptSize == 0 ? O_CREAT | O_EXCL : O_NONBLOCK;
+  descriptor_ =
+      FileDescriptor::openAt(directory_, partName, O_WRONLY | O_NOFOLLOW | flags, kEveryone);
+  struct stat found {};
+  if (!descriptor_.isOpen() || ::fstat(descriptor_.get(), &found) != 0) return fail(errno, error);
+  const auto size = static_cast<off_t>(keptSize);
+  if (!S_ISREG(found.st_mode) || found.st_nlink != 1 || found.st_size < size) {
+    return fail(EINVAL, error);
+  }
+  if (::ftruncate(descriptor_.get(), size) != 0 || ::lseek(descriptor_.get(), size, SEEK_SET) < 0) {
+    return fail(errno, error);
+  }
+  hiddenName_ = partName;
+  return true;
+}
+
+bool TemporaryFile::fail(int code, ErrorSlot& error) {
+  error = posixError(code);
+  discard();
+  return false;
+}
+
+bool TemporaryFile::createHidden(ErrorSlot& error) {
+  constexpr unsigned kEveryone = 0666;
+  const unsigned mode = attributes_ ? S_IRUSR | S_IWUSR : kEveryone;
   int failure = EEXIST;
   for (int attempt = 0; attempt < kCreationAttempts && failure == EEXIST; ++attempt) {
-    const std::string name = hiddenName();
+    std::string name = hiddenName();
     if (name.empty()) {
       failure = errno;
       break;
     }
-    std::string path = directory + name;
     const Registry::Hold hold;
-    FileDescriptor file =
-        FileDescriptor::open(path, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW, 0666);
-    if (!file.isOpen()) {
+    descriptor_ =
+        FileDescriptor::openAt(directory_, name, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW, mode);
+    if (!descriptor_.isOpen()) {
       failure = errno;
       continue;
     }
-    // Until it is locked, the file looks like one whose owner is dead, and may be removed as such:
-    // then it is left to the remover, and another takes its place.
-    const bool taken = !lock(file.get()) && errno == EWOULDBLOCK;
-    if (taken || !isNamed(file.get(), path)) {
-      ::unlink(path.c_str());
+    if (needsLock_ && !takeLock(name)) {
+      ::unlinkat(directory_, name.c_str(), 0);
+      descriptor_.close();
       continue;
     }
-    descriptor_ = std::move(file);
-    path_ = std::move(path);
+    hiddenName_ = std::move(name);
     Registry::add(*this, hold);
     return true;
   }
@@ -193,33 +282,64 @@ bool TemporaryFile::create(const std::string& destination, ErrorSlot& error) {
   return false;
 }
 
+/// Until it is locked, a new file looks like one whose owner is dead, and may be removed as such:
+/// then it is left to the remover (false), and another takes its place. In a directory that is
+/// locked as a whole there is no remover.
+bool TemporaryFile::takeLock(const std::string& name) {
+  const bool taken = !lock(descriptor_.get()) && errno == EWOULDBLOCK;
+  return !taken && isNamed(descriptor_.get(), directory_, name);
+}
+
 bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
   if (descriptor_.isOpen() && writeAll(descriptor_.get(), bytes)) return true;
-  error = posixError(descriptor_.isOpen() ? errno : EBADF);
-  discard();
-  return false;
+  return fail(descriptor_.isOpen() ? errno : EBADF, error);
+}
+
+bool TemporaryFile::sync(ErrorSlot& error) {
+  if (descriptor_.isOpen() && isSynced(&::fdatasync, descriptor_.get())) return true;
+  return fail(descriptor_.isOpen() ? errno : EBADF, error);
+}
+
+/// Where the file system has none, it goes on without.
+void TemporaryFile::applyAttributes() {
+  if (!attributes_) return;
+  ::fchmod(descriptor_.get(), attributes_->mode);
+  if (attributes_->modified) {
+    const std::array<timespec, 2> times = {timespec{0, UTIME_OMIT}, *attributes_->modified};
+    ::futimens(descriptor_.get(), times.data());
+  }
 }
 
 bool TemporaryFile::commitReplacing(ErrorSlot& error) {
-  return commit(&::rename, error);
+  struct stat replaced {};
+  const bool isReplacing = descriptor_.isOpen() && ::fstatat(directory_, name_.c_str(), &replaced,
+                                                             AT_SYMLINK_NOFOLLOW) == 0;
+  return (!isReplacing || sync(error)) && commit(&moveReplacing, error);
 }
 
 bool TemporaryFile::commitNew(ErrorSlot& error) {
   return commit(&moveNew, error);
 }
 
-bool TemporaryFile::commit(int (*move)(const char* from, const char* to), ErrorSlot& error) {
+bool TemporaryFile::commit(bool (*move)(int directory, const char* from, const char* to),
+                           ErrorSlot& error) {
+  if (!descriptor_.isOpen()) return fail(EBADF, error);
+  applyAttributes();
   // The second descriptor keeps the lock until the file has its final name.
-  const FileDescriptor lockHolder(::fcntl(descriptor_.get(), F_DUPFD_CLOEXEC, 0));
-  if (!lockHolder.isOpen() || !descriptor_.close() ||
-      move(path_.c_str(), destination_.c_str()) != 0) {
-    error = posixError(errno);
-    discard();
-    return false;
+  FileDescriptor lockHolder;
+  if (needsLock_) lockHolder = FileDescriptor(::fcntl(descriptor_.get(), F_DUPFD_CLOEXEC, 0));
+  bool isDone = lockHolder.isOpen() == needsLock_ && descriptor_.close();
+  int failure = errno;
+  if (isDone) {
+    const Registry::Hold hold;
+    isDone = move(directory_, hiddenName_.c_str(), name_.c_str());
+    failure = errno;
+    if (isDone) {
+      if (!isPart_) Registry::remove(*this, hold);
+      hiddenName_.clear();
+    }
   }
-  Registry::remove(*this);
-  path_.clear();
-  return true;
+  return isDone || fail(failure, error);
 }
 
 void TemporaryFile::removeAllAndExit(int status) {
@@ -229,11 +349,13 @@ void TemporaryFile::removeAllAndExit(int status) {
 }
 
 void TemporaryFile::discard() {
-  if (path_.empty()) return;
-  ::unlink(path_.c_str());
   descriptor_.close();
-  Registry::remove(*this);
-  path_.clear();
+  if (isPart_) hiddenName_.clear();
+  if (hiddenName_.empty()) return;
+  const Registry::Hold hold;
+  ::unlinkat(directory_, hiddenName_.c_str(), 0);
+  Registry::remove(*this, hold);
+  hiddenName_.clear();
 }
 
 bool isTemporaryFileName(std::string_view name) {
@@ -245,18 +367,18 @@ bool isTemporaryFileName(std::string_view name) {
          std::string_view::npos;
 }
 
-void removeStaleTemporaryFiles(const std::string& directory) {
-  const std::string parent = directory.empty() ? "." : directory;
-  const std::unique_ptr<DIR, int (*)(DIR*)> entries(::opendir(parent.c_str()), &::closedir);
+void removeStaleTemporaryFiles(const Directory& directory) {
+  FileDescriptor listed(::fcntl(directory.descriptor(), F_DUPFD_CLOEXEC, 0));
+  const std::unique_ptr<DIR, int (*)(DIR*)> entries(::fdopendir(listed.get()), &::closedir);
   if (!entries) return;
+  listed.release();  // closed with the list
+  ::rewinddir(entries.get());
   while (const dirent* entry = ::readdir(entries.get())) {
-    const std::string_view name = entry->d_name;
-    if (!isTemporaryFileName(name)) continue;
-    const std::string path = std::string(parent).append("/").append(name);
-    struct stat status {};
-    if (::lstat(path.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) continue;
-    const FileDescriptor file = FileDescriptor::open(path, O_RDWR | O_NONBLOCK | O_NOFOLLOW);
-    if (file.isOpen() && lock(file.get())) ::unlink(path.c_str());
+    const std::string name = entry->d_name;
+    if (!isTemporaryFileName(name) || !directory.fileSize(name)) continue;
+    const FileDescriptor file =
+        FileDescriptor::openAt(directory.descriptor(), name, O_RDWR | O_NONBLOCK | O_NOFOLLOW);
+    if (file.isOpen() && lock(file.get())) ::unlinkat(directory.descriptor(), name.c_str(), 0);
   }
 }
 

@@ -1,6 +1,9 @@
 #include "platform/net/Download.h"
 
+#include <algorithm>
+#include <array>
 #include <cstddef>
+#include <cstdint>
 #include <optional>
 #include <string_view>
 #include <utility>
@@ -17,10 +20,12 @@ namespace platform {
 /// Gathers what happened to a download and hands it to the receiver, one event at a time.
 class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
  public:
-  Transfer(Download& download, URL url, std::string destination, DownloadReceiver& receiver)
+  Transfer(Download& download, URL url, FilePlace place, DownloadReceiver& receiver,
+           DownloadOptions options)
       : url_(std::move(url)),
         download_(download),
-        destination_(std::move(destination)),
+        place_(std::move(place)),
+        options_(std::move(options)),
         receiver_(receiver) {}
 
   bool hasEvent() const override { return response_.has_value() || writtenLength_ > 0; }
@@ -32,11 +37,15 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
   virtual bool advance(ErrorSlot& error) = 0;
 
   bool begin(std::int64_t expectedLength, const std::vector<std::string>& contentCodings,
-             ErrorSlot& error) final {
-    if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kRefused, error) ||
-        !file_.create(destination_, error)) {
+             ErrorSlot& error) override {
+    if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kRefused, error)) {
       return false;
     }
+    const bool isCreated =
+        options_.partName.empty()
+            ? file_.create(place_, error)
+            : file_.createPart(place_, options_.partName, download_.resumedLength_, error);
+    if (!isCreated) return false;
     response_ = decoder_.isCoded() ? -1 : expectedLength;
     return true;
   }
@@ -47,6 +56,9 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
   }
 
   URL url_;
+  Download& download_;
+  FilePlace place_;
+  DownloadOptions options_;
 
  private:
   bool write(std::string_view bytes, ErrorSlot& error) {
@@ -57,8 +69,6 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
 
   void finish(ErrorSlot error);
 
-  Download& download_;
-  std::string destination_;
   DownloadReceiver& receiver_;
   ContentDecoder decoder_;
   TemporaryFile file_;
@@ -79,7 +89,9 @@ void Download::Transfer::deliverEvent() {
 }
 
 void Download::Transfer::finish(ErrorSlot error) {
-  if (!error && decoder_.finish(error)) file_.commitReplacing(error);
+  if (!error && decoder_.finish(error)) {
+    options_.replaces ? file_.commitReplacing(error) : file_.commitNew(error);
+  }
   // The transfer ends before its last event is told: the receiver may destroy the download, and the
   // event loop has nothing more to expect of it.
   Download& download = download_;
@@ -99,12 +111,45 @@ class Download::NetworkDownload final : public Transfer {
   bool hasEvent() const override { return Transfer::hasEvent() || network_.hasEnded(); }
 
  private:
+  bool begin(std::int64_t expectedLength, const std::vector<std::string>& contentCodings,
+             ErrorSlot& error) override {
+    download_.resumedLength_ = network_.offset();
+    takeAnswer(contentCodings.empty());
+    return Transfer::begin(expectedLength, contentCodings, error);
+  }
+
   bool advance(ErrorSlot& error) override {
     error = network_.error();
+    if (error && error->domain == "HTTP") takeAnswer(false);
     return false;
   }
 
-  NetworkTransfer network_{url_, "identity", *this};
+  TransferRequest request() const {
+    TransferRequest request{.acceptedEncoding = "identity", .stallLimit = options_.stallLimit};
+    if (!options_.partValidator.empty() && place_.directory != nullptr) {
+      request.offset = place_.directory->fileSize(options_.partName).value_or(0);
+      request.validator = options_.partValidator;
+    }
+    return request;
+  }
+
+  void takeAnswer(bool isAsStored) {
+    DownloadAnswer& answer = download_.answer_;
+    answer.entityTag = network_.field("ETag");
+    answer.lastModified = network_.field("Last-Modified");
+    answer.contentType = network_.field("Content-Type");
+    answer.retryAfter = network_.field("Retry-After");
+    const std::string date = network_.field("Date");
+    if (!isAsStored) return;
+    if (answer.entityTag.starts_with('"')) {
+      answer.validator = answer.entityTag;
+    } else if (!date.empty() && answer.lastModified != date) {
+      // A file of this second could still change in it.
+      answer.validator = answer.lastModified;
+    }
+  }
+
+  NetworkTransfer network_{url_, request(), *this};
 };
 
 class Download::FileDownload final : public Transfer {
@@ -124,7 +169,7 @@ class Download::FileDownload final : public Transfer {
     const std::optional<std::size_t> length = source_->read(buffer_, error);
     if (!length) return false;
     if (*length == 0) {
-      if (copiedLength_ < source_->size()) {
+      if (copiedLength_ < source_->size() || source_->isShorterNow()) {
         error = transferError(CURLE_PARTIAL_FILE, "The file became shorter while it was read");
       }
       return false;
@@ -138,14 +183,24 @@ class Download::FileDownload final : public Transfer {
   std::uint64_t copiedLength_ = 0;
 };
 
-Download::Download(const URL& url, const std::string& destination, DownloadReceiver& receiver) {
+Download::Download(const URL& url, const FilePlace& place, DownloadReceiver& receiver,
+                   DownloadOptions options) {
   if (url.scheme() == "file") {
-    transfer_ = std::make_unique<FileDownload>(*this, url, destination, receiver);
+    transfer_ = std::make_unique<FileDownload>(*this, url, place, receiver, std::move(options));
   } else {
-    transfer_ = std::make_unique<NetworkDownload>(*this, url, destination, receiver);
+    transfer_ = std::make_unique<NetworkDownload>(*this, url, place, receiver, std::move(options));
   }
 }
 
 Download::~Download() = default;
+
+bool isLostConnection(const ErrorRecord& error) {
+  constexpr std::array<std::int64_t, 9> kCodes = {
+      CURLE_COULDNT_RESOLVE_PROXY, CURLE_COULDNT_RESOLVE_HOST, CURLE_COULDNT_CONNECT,
+      CURLE_PARTIAL_FILE,          CURLE_OPERATION_TIMEDOUT,   CURLE_SSL_CONNECT_ERROR,
+      CURLE_GOT_NOTHING,           CURLE_SEND_ERROR,           CURLE_RECV_ERROR};
+  return error.domain == "transfer" &&
+         std::find(kCodes.begin(), kCodes.end(), error.code) != kCodes.end();
+}
 
 }  // namespace platform

@@ -4,12 +4,12 @@
 #include <memory>
 #include <string>
 
+#include "platform/files/Directory.h"
 #include "platform/net/URL.h"
 #include "platform/text/ErrorRecord.h"
 
 namespace platform {
 
-class Directory;
 class Download;
 
 /// What the header of an answer tells beside its length, as it was sent; empty what it does not
@@ -33,7 +33,7 @@ struct DownloadOptions {
   std::string partName;
   /// The validator of the answer that the part there came from. With it, only the rest is asked
   /// for; the download goes on behind the part where the server proves the file to be the same, and
-  /// from the start otherwise. Empty: from the start.
+  /// from the start otherwise. Empty, and where the place is a path: from the start.
   std::string partValidator;
   /// The seconds without a byte after which the download fails (domain "transfer", code 28), from
   /// the connecting on; 0 for no limit.
@@ -53,9 +53,9 @@ class DownloadReceiver {
   virtual void didReceiveResponse(Download&, std::int64_t /*expectedLength*/) {}
   /// `length` more bytes have been written.
   virtual void didReceiveDataOfLength(Download&, std::uint64_t /*length*/) {}
-  /// The file stands whole at its path.
+  /// The file stands whole at its place.
   virtual void downloadDidFinish(Download& download) = 0;
-  /// Nothing was changed at the path.
+  /// Nothing was changed at the place.
   virtual void didFailWithError(Download& download, const ErrorRecord& error) = 0;
 };
 
@@ -72,10 +72,8 @@ class DownloadReceiver {
 class Download {
  public:
   /// Starts the transfer; its events come from runEventLoopOnce(). The receiver must outlive it.
-  Download(const URL& url, const std::string& destination, DownloadReceiver& receiver);
-  /// The same into an open directory.
-  Download(const URL& url, const Directory& directory, const std::string& name,
-           DownloadReceiver& receiver, DownloadOptions options = {});
+  Download(const URL& url, const FilePlace& place, DownloadReceiver& receiver,
+           DownloadOptions options = {});
   ~Download();
   Download(const Download&) = delete;
   Download& operator=(const Download&) = delete;

@@ -6,11 +6,13 @@
 #include <algorithm>
 #include <climits>
 #include <cstdlib>
+#include <limits>
 #include <list>
 #include <mutex>
 #include <utility>
 
 #include "platform/text/ASCII.h"
+#include "platform/text/Case.h"
 
 namespace platform {
 namespace {
@@ -138,14 +140,14 @@ class NetworkTransfer::Connections {
   std::vector<int> sockets_;  // all that were ever opened; their numbers come again
 };
 
-NetworkTransfer::NetworkTransfer(const URL& url, const char* acceptedEncoding, Sink& sink)
-    : sink_(sink), firstURL_(url), url_(url) {
+NetworkTransfer::NetworkTransfer(const URL& url, TransferRequest request, Sink& sink)
+    : request_(std::move(request)), sink_(sink), firstURL_(url), url_(url) {
   if (!isSupported(url, error_)) {
     ended_ = true;
   } else if (TransferLibrary::error()) {
     error_ = TransferLibrary::error();
     ended_ = true;
-  } else if (const CURLcode result = configure(acceptedEncoding); result != CURLE_OK) {
+  } else if (const CURLcode result = configure(); result != CURLE_OK) {
     end(result);
   } else {
     send(false);
@@ -164,7 +166,7 @@ std::size_t NetworkTransfer::callback(char* bytes, std::size_t size, std::size_t
   return isTaken ? size * count : 0;
 }
 
-CURLcode NetworkTransfer::configure(const char* acceptedEncoding) {
+CURLcode NetworkTransfer::configure() {
   handle_ = {library().easyInit(), library().easyCleanup};
   CURLcode result = CURLE_OK;
   const auto set = [this, &result](CURLoption option, auto value) {
@@ -177,11 +179,14 @@ CURLcode NetworkTransfer::configure(const char* acceptedEncoding) {
   set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
   set(CURLOPT_USERAGENT, "qel/" QEL_VERSION);
   // The sink undoes the coding itself: the library takes a stream that stops early for whole.
-  set(CURLOPT_ACCEPT_ENCODING, acceptedEncoding);
+  set(CURLOPT_ACCEPT_ENCODING, request_.acceptedEncoding.c_str());
   set(CURLOPT_HTTP_CONTENT_DECODING, 0L);
   set(CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
   set(CURLOPT_NOSIGNAL, 1L);
-  set(CURLOPT_CONNECTTIMEOUT, kNoConnectTimeout);
+  const long stallLimit = request_.stallLimit;
+  set(CURLOPT_CONNECTTIMEOUT, stallLimit > 0 ? stallLimit : kNoConnectTimeout);
+  set(CURLOPT_LOW_SPEED_LIMIT, 1L);
+  set(CURLOPT_LOW_SPEED_TIME, stallLimit);
   set(CURLOPT_BUFFERSIZE, kReceiveBufferSize);
   set(CURLOPT_HEADERFUNCTION, &callback<&NetworkTransfer::didReceiveHeaderLine>);
   set(CURLOPT_HEADERDATA, static_cast<void*>(this));
@@ -220,8 +225,22 @@ void NetworkTransfer::send(bool onNewConnection) {
   if (result == CURLE_OK) {
     result = library().easySetopt(handle_.get(), CURLOPT_FRESH_CONNECT, long{onNewConnection});
   }
+  if (result == CURLE_OK) result = setFields();
   if (result == CURLE_OK) result = Connections::ofThisThread().add(*this);
   if (result != CURLE_OK) end(result);
+}
+
+CURLcode NetworkTransfer::setFields() {
+  fields_ = {nullptr, library().slistFreeAll};
+  if (request_.offset > 0) {
+    const std::string range = "Range: bytes=" + std::to_string(request_.offset) + "-";
+    for (const std::string& field : {range, "If-Range: " + request_.validator}) {
+      curl_slist* const longer = library().slistAppend(fields_.get(), field.c_str());
+      if (longer == nullptr) return CURLE_OUT_OF_MEMORY;
+      if (!fields_) fields_.reset(longer);
+    }
+  }
+  return library().easySetopt(handle_.get(), CURLOPT_HTTPHEADER, fields_.get());
 }
 
 /// Whether a kept connection has bytes that came before the request for which it is to be used, as
@@ -278,6 +297,12 @@ bool NetworkTransfer::follow() {
 void NetworkTransfer::end(CURLcode result) {
   Connections::ofThisThread().remove(*this);
   if (std::exchange(refused_, false)) return send(true);
+  if (std::exchange(isOtherPart_, false)) {
+    request_.offset = 0;
+    url_ = firstURL_;
+    redirects_ = 0;
+    return send(false);
+  }
   // Where a redirect leads is known, however its page ended.
   const bool hasPage =
       result == CURLE_OK || result == CURLE_WRITE_ERROR || result == CURLE_PARTIAL_FILE;
@@ -319,15 +344,38 @@ bool NetworkTransfer::didReceiveHeader() {
   const int status = this->status();
   const bool hasBody = status >= 200 && status != 204 && status != 304;
   if (hasBody && !framing_.fault().empty()) {
-    if (status < 400) error_ = transferError(CURLE_PARTIAL_FILE, framing_.fault());
+    if (status < 400) error_ = transferError(CURLE_WEIRD_SERVER_REPLY, framing_.fault());
+    return false;
+  }
+  if (request_.offset > 0 && (status == 416 || (status == 206 && !isRest()))) {
+    isOtherPart_ = true;
     return false;
   }
   if (status >= 300 && status < 400) location_ = trimmed(field("Location"));
-  if (status != 200) return true;
+  const bool isWantedPart = status == 206 && request_.offset > 0;
+  if (status != 200 && !isWantedPart) return true;
   begun_ = true;
+  if (!isWantedPart) request_.offset = 0;
   const std::optional<std::uint64_t> length = framing_.length();
-  return sink_.begin(length ? static_cast<std::int64_t>(*length) : -1, framing_.contentCodings(),
-                     error_);
+  return sink_.begin(length ? static_cast<std::int64_t>(request_.offset + *length) : -1,
+                     framing_.contentCodings(), error_);
+}
+
+bool NetworkTransfer::isRest() const {
+  if (!framing_.length() || *framing_.length() == 0 || !framing_.contentCodings().empty()) {
+    return false;
+  }
+  const std::uint64_t end = request_.offset + *framing_.length();
+  constexpr std::uint64_t kLargest = std::numeric_limits<std::int64_t>::max();
+  if (end > kLargest || lowercased(field("Content-Range")) !=
+                            "bytes " + std::to_string(request_.offset) + "-" +
+                                std::to_string(end - 1) + "/" + std::to_string(end)) {
+    return false;
+  }
+  // Some servers send a part whatever the validator says.
+  const std::string validator =
+      field(request_.validator.starts_with('"') ? "ETag" : "Last-Modified");
+  return validator.empty() || validator == request_.validator;
 }
 
 bool NetworkTransfer::didReceiveBody(std::string_view bytes) {

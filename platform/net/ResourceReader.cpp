@@ -105,7 +105,7 @@ std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::ui
   if (url.scheme() == "file") return openWholeFile(url.path(), error);
 
   BodyCollector collector(limit);
-  const NetworkTransfer transfer(url, "gzip", collector);
+  const NetworkTransfer transfer(url, {.acceptedEncoding = "gzip"}, collector);
   while (!transfer.hasEnded()) NetworkTransfer::runAll();
   if (transfer.error()) {
     error = transfer.error();

@@ -62,6 +62,8 @@ class TransferLibrary {
   decltype(&::curl_multi_poll) multiPoll = find("curl_multi_poll");
   decltype(&::curl_multi_perform) multiPerform = find("curl_multi_perform");
   decltype(&::curl_multi_info_read) multiInfoRead = find("curl_multi_info_read");
+  decltype(&::curl_slist_append) slistAppend = find("curl_slist_append");
+  decltype(&::curl_slist_free_all) slistFreeAll = find("curl_slist_free_all");
   decltype(&::curl_url) url = find("curl_url");
   decltype(&::curl_url_cleanup) urlCleanup = find("curl_url_cleanup");
   decltype(&::curl_url_set) urlSet = find("curl_url_set");

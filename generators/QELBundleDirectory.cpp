@@ -1,0 +1,86 @@
+#include "generators/QELBundleDirectory.h"
+
+#include <string_view>
+#include <utility>
+
+#include "generators/QELBundleNames.h"
+#include "platform/files/FileManager.h"
+#include "platform/files/TemporaryFile.h"
+#include "platform/plist/PropertyListWriter.h"
+
+using platform::Directory;
+using platform::ErrorSlot;
+using platform::FileIdentity;
+using platform::FilePlace;
+
+bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error) {
+  if (!platform::createDirectories(path, error)) return false;
+  std::optional<Directory> opened = Directory::open(path, error);
+  if (!opened) return false;
+  bundle_ = std::move(*opened);
+  bundle_.lock(Directory::Wait::kForever);
+  platform::removeStaleTemporaryFiles(bundle_);
+
+  ErrorSlot ignored;  // a poster that then cannot be saved is warned about
+  posters_ = bundle_.openOrMake(std::string(kPostersName), ignored).value_or(Directory());
+  // Another run may fill this very directory as a bundle of its own. Where it is this bundle, the
+  // lock is held by this run.
+  if (posters_.lock(Directory::Wait::kNot) != Directory::Lock::kHeldByAnother) {
+    platform::removeStaleTemporaryFiles(posters_);
+  }
+  return true;
+}
+
+std::optional<FilePlace> QELBundleDirectory::mediaPlace(const std::string& name) const {
+  if (!QELIsSaneName(name) || name == kReferenceFileName) return std::nullopt;
+  return FilePlace(bundle_, name);
+}
+
+std::optional<FilePlace> QELBundleDirectory::posterPlace(const std::string& name) const {
+  const bool leavesBundle = !posters_.isOpen() && bundle_.containsLink(std::string(kPostersName));
+  if (!QELIsSaneName(name) || leavesBundle) return std::nullopt;
+  return FilePlace(posters_, name);
+}
+
+bool QELBundleDirectory::save(const FilePlace& place, const std::function<bool()>& put) {
+  if (isInUse(place) || !put()) return false;
+  const std::optional<FileIdentity> identity = place.directory->identity(place.name);
+  if (!identity) return true;
+  if (identity == bundle_.identity(std::string(kReferenceFileName))) {
+    ErrorSlot ignored;
+    place.directory->remove(place.name, ignored);
+    return false;
+  }
+  saved_.insert_or_assign(*identity, place);
+  return true;
+}
+
+bool QELBundleDirectory::isInUse(const FilePlace& place) const {
+  const std::optional<FileIdentity> identity = place.directory->identity(place.name);
+  if (!identity) return false;
+  if (identity == bundle_.identity(std::string(kReferenceFileName))) return true;
+  const auto found = saved_.find(*identity);
+  if (found == saved_.end()) return false;
+  // The number of a file that was removed since may have been given to a stranger's.
+  const FilePlace& other = found->second;
+  const bool isSamePlace = other.directory == place.directory && other.name == place.name;
+  return !isSamePlace && other.directory->identity(other.name) == identity;
+}
+
+bool QELBundleDirectory::writeReferenceFile(const platform::Dictionary& dictionary) {
+  const std::string name(kReferenceFileName);
+  ErrorSlot ignored;  // the caller's message does not tell causes apart
+  platform::TemporaryFile file;
+  return file.create({bundle_, name}, ignored, bundle_.attributesForSuccessor(name)) &&
+         platform::writePropertyList(
+             dictionary, [&](std::string_view bytes) { return file.write(bytes, ignored); }) &&
+         syncFiles(ignored) && file.commitReplacing(ignored) && bundle_.sync(ignored);
+}
+
+/// The directories that were made, and the reference file in the making, are on the bundle's file
+/// system as well.
+bool QELBundleDirectory::syncFiles(ErrorSlot& error) const {
+  return bundle_.syncFileSystem(error) &&
+         (!posters_.isOpen() || posters_.isOnFileSystemOf(bundle_) ||
+          posters_.syncFileSystem(error));
+}

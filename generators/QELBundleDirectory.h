@@ -1,0 +1,56 @@
+#pragma once
+
+#include <functional>
+#include <map>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "platform/files/Directory.h"
+#include "platform/plist/PropertyListValue.h"
+#include "platform/text/ErrorRecord.h"
+
+/// The directory that becomes a bundle, with its "Posters", both opened once: whatever happens to
+/// their paths meanwhile, files come into these two directories and nowhere else.
+///
+/// One run at a time fills it, where the directory can be locked (platform::Directory); the others
+/// wait for their turn. No file that was saved here replaces another that was: a file system may
+/// take two names for one.
+class QELBundleDirectory {
+ public:
+  QELBundleDirectory() = default;
+  ~QELBundleDirectory() = default;
+  QELBundleDirectory(const QELBundleDirectory&) = delete;
+  QELBundleDirectory& operator=(const QELBundleDirectory&) = delete;
+
+  static constexpr std::string_view kReferenceFileName = "Info.plist";
+  static constexpr std::string_view kPostersName = "Posters";
+
+  /// Makes the directory and its parents where they are missing, and "Posters", whose failure is
+  /// left to those who want to put something there; waits for the lock; removes what killed runs
+  /// left. False, and the slot filled, when there is no such directory.
+  bool open(const std::string& path, platform::ErrorSlot& error);
+
+  /// Absent for a name that no file can have, and for the one that the reference file has.
+  std::optional<platform::FilePlace> mediaPlace(const std::string& name) const;
+  /// Absent for a name that no file can have, and while "Posters" is a link that leads out of the
+  /// bundle, or nowhere.
+  std::optional<platform::FilePlace> posterPlace(const std::string& name) const;
+
+  /// Has a file be put at a place of this bundle. False when that fails, and when the file there is
+  /// one that was saved under another name, or has the reference file's.
+  bool save(const platform::FilePlace& place, const std::function<bool()>& put);
+
+  /// Writes the reference file, which replaces an earlier one and keeps its permissions. It gets
+  /// its name when everything that was saved is on the disk, and is there itself in the end.
+  bool writeReferenceFile(const platform::Dictionary& dictionary);
+
+ private:
+  bool isInUse(const platform::FilePlace& place) const;
+  bool syncFiles(platform::ErrorSlot& error) const;
+
+  platform::Directory bundle_;
+  platform::Directory posters_;
+  /// What was saved, and where last.
+  std::map<platform::FileIdentity, platform::FilePlace> saved_;
+};

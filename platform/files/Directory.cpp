@@ -1,0 +1,159 @@
+#include "platform/files/Directory.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+#include "platform/files/PosixError.h"
+
+namespace platform {
+namespace {
+
+bool lookAt(int directory, const std::string& name, struct stat& status) {
+  return isFileName(name) && ::fstatat(directory, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0;
+}
+
+FileIdentity identityOf(const struct stat& status) {
+  return {status.st_dev, status.st_ino};
+}
+
+std::optional<FileIdentity> identityOf(int descriptor) {
+  struct stat status {};
+  if (::fstat(descriptor, &status) != 0) return std::nullopt;
+  return identityOf(status);
+}
+
+}  // namespace
+
+bool isFileName(const std::string& name) {
+  constexpr std::string_view kNotInNames("/\0", 2);
+  return !name.empty() && name != "." && name != ".." &&
+         name.find_first_of(kNotInNames) == std::string::npos;
+}
+
+std::optional<Directory> Directory::open(const std::string& path, ErrorSlot& error) {
+  return openAt(AT_FDCWD, path, error);
+}
+
+std::optional<Directory> Directory::openAt(int parent, const std::string& path, ErrorSlot& error) {
+  FileDescriptor descriptor = FileDescriptor::openAt(parent, path, O_RDONLY | O_DIRECTORY);
+  const bool isReadable = descriptor.isOpen();
+  if (!isReadable && errno == EACCES) {
+    descriptor = FileDescriptor::openAt(parent, path, O_PATH | O_DIRECTORY);
+  }
+  if (descriptor.isOpen()) return Directory(std::move(descriptor), isReadable);
+  error = posixError(errno);
+  return std::nullopt;
+}
+
+std::optional<Directory> Directory::openOrMake(const std::string& name, ErrorSlot& error) const {
+  if (!isFileName(name)) {
+    error = posixError(EINVAL);
+    return std::nullopt;
+  }
+  // What exists is not made, since a read-only file system may refuse before it looks.
+  std::optional<Directory> child = openAt(descriptor(), name, error);
+  if (!child && error->code == ENOENT) {
+    const int failure = ::mkdirat(descriptor(), name.c_str(), 0777) == 0 ? 0 : errno;
+    child = openAt(descriptor(), name, error);
+    if (!child && failure != 0) error = posixError(failure);
+  }
+  if (!child) return std::nullopt;
+  if (!child->isAtOrBelow(*this)) {
+    error = posixError(EXDEV, "The link leads out of the directory");
+    return std::nullopt;
+  }
+  error.reset();
+  return child;
+}
+
+/// Goes up from the directory that is open, whatever path led there: a link that is absolute leads
+/// inside as well as one that is not, and one that is exchanged meanwhile changes nothing.
+bool Directory::isAtOrBelow(const Directory& other) const {
+  const std::optional<FileIdentity> goal = identityOf(other.descriptor());
+  std::optional<FileIdentity> current = identityOf(descriptor());
+  FileDescriptor place;
+  while (goal && current && *current != *goal) {
+    place = FileDescriptor::openAt(place.isOpen() ? place.get() : descriptor(), "..",
+                                   O_PATH | O_DIRECTORY);
+    const std::optional<FileIdentity> parent = identityOf(place.get());
+    if (parent == current) return false;  // the root
+    current = parent;
+  }
+  return goal && current;
+}
+
+bool Directory::containsLink(const std::string& name) const {
+  struct stat status {};
+  return lookAt(descriptor(), name, status) && S_ISLNK(status.st_mode);
+}
+
+std::optional<FileIdentity> Directory::identity(const std::string& name) const {
+  struct stat status {};
+  if (!lookAt(descriptor(), name, status)) return std::nullopt;
+  return identityOf(status);
+}
+
+std::optional<std::uint64_t> Directory::fileSize(const std::string& name) const {
+  struct stat status {};
+  if (!lookAt(descriptor(), name, status) || !S_ISREG(status.st_mode)) return std::nullopt;
+  return static_cast<std::uint64_t>(status.st_size);
+}
+
+std::optional<FileAttributes> Directory::attributesForSuccessor(const std::string& name) const {
+  struct stat status {};
+  if (!lookAt(descriptor(), name, status) || !S_ISREG(status.st_mode)) return std::nullopt;
+  return FileAttributes{status.st_mode & kPermissions, std::nullopt};
+}
+
+bool Directory::remove(const std::string& name, ErrorSlot& error) const {
+  if (isFileName(name) && ::unlinkat(descriptor(), name.c_str(), 0) == 0) return true;
+  error = posixError(isFileName(name) ? errno : EINVAL);
+  return false;
+}
+
+Directory::Lock Directory::lock(Wait wait) {
+  constexpr unsigned kEveryoneHisOwn = S_ISVTX | S_IWOTH;
+  struct stat status {};
+  if (::fstat(descriptor(), &status) != 0 ||
+      (status.st_mode & kEveryoneHisOwn) == kEveryoneHisOwn) {
+    return Lock::kNotToBeHad;
+  }
+  int result = -1;
+  do {
+    result = ::flock(descriptor(), wait == Wait::kNot ? LOCK_EX | LOCK_NB : LOCK_EX);
+  } while (result != 0 && errno == EINTR);
+  isLocked_ = result == 0;
+  if (isLocked_) return Lock::kTaken;
+  return errno == EWOULDBLOCK ? Lock::kHeldByAnother : Lock::kNotToBeHad;
+}
+
+bool Directory::sync(ErrorSlot& error) const {
+  return synced(&::fsync, error);
+}
+
+bool Directory::syncFileSystem(ErrorSlot& error) const {
+  return synced(&::syncfs, error);
+}
+
+bool Directory::isOnFileSystemOf(const Directory& other) const {
+  const std::optional<FileIdentity> mine = identityOf(descriptor());
+  const std::optional<FileIdentity> theirs = identityOf(other.descriptor());
+  return mine && theirs && mine->device == theirs->device;
+}
+
+bool Directory::synced(int (*call)(int), ErrorSlot& error) const {
+  // What may not be read cannot be named to the call, so the whole system is synced instead.
+  if (isOpen() && !isReadable_) {
+    ::sync();
+    return true;
+  }
+  if (isSynced(call, descriptor())) return true;
+  error = posixError(errno);
+  return false;
+}
+
+}  // namespace platform
