@@ -15,9 +15,10 @@
 namespace platform {
 namespace {
 
-/// A few KiB can decompress to GiB. No document comes near this ratio; a small one may, by chance.
-constexpr std::uint64_t kLargestRatio = 100;
-constexpr std::uint64_t kAnyRatioSize = std::uint64_t{64} << 20U;
+/// A few KiB can decompress to GiB. Feeds come near no such ratio; a small one may, by chance. What
+/// is made of a body that keeps to it is counted by its parser.
+constexpr std::uint64_t kLargestRatio = 50;
+constexpr std::uint64_t kAnyRatioSize = std::uint64_t{1} << 20U;
 
 bool isOneOf(std::string_view text, std::initializer_list<std::string_view> texts) {
   return std::find(texts.begin(), texts.end(), text) != texts.end();
@@ -49,8 +50,9 @@ class BodyCollector : public NetworkTransfer::Sink {
   }
 
   /// The body once all bytes have come.
-  std::optional<std::string> finish(ErrorSlot& error) {
-    if (!decoder_ || decoder_->isWhole()) return std::move(body_);
+  std::optional<ByteSource> finish(ErrorSlot& error) {
+    if (!decoder_) return std::move(body_);
+    if (decoder_->isWhole()) return ByteSource(std::move(body_), receivedSize_);
     refuseCoding("The compressed body is cut short", error);
     return std::nullopt;
   }
@@ -76,7 +78,7 @@ class BodyCollector : public NetworkTransfer::Sink {
     const std::uint64_t size = body_.size() + bytes.size();
     if (size > kAnyRatioSize && size / kLargestRatio > receivedSize_) {
       error = transferError(CURLE_FILESIZE_EXCEEDED,
-                            "The body is more than 100 times as large as its compressed form");
+                            "The body is more than 50 times as large as its compressed form");
       return false;
     }
     body_.append(bytes);
