@@ -273,12 +273,15 @@ std::string percentDecoded(std::string_view text) {
   return decoded;
 }
 
-std::string fileURLText(std::string_view absolutePath) {
+std::string percentEncodedPath(std::string_view path) {
   constexpr std::string_view kAllowedMarks = "-._~!$&'()*+,;=:@/";
-  const auto isKept = [=](char c) {
+  return percentEncoded(path, [=](char c) {
     return isASCIILetter(c) || isASCIIDigit(c) || kAllowedMarks.find(c) != std::string_view::npos;
-  };
-  return percentEncoded(absolutePath, isKept, "file://");
+  });
+}
+
+std::string fileURLText(std::string_view absolutePath) {
+  return "file://" + percentEncodedPath(absolutePath);
 }
 
 }  // namespace platform
