@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <chrono>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -46,9 +47,9 @@ class NetworkTransfer {
   /// Why it failed; empty while it runs and when it ended well.
   const ErrorSlot& error() const { return error_; }
 
-  /// Waits without a deadline until something happens on one of the thread's transfers, and lets
-  /// all of them proceed. False when none is running.
-  static bool runAll();
+  /// Waits until something happens on one of the thread's transfers, without a deadline or no
+  /// longer than the limit, and lets all of them proceed. False when none is running.
+  static bool runAll(std::optional<std::chrono::milliseconds> limit = std::nullopt);
 
  private:
   class Connections;
