@@ -6,7 +6,9 @@
 #include "cli/common/QELError.h"
 #include "generators/QELBundleNames.h"
 #include "platform/files/FileManager.h"
+#include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
+#include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListWriter.h"
 
 using platform::Directory;
@@ -33,6 +35,19 @@ bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error, Directo
     platform::removeStaleTemporaryFiles(posters_);
   }
   return true;
+}
+
+std::optional<platform::Dictionary> QELBundleDirectory::readReferenceFile(const std::string& path,
+                                                                          ErrorSlot& error) {
+  const std::string file = platform::joinedPath(path, kReferenceFileName);
+  if (!platform::fileExists(file)) return platform::Dictionary();
+  std::optional<platform::ByteSource> bytes = platform::openWholeFile(file, error);
+  if (!bytes) return std::nullopt;
+  std::optional<platform::PropertyListFault> fault;
+  const auto value = platform::readPropertyList(std::move(*bytes), fault);
+  if (value && value->asDictionary()) return *value->asDictionary();
+  error = QELError(1, fault ? fault->description : "no dictionary at its root");
+  return std::nullopt;
 }
 
 std::optional<FilePlace> QELBundleDirectory::mediaPlace(const std::string& name) const {

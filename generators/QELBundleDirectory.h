@@ -35,6 +35,11 @@ class QELBundleDirectory {
 
   const platform::Directory& directory() const { return bundle_; }
 
+  /// The reference dictionary of the bundle at the path, empty where there is none yet. Absent, and
+  /// the slot filled, when it cannot be read.
+  static std::optional<platform::Dictionary> readReferenceFile(const std::string& path,
+                                                               platform::ErrorSlot& error);
+
   /// Absent for a name that no file can have, and for the one that the reference file has.
   std::optional<platform::FilePlace> mediaPlace(const std::string& name) const;
   /// Absent for a name that no file can have, and while "Posters" is a link that leads out of the

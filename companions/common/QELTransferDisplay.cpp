@@ -34,7 +34,7 @@ std::string padded(const std::string& text, std::size_t width) {
 std::string barText(double share) {
   std::string bar(kBarWidth, '-');
   std::fill_n(bar.begin(), static_cast<std::size_t>(share * static_cast<double>(kBarWidth)), '#');
-  return "[" + bar + "]";
+  return std::string("[").append(bar).append("]");
 }
 
 std::string lineOf(const QELTransferState& transfer, std::size_t columns, Clock::time_point now) {

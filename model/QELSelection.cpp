@@ -1,4 +1,4 @@
-#include "companions/keep/QELSelection.h"
+#include "model/QELSelection.h"
 
 #include <algorithm>
 #include <chrono>

@@ -18,6 +18,8 @@ class QELFreeNames {
  public:
   /// Notes a name that is not free, whatever case it is asked for in.
   void take(std::string_view name);
+  /// Notes the names of all that lies in the directory, if there is one.
+  void takeAllOf(const std::string& path);
 
   /// "BASE.EXTENSION", or the first free one of "BASE-2.EXTENSION" and so on; it is then taken.
   /// Characters and names that some system reserves are changed, an empty base is "episode", an

@@ -1,4 +1,4 @@
-#include "companions/keep/QELEpisodeMatching.h"
+#include "model/QELEpisodeMatching.h"
 
 #include <gtest/gtest.h>
 

@@ -1,8 +1,10 @@
-#include "companions/keep/QELFreeNames.h"
+#include "generators/QELFreeNames.h"
 
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <filesystem>
+#include <system_error>
 
 #include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
@@ -59,18 +61,26 @@ void QELFreeNames::take(std::string_view name) {
   taken_.insert(platform::caseFolded(name));
 }
 
+void QELFreeNames::takeAllOf(const std::string& path) {
+  std::error_code ignored;
+  for (const auto& entry : std::filesystem::directory_iterator(path, ignored)) {
+    take(entry.path().filename().string());
+  }
+}
+
 std::string QELFreeNames::reserve(std::string_view base, std::string_view extension) {
   std::string stem = portableText(base);
   if (stem.empty()) stem = "episode";
-  if (isDevice(stem)) stem.insert(0, "_");
+  if (isDevice(stem)) stem = std::string("_").append(stem);
   std::string suffix = portableText(extension);
   cutTo(suffix, kLongestExtension);
-  if (!suffix.empty()) suffix.insert(0, ".");
+  if (!suffix.empty()) suffix = std::string(".").append(suffix);
 
   std::uint64_t& number =
       nextNumbers_.try_emplace(platform::caseFolded(stem + suffix), 1).first->second;
   for (;; ++number) {
-    const std::string ending = (number > 1 ? "-" + std::to_string(number) : "") + suffix;
+    std::string ending = suffix;
+    if (number > 1) ending = std::string("-").append(std::to_string(number)).append(suffix);
     std::string name = stem;
     cutTo(name, kLongestName - ending.size());
     name += ending;

@@ -1,4 +1,4 @@
-#include "companions/keep/QELFreeNames.h"
+#include "generators/QELFreeNames.h"
 
 #include <gtest/gtest.h>
 
