@@ -37,14 +37,14 @@ void QELKeepRun::say(const std::string& line) {
 }
 
 int QELKeepRun::rehearse() {
+  std::size_t count = 0;
   for (const auto& fetch : show_.fetches()) {
-    const std::string location = fetch->reference().location->string();
     const bool isRefused = fetch->state() == QELFetch::State::kFailed;
-    say((isRefused ? "would not fetch " : "would fetch ") + fetch->title() + " from " + location +
-        (isRefused ? ": " + fetch->cause() : ""));
+    if (!isRefused) ++count;
+    say((isRefused ? "would not fetch " : "would fetch ") + fetch->title() + " from " +
+        fetch->reference().location->string() + (isRefused ? ": " + fetch->cause() : ""));
   }
-  say(std::to_string(show_.fetches().size()) + " to fetch, " + std::to_string(show_.knownCount()) +
-      " known");
+  say(std::to_string(count) + " to fetch, " + std::to_string(show_.knownCount()) + " known");
   return kAllWell;
 }
 
