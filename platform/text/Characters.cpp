@@ -14,6 +14,13 @@ std::int32_t nextNonASCIICharacter(std::string_view text, std::size_t& position)
   return character;
 }
 
+bool isUTF8(std::string_view text) {
+  for (std::size_t position = 0; position < text.size();) {
+    if (nextCharacter(text, position) < 0) return false;
+  }
+  return true;
+}
+
 std::size_t characterCount(std::string_view text) {
   std::size_t count = 0;
   for (std::size_t position = 0; position < text.size(); ++count) nextCharacter(text, position);
@@ -32,6 +39,17 @@ std::size_t utf16Length(std::string_view text) {
     length += nextCharacter(text, position) > 0xFFFF ? 2 : 1;
   }
   return length;
+}
+
+std::string withoutControls(std::string_view text) {
+  std::string result;
+  for (std::size_t position = 0; position < text.size();) {
+    const std::size_t start = position;
+    const std::int32_t character = nextCharacter(text, position);
+    const bool isControl = character < 0x20 || (character >= 0x7F && character <= 0x9F);
+    result.append(isControl ? "\uFFFD" : text.substr(start, position - start));
+  }
+  return result;
 }
 
 bool isHorizontalWhitespace(std::int32_t character) {
