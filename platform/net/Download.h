@@ -65,7 +65,8 @@ class DownloadReceiver {
 /// once they are all there. http and https: a final status of 200 is success and nothing else is;
 /// at most 20 redirects, to http and https only; the body is asked for as it is (no compression),
 /// and one that comes by gzip all the same is decompressed, with an expected length of -1.
-/// file: regular files only. No retry and no time-out. Destroying a running download cancels it.
+/// file: regular files only, whose permissions and time are kept. No retry and no time-out.
+/// Destroying a running download cancels it.
 ///
 ///     const Download download(*URL::parse("https://example.org/one.mp3"), "one.mp3", receiver);
 ///     while (!receiver.hasEnded() && runEventLoopOnce()) continue;  // which tells the receiver
