@@ -28,7 +28,8 @@ constexpr int kFailure = 1;
 
 int fail(std::string_view format, std::initializer_list<platform::FormatArgument> arguments = {}) {
   platform::flushStandardOutput();
-  platform::writeToStandardError(platform::formattedText(format, arguments));
+  platform::writeToStandardError(
+      platform::formattedText(format, arguments, platform::controlsOfStandardError()));
   return kFailure;
 }
 
@@ -120,7 +121,7 @@ int QELCreateFeed(const QELArguments& arguments, QELPodcastSource& source,
 
   // The line break is appended apart, behind whatever the target holds by then. The first
   // descriptor stays open meanwhile: the reader of a FIFO would take its end for the end of the
-  // feed and leave.
+  // feed and leave. A reader that left all the same is not waited for again.
   const std::string target = targetPath(arguments);
   platform::OutputFile feed(target, platform::OutputFile::Mode::kReplace);
   feed.write(*generator.xmlData());

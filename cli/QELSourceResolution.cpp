@@ -47,8 +47,13 @@ std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput()
   return cached;
 }
 
-std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source) {
-  if (namesURL(source)) return QELFeedPodcastSource::initWithURL(urlFromSource(source));
+std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source,
+                                                       std::vector<std::string> directoryPrefixes) {
+  if (namesURL(source)) {
+    auto feed = QELFeedPodcastSource::initWithURL(urlFromSource(source));
+    if (feed) feed->setDirectoryPrefixes(std::move(directoryPrefixes));
+    return feed;
+  }
 
   const std::string path(source);
   if (!platform::fileExists(path)) return nullptr;

@@ -2,8 +2,11 @@
 
 #include <memory>
 #include <optional>
+#include <string>
 #include <string_view>
+#include <vector>
 
+#include "cli/common/QELDirectory.h"
 #include "model/QELPodcastSource.h"
 #include "platform/plist/PropertyListValue.h"
 
@@ -19,8 +22,10 @@ std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput()
 
 /// The source that the string names: a feed for a URL (see QELValidateSource), a bundle or a
 /// reference file for an existing path with the extension "podcast" or "plist" in any mix of case.
-/// Null when there is no such thing. Nothing is fetched yet.
-std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source);
+/// Null when there is no such thing. Nothing is fetched yet. The prefixes are those under which the
+/// podcast-directory elements of a feed are read.
+std::unique_ptr<QELPodcastSource> initWithSourceString(
+    std::string_view source, std::vector<std::string> directoryPrefixes = {QELDirectory().prefix});
 
 /// The source for the reference file on standard input; null when there is none.
 std::unique_ptr<QELPodcastSource> initWithStandardInput();

@@ -2,8 +2,6 @@
 # GNUInstallDirs; shells and man find their files below the share/ of any prefix that they search.
 include(GNUInstallDirs)
 
-install(TARGETS qel RUNTIME)
-
 # A manual page names the version as @PROJECT_VERSION@.
 file(GLOB QEL_MANUAL_PAGES CONFIGURE_DEPENDS RELATIVE ${PROJECT_SOURCE_DIR}/docs docs/*.1)
 foreach(page IN LISTS QEL_MANUAL_PAGES)
@@ -12,10 +10,13 @@ foreach(page IN LISTS QEL_MANUAL_PAGES)
 endforeach()
 
 # Each shell loads these by their file names.
-install(FILES packaging/completions/qel.bash
-  DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions RENAME qel)
-install(FILES packaging/completions/_qel DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/site-functions)
-install(FILES packaging/completions/qel.fish DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d)
+foreach(program IN LISTS QEL_PROGRAMS)
+  install(FILES packaging/completions/${program}.bash
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions RENAME ${program})
+  install(FILES packaging/completions/_${program} DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/site-functions)
+  install(FILES packaging/completions/${program}.fish
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d)
+endforeach()
 
 # In the layout of the sources, so that links between the documents hold. The README of the sources is for
 # those who have them.

@@ -1,6 +1,5 @@
 #include "generators/QELFeedPodcastGenerator.h"
 
-#include <chrono>
 #include <cstddef>
 #include <cstdint>
 #include <string_view>
@@ -13,31 +12,17 @@
 #include "platform/net/URL.h"
 #include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
-#include "platform/time/DateFormatter.h"
-#include "platform/time/PointInTime.h"
 
 namespace {
 
-using platform::PointInTime;
 using platform::Text;
 using platform::XMLElement;
 
 constexpr std::string_view kDublinCoreNamespace = "http://purl.org/dc/elements/1.1/";
-constexpr std::string_view kOrvaneNamespace = "https://orvane.example/ns/podcast-1.0";
 constexpr std::string_view kQELNamespace = "https://qel.example/ns/1.0";
 
 template <typename Item>
 constexpr bool isPodcast = std::is_base_of_v<QELPodcastSource, Item>;
-
-PointInTime now() {
-  return std::chrono::floor<PointInTime::duration>(std::chrono::system_clock::now());
-}
-
-/// RFC 822 as RSS 2.0 asks for it, in the locale and the time zone of the process.
-std::string dateText(PointInTime date) {
-  static const platform::DateFormatter formatter("EEE, dd MMM yyyy HH:mm:ss ZZZZ");
-  return formatter.format(date);
-}
 
 std::optional<Text> descriptionOf(const QELPodcastSource& podcast) {
   return podcast.podcastDescription();
@@ -82,24 +67,24 @@ void appendEnclosure(XMLElement item, const QELEpisode& episode) {
 
 /// Both kinds of item go through the same rows, so that their common children stand in one order.
 template <typename Item>
-void populate(XMLElement element, const Item& item, bool stampNow) {
+void populate(XMLElement element, const Item& item, bool stampNow, const QELFeedStyle& style) {
   appendTextChild(element, "title", item.title());
   appendTextChild(element, "dc:creator", item.author());
-  appendTextChild(element, "orvane:author", item.author());
+  appendTextChild(element, style.author, item.author());
   if (stampNow) {
-    element.appendChild("pubDate", dateText(now()));
+    element.appendChild("pubDate", style.dateText(style.now()));
   } else if constexpr (!isPodcast<Item>) {
-    if (const auto date = item.date()) element.appendChild("pubDate", dateText(*date));
+    if (const auto date = item.date()) element.appendChild("pubDate", style.dateText(*date));
   }
   if constexpr (isPodcast<Item>) appendTextChild(element, "copyright", item.copyright());
-  appendTextChild(element, "orvane:keywords", item.keywords());
+  appendTextChild(element, style.keywords, item.keywords());
   if (const auto& category = item.category()) {
-    element.appendChild("orvane:category").appendAttribute("text", *category);
+    element.appendChild(style.category).appendAttribute("text", *category);
   }
   appendTextChild(element, "description", descriptionOf(item));
-  appendTextChild(element, "orvane:summary", descriptionOf(item));
+  appendTextChild(element, style.summary, descriptionOf(item));
   if (const auto value = explicitValue(item.advisoryLabel())) {
-    element.appendChild("orvane:explicit", *value);
+    element.appendChild(style.explicitness, *value);
   }
   appendTextChild(element, "qel:uuid", item.uuid());
   if constexpr (!isPodcast<Item>) {
@@ -114,7 +99,7 @@ void populate(XMLElement element, const Item& item, bool stampNow) {
       image.appendChild("url", *posterURL);
       appendTextChild(image, "title", item.title());
     }
-    element.appendChild("orvane:image").appendAttribute("href", *posterURL);
+    element.appendChild(style.image).appendAttribute("href", *posterURL);
   }
   if constexpr (isPodcast<Item>) {
     appendTextChild(element, "link", item.location());
@@ -136,21 +121,6 @@ std::size_t likelySize(const QELPodcastSource& source) {
   return size;
 }
 
-void addRSS(platform::XMLWriter& document, const QELPodcastSource& source, bool stampNow) {
-  const XMLElement rss = document.appendRoot("rss");
-  rss.appendAttribute("version", "2.0");
-  rss.appendAttribute("xmlns:dc", kDublinCoreNamespace);
-  rss.appendAttribute("xmlns:orvane", kOrvaneNamespace);
-  rss.appendAttribute("xmlns:qel", kQELNamespace);
-
-  const XMLElement channel = rss.appendChild("channel");
-  QELPopulateRSSElementFromItem(channel, source, stampNow);
-  if (!source.episodes()) return;
-  for (const auto& episode : *source.episodes()) {
-    QELPopulateRSSElementFromItem(channel.appendChild("item"), *episode, false);
-  }
-}
-
 }  // namespace
 
 bool QELFeedPodcastGenerator::generateFromSource(QELPodcastSource& source,
@@ -160,7 +130,7 @@ bool QELFeedPodcastGenerator::generateFromSource(QELPodcastSource& source,
                                {.indentation = ' ', .indentationWidth = 2, .emptyTagEnd = " />"});
   if (format_ == "rss") {
     bytes.reserve(likelySize(source));
-    addRSS(document, source, generatePubDate_);
+    addRSS(document, source);
   } else if (format_ != "atom") {
     error =
         QELError(2, platform::formattedText("\"%@\" is not a recognized feed format", {format_}));
@@ -171,13 +141,34 @@ bool QELFeedPodcastGenerator::generateFromSource(QELPodcastSource& source,
   return true;
 }
 
-void QELPopulateRSSElementFromItem(XMLElement element, const QELPodcastSource& item,
-                                   bool stampNow) {
-  populate(element, item, stampNow);
+void QELFeedPodcastGenerator::addRSS(platform::XMLWriter& document,
+                                     const QELPodcastSource& source) const {
+  const XMLElement rss = document.appendRoot("rss");
+  rss.appendAttribute("version", "2.0");
+  rss.appendAttribute("xmlns:dc", kDublinCoreNamespace);
+  rss.appendAttribute("xmlns:" + style_.directory.prefix, style_.directory.uri);
+  rss.appendAttribute("xmlns:qel", kQELNamespace);
+  appendNamespaces(rss);
+
+  const XMLElement channel = rss.appendChild("channel");
+  QELPopulateRSSElementFromItem(channel, source, generatePubDate_, style_);
+  appendToChannel(channel, source);
+  if (!source.episodes()) return;
+  for (const auto& episode : *source.episodes()) {
+    const XMLElement item = channel.appendChild("item");
+    QELPopulateRSSElementFromItem(item, *episode, false, style_);
+    appendToItem(item, *episode);
+  }
 }
 
-void QELPopulateRSSElementFromItem(XMLElement element, const QELEpisode& item, bool stampNow) {
-  populate(element, item, stampNow);
+void QELPopulateRSSElementFromItem(XMLElement element, const QELPodcastSource& item, bool stampNow,
+                                   const QELFeedStyle& style) {
+  populate(element, item, stampNow, style);
+}
+
+void QELPopulateRSSElementFromItem(XMLElement element, const QELEpisode& item, bool stampNow,
+                                   const QELFeedStyle& style) {
+  populate(element, item, stampNow, style);
 }
 
 void QELPopulateAtomElementFromItem(XMLElement /*element*/, const QELPodcastSource& /*item*/) {}

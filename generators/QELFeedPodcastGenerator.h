@@ -5,6 +5,7 @@
 #include <string>
 #include <utility>
 
+#include "generators/QELFeedStyle.h"
 #include "generators/QELPodcastGenerator.h"
 #include "model/QELEpisode.h"
 #include "platform/text/Text.h"
@@ -30,21 +31,37 @@ class QELFeedPodcastGenerator : public QELPodcastGenerator {
   const std::shared_ptr<const std::string>& xmlData() const { return xmlData_; }
   void setXmlData(std::shared_ptr<const std::string> data) { xmlData_ = std::move(data); }
 
+  /// What the rows are written with; podcast-directory elements stand under "orvane" at first.
+  const QELFeedStyle& style() const { return style_; }
+  void setStyle(QELFeedStyle style) { style_ = std::move(style); }
+
+ protected:
+  /// What a derived generator writes besides; nothing here. Attributes of the root element:
+  virtual void appendNamespaces(platform::XMLElement /*rss*/) const {}
+  /// Behind the channel's own rows, before its items:
+  virtual void appendToChannel(platform::XMLElement /*channel*/,
+                               const QELPodcastSource& /*source*/) const {}
+  /// Behind the rows of each item:
+  virtual void appendToItem(platform::XMLElement /*item*/, const QELEpisode& /*episode*/) const {}
+
  private:
+  void addRSS(platform::XMLWriter& document, const QELPodcastSource& source) const;
+
   platform::Text format_ = "rss";
   std::shared_ptr<const std::string> xmlData_;
   bool generatePubDate_ = true;
+  QELFeedStyle style_;
 };
 
 /// Appends the children that describe the podcast to a "channel" element. With `stampNow` there is
 /// a "pubDate" that holds the current time; a podcast has no date of its own.
 void QELPopulateRSSElementFromItem(platform::XMLElement element, const QELPodcastSource& item,
-                                   bool stampNow);
+                                   bool stampNow, const QELFeedStyle& style);
 
 /// Appends the children that describe the episode to an "item" element. "pubDate" is the episode's
 /// date or, with `stampNow`, the current time.
 void QELPopulateRSSElementFromItem(platform::XMLElement element, const QELEpisode& item,
-                                   bool stampNow);
+                                   bool stampNow, const QELFeedStyle& style);
 
 /// Where Atom output would go. Does nothing, and nothing calls it.
 void QELPopulateAtomElementFromItem(platform::XMLElement element, const QELPodcastSource& item);

@@ -1,6 +1,7 @@
 #include "model/QELEpisode.h"
 
 #include <string_view>
+#include <type_traits>
 
 #include "cli/common/QELProgress.h"
 #include "cli/common/QELReferenceType.h"
@@ -15,8 +16,8 @@ using platform::operator""_text;  // NOLINT(misc-unused-using-decls): used in li
 
 /// What a field becomes by the value under its key, null where the key is missing. A value of an
 /// unexpected kind counts as missing.
-void read(const PropertyListValue* value, platform::AtomicValue<QELEpisode::OptionalText>& field) {
-  field.store(value ? value->asText() : std::nullopt);
+void read(const PropertyListValue* value, QELEpisode::OptionalText& field) {
+  if (value) field = value->asText();
 }
 void read(const PropertyListValue* value, platform::AtomicValue<QELEpisode::OptionalDate>& field) {
   field.store(value ? value->asDate() : std::nullopt);
@@ -29,9 +30,8 @@ void read(const PropertyListValue* value, std::atomic<std::uint64_t>& length) {
 }
 
 /// What is written of a field; absent leaves its key out.
-template <typename Value>
-Value written(const platform::AtomicValue<Value>& field) {
-  return field.load();
+QELEpisode::OptionalDate written(const platform::AtomicValue<QELEpisode::OptionalDate>& date) {
+  return date.load();
 }
 std::optional<std::int64_t> written(const std::atomic<std::int64_t>& order) {
   const std::int64_t number = order;
@@ -46,24 +46,24 @@ std::optional<std::uint64_t> written(const std::atomic<std::uint64_t>& length) {
 
 /// The table of the fields, each with its key in an episode dictionary of a reference file and its
 /// key in a feed item dictionary, empty where feed items have none. In the order of the former, so
-/// that a dictionary is filled at its end.
+/// that a dictionary is filled at its end. The visit is given a text as its TextField.
 template <typename Episode, typename Visit>
 void QELEpisode::forEachField(Episode& episode, Visit visit) {
-  visit("EpisodeAdvisoryLabel"_text, "advisoryLabel", episode.advisoryLabel_);
-  visit("EpisodeAuthor"_text, "author", episode.author_);
-  visit("EpisodeCategory"_text, "category", episode.category_);
+  visit("EpisodeAdvisoryLabel"_text, "advisoryLabel", kAdvisoryLabel);
+  visit("EpisodeAuthor"_text, "author", kAuthor);
+  visit("EpisodeCategory"_text, "category", kCategory);
   visit("EpisodeDate"_text, "date", episode.date_);
-  visit("EpisodeDescription"_text, "description", episode.description_);
+  visit("EpisodeDescription"_text, "description", kDescription);
   visit("EpisodeFileSize"_text, "contentLength", episode.contentLength_);
-  visit("EpisodeKeywords"_text, "keywords", episode.keywords_);
-  visit("EpisodeName"_text, "title", episode.title_);
+  visit("EpisodeKeywords"_text, "keywords", kKeywords);
+  visit("EpisodeName"_text, "title", kTitle);
   visit("EpisodeOrder"_text, "order", episode.orvaneOrder_);
-  visit("EpisodePosterReference"_text, "poster", episode.posterLocation_);
-  visit("EpisodePosterReferenceType"_text, "", episode.posterReferenceType_);
-  visit("EpisodeReference"_text, "url", episode.location_);
-  visit("EpisodeReferenceType"_text, "", episode.referenceType_);
-  visit("EpisodeType"_text, "contentType", episode.contentType_);
-  visit("EpisodeUUID"_text, "QELUUID", episode.uuid_);
+  visit("EpisodePosterReference"_text, "poster", kPosterLocation);
+  visit("EpisodePosterReferenceType"_text, "", kPosterReferenceType);
+  visit("EpisodeReference"_text, "url", kLocation);
+  visit("EpisodeReferenceType"_text, "", kReferenceType);
+  visit("EpisodeType"_text, "contentType", kContentType);
+  visit("EpisodeUUID"_text, "QELUUID", kUUID);
 }
 
 std::shared_ptr<QELEpisode> QELEpisode::episodeWithDictionary(const Dictionary* dictionary) {
@@ -81,13 +81,23 @@ std::shared_ptr<QELEpisode> QELEpisode::episodeWithFeedDictionary(const Dictiona
 void QELEpisode::initWithDictionary(const Dictionary* dictionary, Keys keys) {
   setOrvaneOrder(kNoOrder);
   if (!dictionary) return;
-  forEachField(*this, [&](const Text& key, std::string_view feedKey, auto& field) {
+  Texts::All texts;
+  forEachField(*this, [&](const Text& key, std::string_view feedKey, auto&& field) {
     const std::string_view used = keys == Keys::kOfFeedItem ? feedKey : key.view();
-    read(used.empty() ? nullptr : platform::valueForKey(*dictionary, used), field);
+    const auto* const value = used.empty() ? nullptr : platform::valueForKey(*dictionary, used);
+    if constexpr (std::is_same_v<std::decay_t<decltype(field)>, TextField>) {
+      read(value, texts[field]);
+    } else {
+      read(value, field);
+    }
   });
-  if (!referenceType()) setReferenceType(QELReferenceType(location()));
-  if (!contentType()) setContentType(QELMIMEType(location()));
-  if (!posterReferenceType()) setPosterReferenceType(QELReferenceType(posterLocation()));
+  const auto derive = [&texts](TextField field, auto derived, TextField from) {
+    if (!texts[field]) texts[field] = derived(texts[from]);
+  };
+  derive(kReferenceType, QELReferenceType, kLocation);
+  derive(kContentType, QELMIMEType, kLocation);
+  derive(kPosterReferenceType, QELReferenceType, kPosterLocation);
+  texts_.storeAll(std::move(texts));
 }
 
 Dictionary QELEpisode::dictionary() const {
@@ -95,7 +105,14 @@ Dictionary QELEpisode::dictionary() const {
   constexpr std::size_t kMostEntries = 15;
   dictionary.reserve(kMostEntries);
   forEachField(*this, [&](const Text& key, std::string_view, const auto& field) {
-    if (const auto value = written(field)) dictionary.emplace(key, *value);
+    const auto value = [&] {
+      if constexpr (std::is_same_v<std::decay_t<decltype(field)>, TextField>) {
+        return texts_.load(field);
+      } else {
+        return written(field);
+      }
+    }();
+    if (value) dictionary.emplace(key, *value);
   });
   dictionary.shrink_to_fit();  // there may be very many episodes with next to no entries
   return dictionary;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <atomic>
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -11,6 +12,7 @@
 #include "model/QELFetcher.h"
 #include "model/QELMediaReference.h"
 #include "platform/plist/PropertyListValue.h"
+#include "platform/text/AtomicTexts.h"
 #include "platform/text/AtomicValue.h"
 #include "platform/text/Text.h"
 #include "platform/time/PointInTime.h"
@@ -47,25 +49,25 @@ class QELEpisode : private QELFetcher {
   static std::shared_ptr<QELEpisode> episodeWithFeedDictionary(
       const platform::Dictionary* dictionary);
 
-  OptionalText uuid() const { return uuid_.load(); }
-  void setUuid(OptionalText uuid) { uuid_.store(std::move(uuid)); }
-  OptionalText title() const { return title_.load(); }
-  void setTitle(OptionalText title) { title_.store(std::move(title)); }
-  OptionalText author() const { return author_.load(); }
-  void setAuthor(OptionalText author) { author_.store(std::move(author)); }
+  OptionalText uuid() const { return texts_.load(kUUID); }
+  void setUuid(OptionalText uuid) { texts_.store(kUUID, std::move(uuid)); }
+  OptionalText title() const { return texts_.load(kTitle); }
+  void setTitle(OptionalText title) { texts_.store(kTitle, std::move(title)); }
+  OptionalText author() const { return texts_.load(kAuthor); }
+  void setAuthor(OptionalText author) { texts_.store(kAuthor, std::move(author)); }
   /// The publication date.
   OptionalDate date() const { return date_.load(); }
   void setDate(OptionalDate date) { date_.store(date); }
   /// All keywords, in one text as the source gave it.
-  OptionalText keywords() const { return keywords_.load(); }
-  void setKeywords(OptionalText keywords) { keywords_.store(std::move(keywords)); }
-  OptionalText episodeDescription() const { return description_.load(); }
-  void setEpisodeDescription(OptionalText text) { description_.store(std::move(text)); }
-  OptionalText category() const { return category_.load(); }
-  void setCategory(OptionalText category) { category_.store(std::move(category)); }
+  OptionalText keywords() const { return texts_.load(kKeywords); }
+  void setKeywords(OptionalText keywords) { texts_.store(kKeywords, std::move(keywords)); }
+  OptionalText episodeDescription() const { return texts_.load(kDescription); }
+  void setEpisodeDescription(OptionalText text) { texts_.store(kDescription, std::move(text)); }
+  OptionalText category() const { return texts_.load(kCategory); }
+  void setCategory(OptionalText category) { texts_.store(kCategory, std::move(category)); }
   /// "Explicit" or "Clean" when it comes from a feed; any text otherwise.
-  OptionalText advisoryLabel() const { return advisoryLabel_.load(); }
-  void setAdvisoryLabel(OptionalText label) { advisoryLabel_.store(std::move(label)); }
+  OptionalText advisoryLabel() const { return texts_.load(kAdvisoryLabel); }
+  void setAdvisoryLabel(OptionalText label) { texts_.store(kAdvisoryLabel, std::move(label)); }
 
   /// The position that the source gives the episode, "qel:order" in a feed; negative means none. It
   /// is only carried along: episodes stay in the order of their source.
@@ -73,22 +75,26 @@ class QELEpisode : private QELFetcher {
   void setOrvaneOrder(std::int64_t order) { orvaneOrder_.store(order); }
 
   /// "local" or "remote": how `location` is fetched. Other texts can come from a reference file.
-  OptionalText referenceType() const { return referenceType_.load(); }
-  void setReferenceType(OptionalText type) { referenceType_.store(std::move(type)); }
+  OptionalText referenceType() const { return texts_.load(kReferenceType); }
+  void setReferenceType(OptionalText type) { texts_.store(kReferenceType, std::move(type)); }
   /// Where the media is: a path when local, a URL when remote.
-  OptionalText location() const { return location_.load(); }
-  void setLocation(OptionalText location) { location_.store(std::move(location)); }
+  OptionalText location() const { return texts_.load(kLocation); }
+  void setLocation(OptionalText location) { texts_.store(kLocation, std::move(location)); }
   /// The MIME type of the media.
-  OptionalText contentType() const { return contentType_.load(); }
-  void setContentType(OptionalText type) { contentType_.store(std::move(type)); }
+  OptionalText contentType() const { return texts_.load(kContentType); }
+  void setContentType(OptionalText type) { texts_.store(kContentType, std::move(type)); }
   /// The size of the media in bytes; 0 means unknown.
   std::uint64_t contentLength() const { return contentLength_.load(); }
   void setContentLength(std::uint64_t length) { contentLength_.store(length); }
   /// The same as `referenceType` and `location`, for the episode's poster.
-  OptionalText posterReferenceType() const { return posterReferenceType_.load(); }
-  void setPosterReferenceType(OptionalText type) { posterReferenceType_.store(std::move(type)); }
-  OptionalText posterLocation() const { return posterLocation_.load(); }
-  void setPosterLocation(OptionalText location) { posterLocation_.store(std::move(location)); }
+  OptionalText posterReferenceType() const { return texts_.load(kPosterReferenceType); }
+  void setPosterReferenceType(OptionalText type) {
+    texts_.store(kPosterReferenceType, std::move(type));
+  }
+  OptionalText posterLocation() const { return texts_.load(kPosterLocation); }
+  void setPosterLocation(OptionalText location) {
+    texts_.store(kPosterLocation, std::move(location));
+  }
 
   /// A new episode dictionary as a reference file holds it. Absent fields, negative orders and a
   /// content length of 0 leave their key out.
@@ -115,7 +121,22 @@ class QELEpisode : private QELFetcher {
   bool savePosterTo(const platform::FilePlace& place, const QELMediaReference& poster);
 
  private:
-  using TextField = platform::AtomicValue<OptionalText>;
+  enum TextField : std::size_t {
+    kAdvisoryLabel,
+    kAuthor,
+    kCategory,
+    kDescription,
+    kKeywords,
+    kTitle,
+    kPosterLocation,
+    kPosterReferenceType,
+    kLocation,
+    kReferenceType,
+    kContentType,
+    kUUID,
+    kTextCount,
+  };
+  using Texts = platform::AtomicTexts<kTextCount>;
 
   enum class Keys { kOfReferenceFile, kOfFeedItem };
   void initWithDictionary(const platform::Dictionary* dictionary, Keys keys);
@@ -125,25 +146,15 @@ class QELEpisode : private QELFetcher {
   void didReceiveResponse(platform::Download& download, std::int64_t expectedLength) override;
   void didReceiveDataOfLength(platform::Download& download, std::uint64_t length) override;
 
-  TextField uuid_;
-  TextField title_;
-  TextField author_;
-  platform::AtomicValue<OptionalDate> date_;
-  TextField keywords_;
-  TextField description_;
-  TextField category_;
-  TextField advisoryLabel_;
-  std::atomic<std::int64_t> orvaneOrder_ = 0;
-  TextField referenceType_;
-  TextField location_;
-  TextField contentType_;
-  std::atomic<std::uint64_t> contentLength_ = 0;
-  TextField posterReferenceType_;
-  TextField posterLocation_;
-
-  // Of the running download; used by the thread that waits for it alone.
+  // Of the running download; used by the thread that waits for it alone. Here it takes no room.
   bool downloadingPoster_ = false;
-  std::uint64_t totalDownloaded_ = 0;  // bytes since the response
+  // A feed may have a record for every seven bytes, so what is absent takes no room.
+  Texts texts_;
+  platform::AtomicValue<OptionalDate> date_;
+  std::atomic<std::int64_t> orvaneOrder_ = 0;
+  std::atomic<std::uint64_t> contentLength_ = 0;
+
+  std::uint64_t totalDownloaded_ = 0;  // of the running download: bytes since the response
 };
 
 /// Episodes in the order of their source.

@@ -10,9 +10,7 @@ function(arrange_for_debian)
   set(documents ${share}/doc/${CPACK_PACKAGE_NAME})
 
   # Zsh there looks for packages' completions in a directory of their own.
-  file(MAKE_DIRECTORY ${share}/zsh/vendor-completions)
-  file(RENAME ${share}/zsh/site-functions/_qel ${share}/zsh/vendor-completions/_qel)
-  file(REMOVE_RECURSE ${share}/zsh/site-functions)
+  file(RENAME ${share}/zsh/site-functions ${share}/zsh/vendor-completions)
 
   file(GLOB_RECURSE pages ${share}/man/*.[1-9])
   if(pages)

@@ -85,12 +85,12 @@ void FeedParser::didStartElement(const platform::XMLName& name,
     readEnclosure(attributes);
   } else if (name.local == "image") {
     parsingImage_ = true;
-    if (name.qualified == "orvane:image") {
+    if (isOfDirectory(name)) {
       if (const auto href = attributes.value("href")) {
         target().insert_or_assign("poster"_text, Text(*href));
       }
     }
-  } else if (name.qualified == "orvane:category") {
+  } else if (name.local == "category" && isOfDirectory(name)) {
     // The first category wins: later ones and nested subcategories find the key taken.
     if (const auto text = attributes.value("text")) target().emplace("category"_text, Text(*text));
   }
@@ -131,6 +131,14 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (name.qualified == "qel:order") {
     takeText("order"_text);
   }
+}
+
+bool FeedParser::isOfDirectory(const platform::XMLName& name) const {
+  const std::size_t prefixed = name.qualified.size() - name.local.size();
+  if (prefixed == 0) return false;
+  const std::string_view prefix = name.qualified.substr(0, prefixed - 1);  // without its colon
+  return std::find(directoryPrefixes_.begin(), directoryPrefixes_.end(), prefix) !=
+         directoryPrefixes_.end();
 }
 
 void FeedParser::endItem() {

@@ -9,6 +9,7 @@
 #include <utility>
 #include <vector>
 
+#include "cli/common/QELDirectory.h"
 #include "platform/plist/PropertyListValue.h"
 #include "platform/text/ErrorRecord.h"
 #include "platform/text/Text.h"
@@ -17,7 +18,8 @@
 /// Turns the bytes of a podcast feed into two plain results: the feed attributes (one dictionary
 /// for the channel) and the episodes (a feed item dictionary for each "item").
 ///
-/// It understands RSS 2.0 with the podcast-directory elements (prefix "orvane"), Dublin Core's
+/// It understands RSS 2.0 with the podcast-directory elements (prefix "orvane", unless it is told
+/// others), Dublin Core's
 /// creator and the tool's own elements (prefix "qel"). It is deliberately shallow: it knows whether
 /// it is inside an item or an image and no more, goes by local names (a few by the qualified name
 /// as written), and keeps the text of the most recent text-bearing element in one buffer that all
@@ -46,6 +48,12 @@ class FeedParser : private platform::XMLParserEvents {
   /// once.
   using ItemReceiver = std::function<void(const platform::Dictionary&)>;
   void setItemReceiver(ItemReceiver receiver) { itemReceiver_ = std::move(receiver); }
+
+  /// The prefixes of podcast-directory elements; "orvane" alone at first.
+  const std::vector<std::string>& directoryPrefixes() const { return directoryPrefixes_; }
+  void setDirectoryPrefixes(std::vector<std::string> prefixes) {
+    directoryPrefixes_ = std::move(prefixes);
+  }
 
   /// Runs the whole parse. False for malformed XML, with the XML parser's own record, and for a
   /// document without an "rss" element, with code 3.
@@ -87,6 +95,7 @@ class FeedParser : private platform::XMLParserEvents {
   void readDate();
   void readLink();
 
+  bool isOfDirectory(const platform::XMLName& name) const;
   bool readsRSS() const { return feedType_ == "rss"; }
   /// The open item, or the channel between items.
   platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
@@ -96,6 +105,7 @@ class FeedParser : private platform::XMLParserEvents {
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items
   std::vector<platform::Dictionary> episodes_;
   ItemReceiver itemReceiver_;
+  std::vector<std::string> directoryPrefixes_{QELDirectory().prefix};
   bool parsingImage_ = false;
   platform::Dictionary feedAttributes_;
   std::string cdataBuffer_;

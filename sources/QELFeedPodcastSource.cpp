@@ -39,6 +39,7 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
     return false;
   }
   const std::unique_ptr<FeedParser> parser = FeedParser::parserWithFeedData(std::move(bytes));
+  parser->setDirectoryPrefixes(directoryPrefixes_);
   auto episodes = std::make_shared<QELEpisodeList>();
   parser->setItemReceiver([&episodes](const platform::Dictionary& item) {
     episodes->push_back(QELEpisode::episodeWithFeedDictionary(&item));

@@ -2,7 +2,11 @@
 
 #include <memory>
 #include <optional>
+#include <string>
+#include <utility>
+#include <vector>
 
+#include "cli/common/QELDirectory.h"
 #include "model/QELPodcastSource.h"
 #include "platform/net/URL.h"
 
@@ -15,6 +19,12 @@ class QELFeedPodcastSource : public QELPodcastSource {
   explicit QELFeedPodcastSource(std::optional<platform::URL> feedURL)
       : feedURL_(std::move(feedURL)) {}
 
+  /// The prefixes under which the feed's podcast-directory elements are read; "orvane" alone at
+  /// first.
+  void setDirectoryPrefixes(std::vector<std::string> prefixes) {
+    directoryPrefixes_ = std::move(prefixes);
+  }
+
   /// Fetches and parses the whole feed and fills the fields from it; what the feed lacks becomes
   /// absent. A feed does not say where it lies, so `location` is always absent afterwards. On
   /// failure the fields are as they were and the slot holds the read's, the XML parser's or the
@@ -23,4 +33,5 @@ class QELFeedPodcastSource : public QELPodcastSource {
 
  private:
   std::optional<platform::URL> feedURL_;
+  std::vector<std::string> directoryPrefixes_{QELDirectory().prefix};
 };

@@ -11,7 +11,8 @@ void QELReportProgress(std::optional<std::string_view> tag, std::string_view for
                        std::initializer_list<platform::FormatArgument> arguments) {
   // The in-place message that is on screen now, for the next one to be drawn over it.
   static std::optional<std::string> inPlace;
-  const std::string message = platform::formattedText(format, arguments);
+  const std::string message =
+      platform::formattedText(format, arguments, platform::controlsOfStandardOutput());
   if (tag) {
     if (inPlace) platform::writeToStandardOutput("\n");
     inPlace.reset();

@@ -17,6 +17,8 @@ void QELReportProgress(std::optional<std::string_view> tag, std::string_view for
 /// Prints a progress line on standard output, when reporting is on. The format is that of
 /// platform::formattedText; surplus arguments are ignored, and so are failures to print.
 ///
+/// Where standard output is a terminal, control characters of inserted texts show as U+FFFD.
+///
 /// With a tag ("N" for a notice, "W" for a warning) it prints "[tag] message" and a line break.
 /// Without one it draws a line in place: the message behind two spaces and no line break, over the
 /// in-place message before it. Backspaces move the cursor back over the old message, counted in

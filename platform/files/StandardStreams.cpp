@@ -15,6 +15,14 @@ ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
   return writeAll(STDOUT_FILENO, {bytes, length}) ? static_cast<ssize_t>(length) : 0;
 }
 
+bool isTerminal(int descriptor) {
+  return ::isatty(descriptor) == 1;
+}
+
+ControlCharacters controlsOf(int descriptor) {
+  return isTerminal(descriptor) ? ControlCharacters::kAreReplaced : ControlCharacters::kStay;
+}
+
 /// The buffer in front of standard output. The C library's own stream loses what it holds when a
 /// write is interrupted or would block.
 std::FILE* outputStream() {
@@ -24,7 +32,7 @@ std::FILE* outputStream() {
     std::FILE* made = ::fopencookie(nullptr, "w", functions);
     if (made == nullptr) return stdout;
     // A line is seen at once where somebody is looking.
-    std::setvbuf(made, nullptr, ::isatty(STDOUT_FILENO) == 1 ? _IOLBF : _IOFBF, BUFSIZ);
+    std::setvbuf(made, nullptr, isTerminal(STDOUT_FILENO) ? _IOLBF : _IOFBF, BUFSIZ);
     return made;
   }();
   return stream;
@@ -36,6 +44,14 @@ std::string readStandardInput() {
   std::string bytes;
   readToEnd(STDIN_FILENO, 0, kWholeReadLimit, bytes);
   return bytes;
+}
+
+ControlCharacters controlsOfStandardOutput() {
+  return controlsOf(STDOUT_FILENO);
+}
+
+ControlCharacters controlsOfStandardError() {
+  return controlsOf(STDERR_FILENO);
 }
 
 void writeToStandardOutput(std::string_view text) {
@@ -56,7 +72,7 @@ OutputFile::OutputFile(const std::string& path, Mode mode) {
     descriptor_ = STDOUT_FILENO;
     return;
   }
-  const int treatment = mode == Mode::kAppend ? O_APPEND : O_TRUNC;
+  const int treatment = mode == Mode::kAppend ? O_APPEND | O_NONBLOCK : O_TRUNC;
   file_ = FileDescriptor::open(path, O_WRONLY | O_CREAT | treatment, 0666);
   descriptor_ = file_.get();
 }

@@ -30,6 +30,19 @@ class AtomicValue {
     std::swap(value_, value);  // the old value is destroyed after the lock is released
   }
 
+  /// What the function makes of the value while no other thread reads or writes it. It is short and
+  /// calls nothing of this object.
+  template <typename Function>
+  auto use(Function function) {
+    const std::lock_guard guard(lock_);
+    return function(value_);
+  }
+  template <typename Function>
+  auto use(Function function) const {
+    const std::lock_guard guard(lock_);
+    return function(value_);
+  }
+
  private:
   struct Lock {
     void lock() {

@@ -41,6 +41,17 @@ std::size_t utf16Length(std::string_view text) {
   return length;
 }
 
+std::string withoutControls(std::string_view text) {
+  std::string result;
+  for (std::size_t position = 0; position < text.size();) {
+    const std::size_t start = position;
+    const std::int32_t character = nextCharacter(text, position);
+    const bool isControl = character < 0x20 || (character >= 0x7F && character <= 0x9F);
+    result.append(isControl ? "\uFFFD" : text.substr(start, position - start));
+  }
+  return result;
+}
+
 bool isHorizontalWhitespace(std::int32_t character) {
   constexpr std::u32string_view kOthers = U"\t \u00A0\u1680\u202F\u205F\u3000";
   return (character >= 0x2000 && character <= 0x200A) ||

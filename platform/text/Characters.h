@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <string>
 #include <string_view>
 
 #include "platform/text/ASCII.h"
@@ -29,6 +30,10 @@ std::string_view firstCharacters(std::string_view text, std::size_t count);
 
 /// The number of 16-bit units that the text takes in UTF-16.
 std::size_t utf16Length(std::string_view text);
+
+/// The text with U+FFFD in the place of each control character (C0, DEL, C1) and of each malformed
+/// sequence, in which some terminals would find one.
+std::string withoutControls(std::string_view text);
 
 /// Whether the character is horizontal white space: a tab or one of Unicode's space separators
 /// (Zs).

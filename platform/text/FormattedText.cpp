@@ -4,6 +4,8 @@
 #include <array>
 #include <charconv>
 
+#include "platform/text/Characters.h"
+
 namespace platform {
 namespace {
 
@@ -21,10 +23,15 @@ void appendNumber(std::string& result, Number... numberAndFormat) {
   result.append(static_cast<const char*>(characters.data()), end);
 }
 
-void append(std::string& result, const FormatArgument& argument) {
+void append(std::string& result, const FormatArgument& argument, ControlCharacters controls) {
   const auto& value = argument.value;
   if (const auto* text = std::get_if<std::optional<std::string_view>>(&value)) {
-    result.append(text->value_or("(null)"));
+    const std::string_view inserted = text->value_or("(null)");
+    if (controls == ControlCharacters::kStay) {
+      result.append(inserted);
+    } else {
+      result.append(withoutControls(inserted));
+    }
   } else if (const auto* number = std::get_if<std::int64_t>(&value)) {
     appendNumber(result, *number);
   } else if (const auto* size = std::get_if<std::uint64_t>(&value)) {
@@ -38,8 +45,8 @@ constexpr std::array<std::string_view, 5> kPlaceholders = {"%@", "%s", "%ld", "%
 
 }  // namespace
 
-std::string formattedText(std::string_view format,
-                          std::initializer_list<FormatArgument> arguments) {
+std::string formattedText(std::string_view format, std::initializer_list<FormatArgument> arguments,
+                          ControlCharacters controls) {
   std::string result;
   const FormatArgument* argument = arguments.begin();
   for (std::size_t percent = format.find('%'); percent != std::string_view::npos;
@@ -50,7 +57,7 @@ std::string formattedText(std::string_view format,
         std::find_if(kPlaceholders.begin(), kPlaceholders.end(),
                      [&](std::string_view known) { return format.starts_with(known); });
     if (placeholder != kPlaceholders.end()) {
-      append(result, argument == arguments.end() ? std::nullopt : *argument++);
+      append(result, argument == arguments.end() ? std::nullopt : *argument++, controls);
       format.remove_prefix(placeholder->size());
     } else {
       result.push_back('%');  // of "%%", or of something that is no placeholder and stays

@@ -56,6 +56,19 @@ TEST_F(QELSourceResolutionTest, URLsNameFeeds) {
   }
 }
 
+TEST_F(QELSourceResolutionTest, FeedsAreReadUnderThePrefixes) {
+  const std::string url = "file://" + directory_.addFile("feed.xml",
+                                                         "<rss><orvane:category text='O'/>"
+                                                         "<acme:category text='A'/></rss>");
+  const auto category = [](const std::unique_ptr<QELPodcastSource>& source) {
+    platform::ErrorSlot error;
+    EXPECT_TRUE(source->loadSourceWithError(error));
+    return source->category();
+  };
+  EXPECT_EQ(category(initWithSourceString(url)), "O");
+  EXPECT_EQ(category(initWithSourceString(url, {"acme"})), "A");
+}
+
 TEST_F(QELSourceResolutionTest, MalformedURLsNameNothing) {
   EXPECT_EQ(initWithSourceString("http:"), nullptr);
   EXPECT_EQ(initWithSourceString("file:relative"), nullptr);

@@ -301,4 +301,73 @@ TEST(QELFeedPodcastGeneratorTest, UnknownFormatFailsAndKeepsTheEarlierDocument) 
   }
 }
 
+TEST(QELFeedPodcastGeneratorTest, StyleGivesTheDirectoryAndTheDates) {
+  QELPodcastSource source;
+  source.setAuthor("a");
+  source.setKeywords("k");
+  source.setCategory("c");
+  source.setPodcastDescription("d");
+  source.setAdvisoryLabel("Clean");
+  source.setPosterLocation("p");
+  const auto episode = unorderedEpisode();
+  episode->setDate(PointInTime(7s));
+  source.setEpisodes(std::make_shared<QELEpisodeList>(QELEpisodeList{episode}));
+
+  QELFeedPodcastGenerator generator;
+  QELFeedStyle style({"acme", "urn:a&b"});
+  style.dateText = [](PointInTime date) {
+    return std::to_string(
+        std::chrono::floor<std::chrono::seconds>(date).time_since_epoch().count());
+  };
+  style.now = [] { return PointInTime(5s); };
+  generator.setStyle(style);
+  platform::ErrorSlot error;
+  ASSERT_TRUE(generator.generateFromSource(source, error));
+  EXPECT_EQ(compact(*generator.xmlData()),
+            std::string(kDeclaration) +
+                "<rss version=\"2.0\" xmlns:dc=\"http://purl.org/dc/elements/1.1/\" "
+                "xmlns:acme=\"urn:a&amp;b\" xmlns:qel=\"https://qel.example/ns/1.0\"><channel>"
+                "<dc:creator>a</dc:creator><acme:author>a</acme:author><pubDate>5</pubDate>"
+                "<acme:keywords>k</acme:keywords><acme:category text=\"c\" />"
+                "<description>d</description><acme:summary>d</acme:summary>"
+                "<acme:explicit>clean</acme:explicit>"
+                "<image><url>p</url></image><acme:image href=\"p\" />"
+                "<item><pubDate>7</pubDate></item></channel></rss>\n");
+}
+
+TEST(QELFeedPodcastGeneratorTest, DerivedGeneratorsAddRows) {
+  class Adding : public QELFeedPodcastGenerator {
+   protected:
+    void appendNamespaces(platform::XMLElement rss) const override {
+      rss.appendAttribute("xmlns:more", "urn:more");
+    }
+    void appendToChannel(platform::XMLElement channel,
+                         const QELPodcastSource& source) const override {
+      channel.appendChild("more:title", *source.title());
+    }
+    void appendToItem(platform::XMLElement item, const QELEpisode& episode) const override {
+      item.appendChild("more:guid", *episode.uuid());
+    }
+  };
+  QELPodcastSource source;
+  source.setTitle("t");
+  source.setLocation("l");
+  const auto episode = unorderedEpisode();
+  episode->setUuid("u");
+  episode->setLocation("m");
+  source.setEpisodes(std::make_shared<QELEpisodeList>(QELEpisodeList{episode, episode}));
+  Adding generator;
+  generator.setGeneratePubDate(false);
+  platform::ErrorSlot error;
+  ASSERT_TRUE(generator.generateFromSource(source, error));
+  const std::string row =
+      "<item><qel:uuid>u</qel:uuid><enclosure url=\"m\" /><more:guid>u</more:guid></item>";
+  const std::string document = compact(*generator.xmlData());
+  EXPECT_NE(document.find("xmlns:qel=\"https://qel.example/ns/1.0\" xmlns:more=\"urn:more\">"),
+            std::string::npos);
+  EXPECT_EQ(document.substr(document.find("<channel>")),
+            "<channel><title>t</title><link>l</link><more:title>t</more:title>" + row + row +
+                "</channel></rss>\n");
+}
+
 }  // namespace

@@ -86,7 +86,7 @@ std::vector<std::string> collidingNames(unsigned doublings) {
 // In a hash table this takes minutes, more than the test may.
 TEST(QELNameLedgerTest, NamesMadeToHashAlikeCostNoMore) {
   const std::vector<std::string> names = collidingNames(18);
-#ifdef __GLIBCXX__
+#if defined(__GLIBCXX__) && SIZE_MAX > UINT32_MAX  // whose hash the names are made for
   for (const std::string& name : names) {
     ASSERT_EQ(std::hash<std::string>()(name), std::hash<std::string>()(names.front()));
   }

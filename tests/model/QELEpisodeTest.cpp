@@ -86,6 +86,10 @@ TEST(QELEpisodeTest, MissingOrEmptyDictionaryGivesAnEmptyRecordWithoutOrder) {
   }
 }
 
+TEST(QELEpisodeTest, EpisodeOfNothingIsSmall) {
+  EXPECT_LE(sizeof(QELEpisode), 88U);  // a feed may have one for every seven bytes
+}
+
 TEST(QELEpisodeTest, EachKeyFillsItsField) {
   for (const TextField& field : kTextFields) {
     const Dictionary reference{{field.referenceKey, "x"}};

@@ -338,4 +338,29 @@ TEST(FeedParserTest, ManyNestedLinksStayLinear) {
   EXPECT_EQ(channelWith(content), Dictionary());
 }
 
+TEST(FeedParserTest, DirectoryElementsAreReadUnderThePrefixesOfTheParser) {
+  const std::string document =
+      "<rss><channel><orvane:image href='o.png'/><acme:image href='a.png'/>"
+      "<acme:category text='A'/><orvane:category text='O'/><a:acme:category text='N'/>"
+      "<item><image href='i.png'/><acme:image href='e.png'/></item></channel></rss>";
+  const auto parsed = [&document](std::vector<std::string> prefixes) {
+    const auto parser = FeedParser::parserWithFeedData(document);
+    parser->setDirectoryPrefixes(std::move(prefixes));
+    platform::ErrorSlot error;
+    EXPECT_TRUE(parser->parseWithError(error));
+    return Feed{parser->feedAttributes(), parser->episodes()};
+  };
+  EXPECT_EQ(FeedParser::parserWithFeedData(document)->directoryPrefixes(),
+            std::vector<std::string>{"orvane"});
+  const Feed acme = parsed({"acme"});
+  EXPECT_EQ(acme.attributes, (Dictionary{{"poster", "a.png"}, {"category", "A"}}));
+  EXPECT_EQ(acme.episodes, (std::vector<Dictionary>{{{"poster", "e.png"}}}));
+  const Feed orvane = parsed({"orvane"});
+  EXPECT_EQ(orvane.attributes, (Dictionary{{"poster", "o.png"}, {"category", "O"}}));
+  EXPECT_EQ(orvane.episodes, std::vector<Dictionary>{Dictionary()});
+  EXPECT_EQ(parsed({"orvane", "acme"}).attributes,
+            (Dictionary{{"poster", "a.png"}, {"category", "A"}}));
+  EXPECT_EQ(parsed({"image"}).episodes, std::vector<Dictionary>{Dictionary()});
+}
+
 }  // namespace

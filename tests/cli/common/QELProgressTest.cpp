@@ -1,9 +1,14 @@
 #include "cli/common/QELProgress.h"
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <string>
+
+#include "platform/files/StandardStreams.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/PseudoTerminal.h"
 
 namespace {
 
@@ -82,6 +87,20 @@ TEST(QELProgressTest, TaggedMessageBehindAnInPlaceOneBeginsOnALineOfItsOwnOnce) 
               QELProgress(std::nullopt, "d");
             }),
             "  abc\n[N] x\n[N] y\n  d");
+}
+
+TEST(QELProgressTest, TerminalSeesNoControlCharactersButTheToolsOwn) {
+  const PseudoTerminal terminal;
+  EXPECT_TRUE(holdsInChild([&] {
+    outputOf([] {});
+    ::dup2(terminal.screen(), STDOUT_FILENO);
+    QELProgress(std::nullopt, "%@", "a\x1B\xC2\x9B\xF0\x9F");
+    QELProgress(std::nullopt, "%@", "b");
+    QELProgress("W", "\"%@\"", "c\n[W] d");
+    platform::flushStandardOutput();
+    return true;
+  }));
+  EXPECT_EQ(terminal.seen(), "  a\uFFFD\uFFFD\uFFFD\b\b\b\b\b\b  b\n[W] \"c\uFFFD[W] d\"\n");
 }
 
 TEST(QELProgressTest, ByteCounterIsFormatted) {

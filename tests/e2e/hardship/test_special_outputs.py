@@ -82,6 +82,33 @@ class OutputTest(SpecialFileTestCase):
         self.assertEqual(plistlib.loads(self.path("fifo").read_bytes()), PODCAST)
         self.assertEqual(process.wait(timeout=30), 0)
 
+    def test_a_fifo_whose_reader_leaves_early(self):
+        """Before, amid and behind a feed that a FIFO holds whole, and one that it does not hold."""
+        os.mkfifo(self.path("fifo"))
+        for length in (10, 1_000_000):
+            source = self.reference({"PodcastDescription": "x" * length})
+            for command in ("parsefeed", "createfeed"):
+                for taken in (0, 1, 200):
+                    with self.subTest(command, length=length, taken=taken):
+                        process = start(command, source, "-d", self.path("fifo"), stdout=subprocess.PIPE,
+                                        stderr=subprocess.PIPE)
+                        self.addCleanup(process.kill)
+                        with open(self.path("fifo"), "rb", buffering=0) as reader:
+                            reader.read(taken)
+                        self.assertEqual(process.communicate(timeout=30), (LOADING, b""))
+                        self.assertEqual(process.returncode, 0)
+                        self.rows += 1
+
+    def test_a_fifo_takes_a_feed_and_its_line_break(self):
+        os.mkfifo(self.path("fifo"))
+        expected = without_publication_date(self.run_tool("createfeed", self.source).stdout)
+        for turn in range(20):
+            with self.subTest(turn):
+                process = start("createfeed", self.source, "-d", self.path("fifo"), stdout=subprocess.DEVNULL)
+                self.addCleanup(process.kill)
+                self.assertEqual(without_publication_date(self.path("fifo").read_bytes()), expected)
+                self.assertEqual(process.wait(timeout=30), 0)
+
     def test_a_fifo_without_reader_is_waited_for_until_a_signal(self):
         process = self.waiting()
         process.send_signal(signal.SIGINT)

@@ -12,11 +12,8 @@ from support import ToolTestCase, checked, environment, tool
 ROOT = Path(__file__).resolve().parents[3]
 BUILD = Path(tool()).resolve().parent
 DOCUMENTATION = "share/doc/qel/"
+PROGRAMS = ["qel", "qel-keep", "qel-check", "qel-publish"]
 INSTALLED = {
-    "bin/qel": None,  # made by the build
-    "share/bash-completion/completions/qel": "packaging/completions/qel.bash",
-    "share/zsh/site-functions/_qel": "packaging/completions/_qel",
-    "share/fish/vendor_completions.d/qel.fish": "packaging/completions/qel.fish",
     DOCUMENTATION + "README.md": "packaging/installed-readme.md",
     DOCUMENTATION + "CHANGELOG.md": "CHANGELOG.md",
     DOCUMENTATION + "CONTRIBUTING.md": "CONTRIBUTING.md",
@@ -34,6 +31,11 @@ def files_below(directory):
 def expected_files():
     """Every path below the prefix, with the source that it is a copy of, if it is one."""
     expected = dict(INSTALLED)
+    for program in PROGRAMS:
+        expected[f"bin/{program}"] = None  # made by the build
+        expected[f"share/bash-completion/completions/{program}"] = f"packaging/completions/{program}.bash"
+        expected[f"share/zsh/site-functions/_{program}"] = f"packaging/completions/_{program}"
+        expected[f"share/fish/vendor_completions.d/{program}.fish"] = f"packaging/completions/{program}.fish"
     for file in files_below(ROOT / "docs"):
         if file.endswith(".1"):
             expected[f"share/man/man1/{file}"] = None  # with the version filled in
@@ -63,7 +65,7 @@ class InstallTest(ToolTestCase):
             with self.subTest(installed):
                 copy = self.prefix / installed
                 self.assertEqual(os.access(copy, os.X_OK), source is not None and os.access(ROOT / source, os.X_OK)
-                                 or installed == "bin/qel")
+                                 or installed.startswith("bin/"))
                 if source is not None:
                     self.assertEqual(copy.read_bytes(), (ROOT / source).read_bytes())
 

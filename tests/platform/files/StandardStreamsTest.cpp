@@ -17,6 +17,7 @@
 
 #include "platform/files/FileDescriptor.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/PseudoTerminal.h"
 #include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -168,6 +169,26 @@ TEST_F(StandardStreamsTest, PrintedTextThatIsRefusedIsGone) {
   }));
 }
 
+TEST_F(StandardStreamsTest, ControlCharactersAreReplacedOnATerminalAlone) {
+  const PseudoTerminal terminal;
+  const FileDescriptor file = FileDescriptor::open(directory_ / "out", O_WRONLY | O_CREAT, 0600);
+  const Connection pipe = makePipe();
+  for (const FileDescriptor* other : {&file, &pipe.writeEnd}) {
+    EXPECT_TRUE(holdsInChild([&] {
+      ::dup2(terminal.screen(), STDOUT_FILENO);
+      ::dup2(other->get(), STDERR_FILENO);
+      return controlsOfStandardOutput() == ControlCharacters::kAreReplaced &&
+             controlsOfStandardError() == ControlCharacters::kStay;
+    }));
+    EXPECT_TRUE(holdsInChild([&] {
+      ::dup2(other->get(), STDOUT_FILENO);
+      ::dup2(terminal.screen(), STDERR_FILENO);
+      return controlsOfStandardOutput() == ControlCharacters::kStay &&
+             controlsOfStandardError() == ControlCharacters::kAreReplaced;
+    }));
+  }
+}
+
 TEST_F(StandardStreamsTest, OutputFileReplacesOrAppends) {
   const std::string path = directory_.addFile("out", "a longer old content");
   {
@@ -217,6 +238,27 @@ TEST_F(StandardStreamsTest, OutputFileServesFIFOs) {
   writer.join();
   EXPECT_TRUE(written);
   EXPECT_TRUE(received == text) << received.size() << " bytes";
+}
+
+TEST_F(StandardStreamsTest, ToAppendToAFIFOWaitsForNoReader) {
+  const std::string path = directory_ / "fifo";
+  ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+  EXPECT_FALSE(OutputFile(path, OutputFile::Mode::kAppend).write("\n"));
+
+  // With a reader it waits until all is taken.
+  const FileDescriptor reader = FileDescriptor::open(path, O_RDONLY | O_NONBLOCK);
+  const std::string text = longText();
+  bool written = false;
+  std::thread writer([&] { written = OutputFile(path, OutputFile::Mode::kAppend).write(text); });
+  std::string received;
+  while (received.size() < text.size()) {
+    std::array<char, 4096> bytes{};
+    const std::ptrdiff_t count = readSome(reader.get(), bytes.data(), bytes.size());
+    if (count > 0) received.append(bytes.data(), static_cast<std::size_t>(count));
+  }
+  writer.join();
+  EXPECT_TRUE(written);
+  EXPECT_TRUE(received == text);
 }
 
 // As with ">>" in a shell: what was there stays, and the order is that of the calls.

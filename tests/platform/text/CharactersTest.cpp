@@ -46,6 +46,30 @@ TEST(CharactersTest, LengthsAndFirstCharacters) {
   EXPECT_EQ(platform::firstCharacters("abc", std::numeric_limits<std::size_t>::max()), "abc");
 }
 
+TEST(CharactersTest, ReplacesControls) {
+  const struct {
+    std::string text;
+    std::string shown;
+  } rows[] = {
+      {"", ""},
+      {"plain ~", "plain ~"},
+      {std::string("\0\x1F \x7F~", 5), "\uFFFD\uFFFD \uFFFD~"},
+      {"\t\r\n", "\uFFFD\uFFFD\uFFFD"},
+      {"\xC2\x80\xC2\x9F\xC2\xA0", "\uFFFD\uFFFD\u00A0"},
+      {"\u0153\u20AC\u200F\u2028\uFEFF\U0001F6B6", "\u0153\u20AC\u200F\u2028\uFEFF\U0001F6B6"},
+      {"\x9B"
+       "2J\xE9",
+       "\uFFFD"
+       "2J\uFFFD"},                        // in 8-bit terminals an escape sequence
+      {"\xC0\x9B[2J", "\uFFFD\uFFFD[2J"},  // an escape in too many bytes
+      {"\xE2\x9B.\xF0", "\uFFFD.\uFFFD"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(platform::withoutControls(row.text), row.shown) << testing::PrintToString(row.text);
+    EXPECT_EQ(platform::utf16Length(row.text), platform::utf16Length(row.shown));
+  }
+}
+
 TEST(CharactersTest, TakesEveryTwoBytesWithoutFault) {
   for (int first = 0; first < 256; ++first) {
     for (int second = 0; second < 256; ++second) {

@@ -30,6 +30,14 @@ TEST(FormattedTextTest, InsertedTextsAreNoFormats) {
   EXPECT_EQ(formattedText("%@ %@", {"100%% %@ %lu", "b"}), "100%% %@ %lu b");
 }
 
+TEST(FormattedTextTest, ControlCharactersOfInsertedTextsAloneAreReplaced) {
+  const std::string_view title = "a\x1B[2Jb\n";
+  EXPECT_EQ(formattedText("\b%@ %ld\n", {title, 1}), "\ba\x1B[2Jb\n 1\n");
+  EXPECT_EQ(formattedText("\b%@ %ld\n", {title, 1}, platform::ControlCharacters::kAreReplaced),
+            "\ba\uFFFD[2Jb\uFFFD 1\n");
+  EXPECT_EQ(formattedText("%@", {}, platform::ControlCharacters::kAreReplaced), "(null)");
+}
+
 TEST(FormattedTextTest, InsertsIntegers) {
   EXPECT_EQ(formattedText("%ld %ld", {0, -7}), "0 -7");
   EXPECT_EQ(formattedText("%ld", {std::numeric_limits<std::int64_t>::min()}),

@@ -19,7 +19,7 @@ extern "C" const char* __tsan_default_options() {
 namespace platform {
 namespace {
 
-constexpr std::size_t kTooMuch = PTRDIFF_MAX;
+constexpr std::size_t kTooMuch = SIZE_MAX;
 
 // Called twice, it gives up, which lets the caller see the refusal.
 int calls = 0;

@@ -1,0 +1,2 @@
+# Bash completion for qel-check.
+complete -o default qel-check

@@ -1,0 +1,2 @@
+# Fish completion for qel-check.
+complete -c qel-check

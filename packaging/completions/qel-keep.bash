@@ -1,0 +1,2 @@
+# Bash completion for qel-keep.
+complete -o default qel-keep

@@ -1,0 +1,2 @@
+# Fish completion for qel-keep.
+complete -c qel-keep

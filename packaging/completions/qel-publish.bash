@@ -1,0 +1,2 @@
+# Bash completion for qel-publish.
+complete -o default qel-publish

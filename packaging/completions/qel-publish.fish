@@ -1,0 +1,2 @@
+# Fish completion for qel-publish.
+complete -c qel-publish
