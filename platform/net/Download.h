@@ -30,11 +30,11 @@ struct DownloadOptions {
   /// The name, in the destination's directory, of the file that holds the bytes until they are all
   /// there. It is left there when the download fails or the process ends, so that another can go on
   /// from it. Empty: a hidden name that no failure leaves behind.
-  std::string partName;
+  std::string partName = {};
   /// The validator of the answer that the part there came from. With it, only the rest is asked
   /// for; the download goes on behind the part where the server proves the file to be the same, and
   /// from the start otherwise. Empty, and where the place is a path: from the start.
-  std::string partValidator;
+  std::string partValidator = {};
   /// The seconds without a byte after which the download fails (domain "transfer", code 28), from
   /// the connecting on; 0 for no limit.
   int stallLimit = 0;

@@ -234,12 +234,13 @@ std::optional<URL> URL::resolved(std::string_view reference) const {
   const std::optional<Components> target = componentsOf(text);
   if (!target) return std::nullopt;
   const std::size_t pathStart = static_cast<std::size_t>(target->path.data() - text.data());
-  const std::string_view tail = std::string_view(text).substr(pathStart);
-  return parse(text.substr(0, pathStart) + percentEncoded(tail, [&](const char& c) {
+  std::string tail;
+  for (std::size_t i = pathStart; i < text.size(); ++i) {
+    tail += text[i];
+    if (text[i] == '%' && !isPercentTriplet(text, i)) tail += "25";
+  }
+  return parse(text.substr(0, pathStart) + percentEncoded(tail, [](char c) {
                  constexpr std::string_view kNotAllowed = " <>\"{}|\\^`[]";
-                 if (c == '%') {
-                   return isPercentTriplet(tail, static_cast<std::size_t>(&c - tail.data()));
-                 }
                  return isASCII(c) && kNotAllowed.find(c) == std::string_view::npos;
                }));
 }
