@@ -134,6 +134,10 @@ bool isWellFormed(const Authority& authority) {
 /// ICU takes it as the UTF-8 that it is.
 std::optional<std::string> hostInASCII(std::string_view host) {
   if (isASCII(host)) return std::string(host);
+  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond that
+  // ICU, whose time to put combining marks in order grows with their square, is not asked.
+  constexpr std::size_t kLongestHost = 1024;
+  if (host.size() > kLongestHost) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
   const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
