@@ -327,11 +327,11 @@ TEST(XMLParserTest, ADocumentThatCannotBeReadIsAFaultWithThatCause) {
     std::optional<XMLFault> fault;
     EXPECT_FALSE(XMLParser(sourceOf(std::string(document), 100, true), recorder).parse(fault));
     EXPECT_EQ(fault->record(), (ErrorRecord{"test", 1, "no more"})) << document;
+    EXPECT_EQ(fault->description, "no more") << document;
   }
 }
 
 constexpr const char* kTooLong = "a tag or text too long for the parser at line ";
-
 TEST(XMLParserTest, WhatTheLibraryCannotHoldIsAFault) {
   constexpr std::size_t kTooMuch = 2'147'000'000;  // for its buffer; it need not come
   std::optional<XMLFault> fault;
