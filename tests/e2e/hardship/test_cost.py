@@ -50,8 +50,9 @@ class BoundsTest(unittest.TestCase):
             with self.subTest(work), unittest.mock.patch.object(cost, "work_of", lambda family, work=work: work):
                 self.notes.clear()
                 self.assertEqual(len(self.faults_of(1.5, outgrows_caches=True)), found)
-                self.assertEqual(self.notes, [f"some: {work} times the instructions for 8 times the size" if work else
-                                              'Skipped, since nothing counts instructions here: why "some" are so slow.'])
+                note = (f"some: {work} times the instructions for 8 times the size" if work else
+                        'Skipped, since nothing counts instructions here: why "some" are so slow.')
+                self.assertEqual(self.notes, [note])
 
     def test_memory_beyond_the_multiple_is_a_fault(self):
         self.assertEqual(self.faults_of(1, ALLOWANCE + 3200), [])

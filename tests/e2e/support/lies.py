@@ -263,7 +263,7 @@ LIES = {
             Cause("not well-formed (invalid token) at line 1, column *"), PACKED),
         Lie("a name that is no coding", coded("utf-8", BODY)),
         Lie("100 MiB of zeros in 100 KiB", coded("gzip", BOMB),
-            Cause("The body is more than 100 times as large as its compressed form"), BOMB),
+            Cause("The body is more than 50 times as large as its compressed form"), BOMB),
     ),
     "Headers": (
         Lie("bare line feeds", answer(length(SIZE)).replace(b"\r\n", b"\n", 3)),
