@@ -136,7 +136,10 @@ bool isWellFormed(const Authority& authority) {
 std::optional<std::string> hostInASCII(std::string_view writtenHost) {
   const std::string host = percentDecoded(writtenHost);
   if (isASCII(host)) return std::string(writtenHost);
-  if (!hasAcceptableCharacters(host)) return std::nullopt;
+  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond that
+  // ICU, whose time to put combining marks in order grows with their square, is not asked.
+  constexpr std::size_t kLongestHost = 1024;
+  if (host.size() > kLongestHost || !hasAcceptableCharacters(host)) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
   const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
