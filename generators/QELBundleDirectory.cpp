@@ -7,6 +7,7 @@
 #include "generators/QELBundleNames.h"
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
+#include "platform/files/RegularFile.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListWriter.h"
@@ -46,8 +47,16 @@ std::optional<platform::Dictionary> QELBundleDirectory::readReferenceFile(const 
   std::optional<platform::PropertyListFault> fault;
   const auto value = platform::readPropertyList(std::move(*bytes), fault);
   if (value && value->asDictionary()) return *value->asDictionary();
-  error = QELError(1, fault ? fault->description : "no dictionary at its root");
+  error = QELError(1, "Info.plist: " + (fault ? fault->description : "no dictionary at its root"));
   return std::nullopt;
+}
+
+std::optional<std::uint64_t> QELBundleDirectory::sizeOfFile(
+    const std::string& path, const platform::OptionalText& reference) {
+  if (!reference || reference->empty()) return std::nullopt;
+  ErrorSlot ignored;
+  const auto file = platform::RegularFile::open(platform::joinedPath(path, *reference), ignored);
+  return file && file->size() > 0 ? std::optional(file->size()) : std::nullopt;
 }
 
 std::optional<FilePlace> QELBundleDirectory::mediaPlace(const std::string& name) const {

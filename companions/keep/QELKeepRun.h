@@ -25,7 +25,6 @@ class QELKeepRun {
  private:
   void say(const std::string& line);
   bool write(QELBundleDirectory& directory);
-  void draw(const QELTransfers& transfers, std::size_t endedCount);
   int conclude(bool isWritten);
 
   const QELCommandLine& commandLine_;

@@ -8,7 +8,6 @@
 #include "model/QELEpisodeMatching.h"
 #include "model/QELPodcastKeys.h"
 #include "platform/files/Paths.h"
-#include "platform/files/RegularFile.h"
 #include "platform/text/FormattedText.h"
 
 namespace {
@@ -51,24 +50,14 @@ QELKeptShow::QELKeptShow(const Dictionary& kept, const QELBundleDirectory& direc
   }
 }
 
-/// Absent for a file that is not there; an empty one is as good as none.
-std::optional<std::uint64_t> QELKeptShow::sizeOf(const OptionalText& reference) const {
-  if (!reference || reference->empty()) return std::nullopt;
-  platform::ErrorSlot ignored;
-  const auto file = platform::RegularFile::open(platform::joinedPath(path_, *reference), ignored);
-  return file && file->size() > 0 ? std::optional(file->size()) : std::nullopt;
-}
-
 void QELKeptShow::update(const QELPodcastSource& source, const std::string& origin,
                          const std::vector<bool>& isWanted, bool allowsLocalFiles) {
   allowsLocalFiles_ = allowsLocalFiles;
   static const QELEpisodeList none;
   const QELEpisodeList& episodes = source.episodes() ? *source.episodes() : none;
-  std::vector<QELEpisodeIdentity> identities;
-  for (const auto& episode : episodes) identities.push_back(QELIdentityOf(*episode));
-  std::vector<QELEpisodeIdentity> keptIdentities;
-  for (const Entry& entry : entries_) keptIdentities.push_back(QELIdentityOf(entry.dictionary));
-  const auto matches = QELMatchedEpisodes(identities, keptIdentities);
+  std::vector<QELEpisodeIdentity> kept;
+  for (const Entry& entry : entries_) kept.push_back(QELIdentityOf(entry.dictionary));
+  const auto matches = QELMatchedEpisodes(QELIdentitiesOf(episodes), kept);
   std::vector<bool> isCurrent(entries_.size());
   for (const auto& match : matches) {
     if (match) isCurrent[*match] = true;
@@ -102,14 +91,23 @@ void QELKeptShow::update(const QELPodcastSource& source, const std::string& orig
     updated.push_back(std::move(entries_[index]));
   }
   entries_ = std::move(updated);
-  collectFetches();
+
+  std::set<const QELFetch*> collected;  // posters may be shared
+  const auto collect = [&](const std::shared_ptr<QELFetch>& fetch) {
+    if (fetch && collected.insert(fetch.get()).second) fetches_.push_back(fetch);
+  };
+  collect(podcast_.poster);
+  for (const Entry& entry : entries_) {
+    collect(entry.media);
+    collect(entry.poster);
+  }
 }
 
 /// Notes what is there of an entry, and which names that leaves. One that is gone is to have its
 /// name again, where the source has it.
 void QELKeptShow::noteFiles(Entry& entry, bool isCurrent) {
   const OptionalText reference = platform::textForKey(entry.dictionary, "EpisodeReference");
-  const std::optional<std::uint64_t> size = sizeOf(reference);
+  const auto size = QELBundleDirectory::sizeOfFile(path_, reference);
   if (size) {
     entry.file = Entry::File::kThere;
     entry.dictionary.insert_or_assign("EpisodeFileSize", *size);
@@ -123,7 +121,8 @@ void QELKeptShow::notePoster(const Entry& entry, const std::string& prefix) {
   if (!reference) return;
   posterNames_.take(platform::lastPathComponent(*reference));
   const OptionalText origin = platform::textForKey(entry.dictionary, prefix + "PosterOrigin");
-  if (origin && sizeOf(reference)) posters_.emplace(origin->view(), reference->view());
+  if (origin && QELBundleDirectory::sizeOfFile(path_, reference))
+    posters_.emplace(origin->view(), reference->view());
 }
 
 /// Takes over what the source says; what it does not say stays.
@@ -171,7 +170,8 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
   const std::string originKey = prefix + "PosterOrigin";
   const std::string origin = poster.location->string();
   const OptionalText oldOrigin = platform::textForKey(entry.dictionary, originKey);
-  const bool isThere = sizeOf(platform::textForKey(entry.dictionary, key)).has_value();
+  const OptionalText old = platform::textForKey(entry.dictionary, key);
+  const bool isThere = QELBundleDirectory::sizeOfFile(path_, old).has_value();
   if (isThere && (!oldOrigin || *oldOrigin == origin)) {
     entry.dictionary.insert_or_assign(originKey, origin);
   } else if (const auto found = posters_.find(origin); found != posters_.end()) {
@@ -208,18 +208,6 @@ std::shared_ptr<QELFetch> QELKeptShow::makeFetch(std::string title,
     fetch->refuse("The bundle cannot have it");
   }
   return fetch;
-}
-
-void QELKeptShow::collectFetches() {
-  std::set<const QELFetch*> collected;
-  const auto collect = [&](const std::shared_ptr<QELFetch>& fetch) {
-    if (fetch && collected.insert(fetch.get()).second) fetches_.push_back(fetch);
-  };
-  collect(podcast_.poster);
-  for (const Entry& entry : entries_) {
-    collect(entry.media);
-    collect(entry.poster);
-  }
 }
 
 Dictionary QELKeptShow::dictionary() const {

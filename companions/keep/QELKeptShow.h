@@ -1,7 +1,6 @@
 #pragma once
 
 #include <cstddef>
-#include <cstdint>
 #include <map>
 #include <memory>
 #include <optional>
@@ -59,7 +58,6 @@ class QELKeptShow {
     std::shared_ptr<QELFetch> poster;  // likewise; may be that of several entries
   };
 
-  std::optional<std::uint64_t> sizeOf(const platform::OptionalText& reference) const;
   void noteFiles(Entry& entry, bool isCurrent);
   void notePoster(const Entry& entry, const std::string& prefix);
   void updateEntry(Entry& entry, const QELEpisode& episode);
@@ -69,7 +67,6 @@ class QELKeptShow {
   std::shared_ptr<QELFetch> makeFetch(std::string title, const QELMediaReference& reference,
                                       const std::optional<platform::FilePlace>& place,
                                       bool hasPart);
-  void collectFetches();
 
   const QELBundleDirectory& directory_;
   const std::string& path_;
