@@ -3,7 +3,6 @@
 #include <string_view>
 #include <utility>
 
-#include "cli/common/QELError.h"
 #include "generators/QELBundleNames.h"
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
@@ -23,7 +22,7 @@ bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error, Directo
   if (!opened) return false;
   bundle_ = std::move(*opened);
   if (bundle_.lock(wait) == Directory::Lock::kHeldByAnother) {
-    error = QELError(2, "Another run is filling it");
+    error = platform::ErrorRecord{"QELDomain", 2, "Another run is filling it"};
     return false;
   }
   platform::removeStaleTemporaryFiles(bundle_);
@@ -47,7 +46,8 @@ std::optional<platform::Dictionary> QELBundleDirectory::readReferenceFile(const 
   std::optional<platform::PropertyListFault> fault;
   const auto value = platform::readPropertyList(std::move(*bytes), fault);
   if (value && value->asDictionary()) return *value->asDictionary();
-  error = QELError(1, "Info.plist: " + (fault ? fault->description : "no dictionary at its root"));
+  const std::string cause = fault ? fault->description : "no dictionary at its root";
+  error = platform::ErrorRecord{"QELDomain", 1, "Info.plist: " + cause};
   return std::nullopt;
 }
 
