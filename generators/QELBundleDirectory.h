@@ -36,6 +36,7 @@ class QELBundleDirectory {
             platform::Directory::Wait wait = platform::Directory::Wait::kForever);
 
   const platform::Directory& directory() const { return bundle_; }
+  const platform::Directory& posters() const { return posters_; }
 
   /// The reference dictionary of the bundle at the path, empty where there is none yet. Absent, and
   /// the slot filled, when it cannot be read.

@@ -75,7 +75,7 @@ int keep(const QELCommandLine& arguments, const Options& options) {
               options.allowsLocalFiles || !QELIsOnNetwork(name));
   QELKeepRun run(arguments, show, std::move(*kept), options.isQuiet);
   if (options.isRehearsal) return run.rehearse();
-  return run.fetch(directory, path, QELTransfers(options.jobs, options.stallLimit));
+  return run.fetch(directory, QELTransfers(options.jobs, options.stallLimit));
 }
 
 }  // namespace

@@ -4,7 +4,6 @@
 #include <utility>
 #include <vector>
 
-#include "companions/transfers/QELPart.h"
 #include "platform/files/EndingSignals.h"
 #include "platform/files/StandardStreams.h"
 #include "platform/files/Terminal.h"
@@ -49,8 +48,7 @@ int QELKeepRun::rehearse() {
   return kAllWell;
 }
 
-int QELKeepRun::fetch(QELBundleDirectory& directory, const std::string& path,
-                      QELTransfers transfers) {
+int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   platform::EndingSignals signals;
   for (const auto& fetch : show_.fetches()) transfers.add(fetch);
   Clock::time_point lastWriting = Clock::now();
@@ -72,7 +70,7 @@ int QELKeepRun::fetch(QELBundleDirectory& directory, const std::string& path,
   if (platform::EndingSignals::hasCome()) commandLine_.report("interrupted; the next run goes on");
   const int status = conclude(isWritten);
   signals.passOn();
-  if (status == kAllWell) QELPart::removeAll(directory.directory(), path);
+  if (status == kAllWell) show_.removeParts();
   return status;
 }
 
@@ -86,6 +84,9 @@ bool QELKeepRun::write(QELBundleDirectory& directory) {
     return false;
   }
   written_ = std::move(dictionary);
+  for (const auto& fetch : show_.fetches()) {
+    if (fetch->state() == QELFetch::State::kDone) fetch->forgetPart();
+  }
   return true;
 }
 

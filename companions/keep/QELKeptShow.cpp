@@ -40,7 +40,9 @@ bool isDone(const std::shared_ptr<QELFetch>& fetch) {
 
 QELKeptShow::QELKeptShow(const Dictionary& kept, const QELBundleDirectory& directory,
                          const std::string& path)
-    : directory_(directory), path_(path) {
+    : directory_(directory),
+      path_(path),
+      postersPath_(platform::joinedPath(path, QELBundleDirectory::kPostersName)) {
   podcast_.dictionary = kept;
   podcast_.dictionary.erase("Episodes");
   const PropertyListValue* episodes = platform::valueForKey(kept, "Episodes");
@@ -66,7 +68,7 @@ void QELKeptShow::update(const QELPodcastSource& source, const std::string& orig
   mediaNames_.take(QELBundleDirectory::kReferenceFileName);
   mediaNames_.take(QELBundleDirectory::kPostersName);
   mediaNames_.takeAllOf(path_);
-  posterNames_.takeAllOf(platform::joinedPath(path_, QELBundleDirectory::kPostersName));
+  posterNames_.takeAllOf(postersPath_);
   notePoster(podcast_, "Podcast");
   for (std::size_t index = 0; index < entries_.size(); ++index) {
     noteFiles(entries_[index], isCurrent[index]);
@@ -142,7 +144,7 @@ void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
     const std::string old = reference ? reference->string() : QELFileName(media).value_or("");
     const std::string base = QELBaseName(platform::lastPathComponent(old));
     const std::string name = mediaNames_.reserve(base, platform::pathExtension(old));
-    entry.media = makeFetch(title, media, directory_.mediaPlace(name), true);
+    entry.media = makeFetch(title, media, directory_.mediaPlace(name), path_);
     reference = name;
   } else if (reference) {
     lose(entry);
@@ -182,7 +184,7 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
     if (!fetch) {
       const std::string extension(platform::pathExtension(QELFileName(poster).value_or("")));
       const std::string name = posterNames_.reserve(baseName, extension);
-      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), false);
+      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), postersPath_);
     }
     entry.poster = fetch;
   }
@@ -191,11 +193,11 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
 std::shared_ptr<QELFetch> QELKeptShow::makeFetch(std::string title,
                                                  const QELMediaReference& reference,
                                                  const std::optional<platform::FilePlace>& place,
-                                                 bool hasPart) {
+                                                 const std::string& folder) {
   const bool isLocal = !reference.isRemote || (reference.url && reference.url->scheme() == "file");
   std::unique_ptr<QELPart> part;
-  if (hasPart && !isLocal && reference.url) {
-    part = std::make_unique<QELPart>(directory_.directory(), path_, reference.url->encodedText());
+  if (place && !isLocal && reference.url) {
+    part = std::make_unique<QELPart>(*place->directory, folder, reference.url->encodedText());
     if (!partNames_.insert(part->name()).second) part.reset();
   }
   auto fetch = std::make_shared<QELFetch>(std::move(title), reference,
@@ -233,6 +235,11 @@ Dictionary QELKeptShow::dictionary() const {
   }
   if (!episodes.empty()) whole.insert_or_assign("Episodes", std::move(episodes));
   return whole;
+}
+
+void QELKeptShow::removeParts() const {
+  QELPart::removeAll(directory_.directory(), path_);
+  QELPart::removeAll(directory_.posters(), postersPath_);
 }
 
 std::size_t QELKeptShow::newCount() const {

@@ -45,6 +45,9 @@ class QELKeptShow {
   /// The titles of the kept episodes whose file is gone and cannot be had again.
   const std::vector<std::string>& lostTitles() const { return lostTitles_; }
 
+  /// Removes the parts that earlier runs left, whosever they are.
+  void removeParts() const;
+
   /// The reference dictionary of this moment. It lists what is whole, and what was lost: nothing
   /// else would tell of that.
   platform::Dictionary dictionary() const;
@@ -66,10 +69,11 @@ class QELKeptShow {
   void lose(Entry& entry);
   std::shared_ptr<QELFetch> makeFetch(std::string title, const QELMediaReference& reference,
                                       const std::optional<platform::FilePlace>& place,
-                                      bool hasPart);
+                                      const std::string& folder);
 
   const QELBundleDirectory& directory_;
   const std::string& path_;
+  std::string postersPath_;
   bool allowsLocalFiles_ = false;
   QELFreeNames mediaNames_;
   QELFreeNames posterNames_;

@@ -20,7 +20,8 @@ class QELFetch : private platform::DownloadReceiver {
   enum class State { kWaiting, kRunning, kDone, kFailed };
 
   /// `title` says what it is, for people. With a part, a download goes on from it and leaves it
-  /// behind when it fails. What the place refers to must outlive this.
+  /// behind when it fails; and a file that an earlier run had no time to list is taken as it is.
+  /// What the place refers to must outlive this.
   QELFetch(std::string title, QELMediaReference reference, platform::FilePlace place,
            std::unique_ptr<QELPart> part);
 
@@ -31,6 +32,8 @@ class QELFetch : private platform::DownloadReceiver {
   void start(int stallLimit);
   /// Ends the running try; its part stays.
   void cancel();
+  /// Says that the file, which is done, has been listed.
+  void forgetPart();
 
   State state() const { return state_; }
   /// While it waits, when the next try is due.
@@ -53,6 +56,7 @@ class QELFetch : private platform::DownloadReceiver {
   void downloadDidFinish(platform::Download& download) override;
   void didFailWithError(platform::Download& download, const platform::ErrorRecord& error) override;
 
+  void keepPart() const;
   void finish();
 
   QELMediaReference reference_;

@@ -68,6 +68,8 @@ class InterruptedTest(KeepTestCase):
             self.assertEqual(self.listed(), list(bodies))
             self.assertListedIsWhole(bodies)
             self.assertNothingHidden()
+            self.assertEqual(sorted(self.listed("EpisodeReference")), sorted(f"{number}.mp3" for number in range(12)))
+            self.assertEqual(len(list(self.bundle.glob("*.mp3"))), len(bodies))
 
     def test_a_signal_ends_a_run_in_order(self):
         for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):
