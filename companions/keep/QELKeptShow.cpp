@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <set>
 #include <utility>
 
 #include "generators/QELBundleNames.h"
@@ -66,7 +67,6 @@ void QELKeptShow::update(const QELPodcastSource& source, const std::string& orig
   }
 
   mediaNames_.take(QELBundleDirectory::kReferenceFileName);
-  mediaNames_.take(QELBundleDirectory::kPostersName);
   mediaNames_.takeAllOf(path_);
   posterNames_.takeAllOf(postersPath_);
   notePoster(podcast_, "Podcast");
@@ -123,8 +123,8 @@ void QELKeptShow::notePoster(const Entry& entry, const std::string& prefix) {
   if (!reference) return;
   posterNames_.take(platform::lastPathComponent(*reference));
   const OptionalText origin = platform::textForKey(entry.dictionary, prefix + "PosterOrigin");
-  if (origin && QELBundleDirectory::sizeOfFile(path_, reference))
-    posters_.emplace(origin->view(), reference->view());
+  if (!origin || !QELBundleDirectory::sizeOfFile(path_, reference)) return;
+  posters_.emplace(origin->view(), reference->view());
 }
 
 /// Takes over what the source says; what it does not say stays.
@@ -190,24 +190,14 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
   }
 }
 
-std::shared_ptr<QELFetch> QELKeptShow::makeFetch(std::string title,
+std::shared_ptr<QELFetch> QELKeptShow::makeFetch(const std::string& title,
                                                  const QELMediaReference& reference,
                                                  const std::optional<platform::FilePlace>& place,
-                                                 const std::string& folder) {
+                                                 const std::string& folder) const {
+  auto fetch = std::make_shared<QELFetch>(title, reference, place, folder);
   const bool isLocal = !reference.isRemote || (reference.url && reference.url->scheme() == "file");
-  std::unique_ptr<QELPart> part;
-  if (place && !isLocal && reference.url) {
-    part = std::make_unique<QELPart>(*place->directory, folder, reference.url->encodedText());
-    if (!partNames_.insert(part->name()).second) part.reset();
-  }
-  auto fetch = std::make_shared<QELFetch>(std::move(title), reference,
-                                          place.value_or(platform::FilePlace("")), std::move(part));
   if (isLocal && !allowsLocalFiles_) {
     fetch->refuse("A feed of the network names a local file, see --allow-local");
-  } else if (reference.isRemote && !reference.url) {
-    fetch->refuse("It is no valid URL");
-  } else if (!place) {
-    fetch->refuse("The bundle cannot have it");
   }
   return fetch;
 }

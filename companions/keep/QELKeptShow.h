@@ -4,7 +4,6 @@
 #include <map>
 #include <memory>
 #include <optional>
-#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -67,9 +66,9 @@ class QELKeptShow {
   void updatePoster(Entry& entry, const std::string& prefix, const QELMediaReference& poster,
                     const std::string& title, std::string_view baseName);
   void lose(Entry& entry);
-  std::shared_ptr<QELFetch> makeFetch(std::string title, const QELMediaReference& reference,
+  std::shared_ptr<QELFetch> makeFetch(const std::string& title, const QELMediaReference& reference,
                                       const std::optional<platform::FilePlace>& place,
-                                      const std::string& folder);
+                                      const std::string& folder) const;
 
   const QELBundleDirectory& directory_;
   const std::string& path_;
@@ -77,7 +76,6 @@ class QELKeptShow {
   bool allowsLocalFiles_ = false;
   QELFreeNames mediaNames_;
   QELFreeNames posterNames_;
-  std::set<std::string> partNames_;             // each is given to one fetch
   std::map<std::string, std::string> posters_;  // references of those that are there, by origins
   std::map<std::string, std::shared_ptr<QELFetch>> newPosters_;  // by origins
   Entry podcast_;

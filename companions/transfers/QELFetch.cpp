@@ -7,10 +7,17 @@
 using platform::Download;
 using platform::ErrorSlot;
 
-QELFetch::QELFetch(std::string title, QELMediaReference reference, platform::FilePlace place,
-                   std::unique_ptr<QELPart> part)
-    : reference_(std::move(reference)), place_(std::move(place)), part_(std::move(part)) {
+QELFetch::QELFetch(std::string title, QELMediaReference reference,
+                   const std::optional<platform::FilePlace>& place, const std::string& folder)
+    : reference_(std::move(reference)), place_(place.value_or(platform::FilePlace(""))) {
   progress_.title = std::move(title);
+  if (!place) {
+    refuse("There is no place for it");
+  } else if (reference_.isRemote && !reference_.url) {
+    refuse("It is no valid URL");
+  } else if (reference_.isRemote && reference_.url->scheme() != "file") {
+    part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText());
+  }
 }
 
 void QELFetch::refuse(const std::string& cause) {

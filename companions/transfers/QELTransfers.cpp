@@ -21,6 +21,8 @@ QELTransfers::QELTransfers(std::int64_t jobs, std::int64_t stallLimit)
           static_cast<int>(std::min<std::int64_t>(stallLimit, std::numeric_limits<int>::max()))) {}
 
 void QELTransfers::add(std::shared_ptr<QELFetch> fetch) {
+  // Two of one URL may run at once.
+  if (!partNames_.insert(fetch->partName()).second) fetch->forgoPart();
   queue_.push_back(std::move(fetch));
   ++count_;
 }

@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <deque>
 #include <memory>
+#include <set>
+#include <string>
 #include <vector>
 
 #include "companions/transfers/QELFetch.h"
@@ -38,6 +40,7 @@ class QELTransfers {
   std::deque<std::shared_ptr<QELFetch>> queue_;
   Fetches later_;  // for another try
   Fetches running_;
+  std::set<std::string> partNames_;
   std::size_t count_ = 0;
   std::size_t endedCount_ = 0;
 };

@@ -52,7 +52,7 @@ class NamesTest(KeepTestCase):
         poster = self.web.serve("/poster.png", b"poster")
         self.publish(self.episode(1, element("orvane:image", href=poster)))
         self.assertKept(self.keep(), "1 new, 0 known, 1 failed", 1,
-                        f'qel-keep: poster of "Episode 1": {poster}: The bundle cannot have it\n')
+                        f'qel-keep: poster of "Episode 1": {poster}: There is no place for it\n')
         self.assertEqual(list(elsewhere.iterdir()), [])
         self.media(1)
 
