@@ -46,7 +46,7 @@ TEST_F(QELPartTest, ANoteOfAnotherURLOrAnotherStartVouchesForNothing) {
   one.note("\"tag\"", "1.mp3", 5);
   const std::string note = ".qel-keep-c928878f7227f43d.note";
   std::string content = contentOf(root_ / note);
-  write(note, "x" + content);
+  write(note, std::string("x").append(content));
   EXPECT_EQ(one.validator(), "");
   write(note, content);
   EXPECT_EQ(one.validator(), "\"tag\"");
