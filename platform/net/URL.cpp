@@ -24,13 +24,14 @@ bool isPercentTriplet(std::string_view text, std::size_t at) {
 }
 
 /// The text with all bytes percent-encoded but those that the predicate keeps, behind a beginning.
+/// The predicate is asked more than once, each time with a reference into the text.
 template <typename Predicate>
 std::string percentEncoded(std::string_view text, Predicate isKept, std::string_view start = {}) {
   const auto keptCount = std::count_if(text.begin(), text.end(), isKept);
   std::string encoded;
   encoded.reserve(start.size() + 3 * text.size() - 2 * static_cast<std::size_t>(keptCount));
   encoded = start;
-  for (const char c : text) {
+  for (const char& c : text) {
     if (isKept(c)) {
       encoded += c;
       continue;
@@ -233,12 +234,13 @@ std::optional<URL> URL::resolved(std::string_view reference) const {
   const std::optional<Components> target = componentsOf(text);
   if (!target) return std::nullopt;
   const std::size_t pathStart = static_cast<std::size_t>(target->path.data() - text.data());
-  const std::string_view tail = std::string_view(text).substr(pathStart);
-  std::size_t position = 0;
-  return parse(text.substr(0, pathStart) + percentEncoded(tail, [&](char c) {
+  std::string tail;
+  for (std::size_t i = pathStart; i < text.size(); ++i) {
+    tail += text[i];
+    if (text[i] == '%' && !isPercentTriplet(text, i)) tail += "25";
+  }
+  return parse(text.substr(0, pathStart) + percentEncoded(tail, [](char c) {
                  constexpr std::string_view kNotAllowed = " <>\"{}|\\^`[]";
-                 const std::size_t at = position++;
-                 if (c == '%') return isPercentTriplet(tail, at);
                  return isASCII(c) && kNotAllowed.find(c) == std::string_view::npos;
                }));
 }
