@@ -87,12 +87,12 @@ void FeedParser::didStartElement(const platform::XMLName& name,
     parsingImage_ = true;
     if (isOfDirectory(name)) {
       if (const auto href = attributes.value("href")) {
-        target().insert_or_assign("poster"_text, Text(*href));
+        take(target(), "poster"_text, Text(*href));
       }
     }
   } else if (name.local == "category" && isOfDirectory(name)) {
     // The first category wins: later ones and nested subcategories find the key taken.
-    if (const auto text = attributes.value("text")) target().emplace("category"_text, Text(*text));
+    if (const auto text = attributes.value("text")) takeFirst("category"_text, *text);
   }
 
   const auto* const end = RSScdataElements.end();
@@ -122,7 +122,7 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (local == "image") {
     parsingImage_ = false;
   } else if (local == "url") {
-    if (parsingImage_) target().emplace("poster"_text, Text(std::string_view(cdataBuffer_)));
+    if (parsingImage_) takeFirst("poster"_text, cdataBuffer_);
     emptyBuffer();
   } else if (local == "link") {
     readLink();
@@ -151,30 +151,30 @@ void FeedParser::endItem() {
 void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
   if (!currentEpisode_) return;
   if (const auto url = attributes.value("url")) {
-    currentEpisode_->insert_or_assign("url"_text, Text(*url));
+    take(*currentEpisode_, "url"_text, Text(*url));
   }
   if (const auto length = attributes.value("length")) {
     const std::int64_t number = platform::leadingInteger(*length);
-    if (number > 0) currentEpisode_->insert_or_assign("contentLength"_text, number);
+    if (number > 0) take(*currentEpisode_, "contentLength"_text, number);
   }
   if (const auto type = attributes.value("type")) {
-    currentEpisode_->insert_or_assign("contentType"_text, Text(*type));
+    take(*currentEpisode_, "contentType"_text, Text(*type));
   }
 }
 
 void FeedParser::readAdvisoryLabel() {
   const std::string label = platform::lowercased(cdataBuffer_);
   if (label == "yes") {
-    target().insert_or_assign("advisoryLabel"_text, "Explicit"_text);
+    take(target(), "advisoryLabel"_text, "Explicit"_text);
   } else if (label == "clean") {
-    target().insert_or_assign("advisoryLabel"_text, "Clean"_text);
+    take(target(), "advisoryLabel"_text, "Clean"_text);
   }
   emptyBuffer();
 }
 
 void FeedParser::readDate() {
   if (const auto date = dateWithRFC822String(cdataBuffer_)) {
-    target().insert_or_assign("date"_text, *date);
+    take(target(), "date"_text, *date);
   }
   emptyBuffer();
 }
@@ -183,14 +183,23 @@ void FeedParser::readDate() {
 /// buffer is not emptied.
 void FeedParser::readLink() {
   if (const auto uuid = leadingUuid(documentMarker_.textBehindMarker(cdataBuffer_))) {
-    if (currentEpisode_) currentEpisode_->insert_or_assign("QELUUID"_text, Text(*uuid));
+    if (currentEpisode_) take(*currentEpisode_, "QELUUID"_text, Text(*uuid));
   } else if (const auto feedUuid = leadingUuid(collectionMarker_.textBehindMarker(cdataBuffer_))) {
-    feedAttributes_.insert_or_assign("QELUUID"_text, Text(*feedUuid));
+    take(feedAttributes_, "QELUUID"_text, Text(*feedUuid));
   }
 }
 
+void FeedParser::take(Dictionary& target, const Text& key, platform::PropertyListValue value) {
+  target.insert_or_assign(key, std::move(value));
+}
+
+void FeedParser::takeFirst(const Text& key, std::string_view value) {
+  const Dictionary& taken = target();
+  if (taken.find(key) == taken.end()) take(target(), key, Text(value));
+}
+
 void FeedParser::takeText(const Text& key) {
-  target().insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
+  take(target(), key, Text(std::string_view(cdataBuffer_)));
   emptyBuffer();
 }
 

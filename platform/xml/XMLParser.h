@@ -100,6 +100,10 @@ class XMLParser {
   /// this fault, at the place of the event.
   void abort(std::string description);
 
+  /// Where the event stands that is being delivered: a tag where its "<" does. To be asked from
+  /// inside of an event only; each answer counts the lines since the one before.
+  TextPosition position() const;
+
  private:
   struct Run;
 
