@@ -59,9 +59,8 @@ std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(
 }
 
 bool FeedParser::parseWithError(platform::ErrorSlot& error) {
-  std::optional<platform::XMLFault> fault;
-  if (!feedParser_.parse(fault)) {
-    error = fault->record();
+  if (!feedParser_.parse(fault_)) {
+    error = fault_->record();
     return false;
   }
   if (feedType_ == "rss" || feedType_ == "atom") return true;

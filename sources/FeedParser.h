@@ -87,6 +87,8 @@ class FeedParser : private platform::XMLParserEvents {
   std::string_view buffer() const { return cdataBuffer_; }
   /// Where the event stands that is being delivered.
   platform::TextPosition position() const { return feedParser_.position(); }
+  /// What was wrong with the XML.
+  const std::optional<platform::XMLFault>& fault() const { return fault_; }
 
  private:
   /// The first place of a marker in a text that only grows at its end; nothing is searched twice,
@@ -127,5 +129,6 @@ class FeedParser : private platform::XMLParserEvents {
   MarkerSearch collectionMarker_{"collection/uuid/"};
   MarkerSearch documentMarker_{"document/uuid/"};
   platform::XMLParser feedParser_;
+  std::optional<platform::XMLFault> fault_;
   std::optional<std::string> feedType_;
 };
