@@ -80,18 +80,23 @@ void FeedParser::didStartElement(const platform::XMLName& name,
     endItem();
     currentEpisode_ = &episodes_.emplace_back();
     currentEpisode_->reserve(kMostItemKeys);
+    feedParser_.count([](platform::MemoryBudget& budget) { return budget.takeRecords(); });
   } else if (name.local == "enclosure") {
     readEnclosure(attributes);
   } else if (name.local == "image") {
     parsingImage_ = true;
     if (isOfDirectory(name)) {
       if (const auto href = attributes.value("href")) {
+        countField(*href);
         take(target(), "poster"_text, Text(*href));
       }
     }
   } else if (name.local == "category" && isOfDirectory(name)) {
     // The first category wins: later ones and nested subcategories find the key taken.
-    if (const auto text = attributes.value("text")) takeFirst("category"_text, *text);
+    if (const auto text = attributes.value("text")) {
+      countField(*text);
+      takeFirst("category"_text, *text);
+    }
   }
 
   const auto* const end = RSScdataElements.end();
@@ -121,7 +126,10 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (local == "image") {
     parsingImage_ = false;
   } else if (local == "url") {
-    if (parsingImage_) takeFirst("poster"_text, cdataBuffer_);
+    if (parsingImage_) {
+      countField(cdataBuffer_);
+      takeFirst("poster"_text, cdataBuffer_);
+    }
     emptyBuffer();
   } else if (local == "link") {
     readLink();
@@ -150,18 +158,24 @@ void FeedParser::endItem() {
 void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
   if (!currentEpisode_) return;
   if (const auto url = attributes.value("url")) {
+    countField(*url);
     take(*currentEpisode_, "url"_text, Text(*url));
   }
   if (const auto length = attributes.value("length")) {
     const std::int64_t number = platform::leadingInteger(*length);
-    if (number > 0) take(*currentEpisode_, "contentLength"_text, number);
+    if (number > 0) {
+      countField();
+      take(*currentEpisode_, "contentLength"_text, number);
+    }
   }
   if (const auto type = attributes.value("type")) {
+    countField(*type);
     take(*currentEpisode_, "contentType"_text, Text(*type));
   }
 }
 
 void FeedParser::readAdvisoryLabel() {
+  countField();
   const std::string label = platform::lowercased(cdataBuffer_);
   if (label == "yes") {
     take(target(), "advisoryLabel"_text, "Explicit"_text);
@@ -173,6 +187,7 @@ void FeedParser::readAdvisoryLabel() {
 
 void FeedParser::readDate() {
   if (const auto date = dateWithRFC822String(cdataBuffer_)) {
+    countField();
     take(target(), "date"_text, *date);
   }
   emptyBuffer();
@@ -182,6 +197,7 @@ void FeedParser::readDate() {
 /// buffer is not emptied.
 void FeedParser::readLink() {
   if (const auto uuid = leadingUuid(documentMarker_.textBehindMarker(cdataBuffer_))) {
+    countField(*uuid);
     if (currentEpisode_) take(*currentEpisode_, "QELUUID"_text, Text(*uuid));
   } else if (const auto feedUuid = leadingUuid(collectionMarker_.textBehindMarker(cdataBuffer_))) {
     take(feedAttributes_, "QELUUID"_text, Text(*feedUuid));
@@ -197,7 +213,14 @@ void FeedParser::takeFirst(const Text& key, std::string_view value) {
   if (taken.find(key) == taken.end()) take(target(), key, Text(value));
 }
 
+void FeedParser::countField(std::string_view text) {
+  feedParser_.count([text](platform::MemoryBudget& budget) {
+    return budget.takeFields() && budget.takeWritten(text);
+  });
+}
+
 void FeedParser::takeText(const Text& key) {
+  countField(cdataBuffer_);
   take(target(), key, Text(std::string_view(cdataBuffer_)));
   emptyBuffer();
 }

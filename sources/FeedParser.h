@@ -117,6 +117,8 @@ class FeedParser : private platform::XMLParserEvents {
   void takeText(const platform::Text& key);
   /// Takes the value unless the key has one already.
   void takeFirst(const platform::Text& key, std::string_view value);
+  /// Counts a value that is kept, and the characters of a text.
+  void countField(std::string_view text = {});
   void emptyBuffer();
 
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items

@@ -32,7 +32,18 @@ class URL {
   /// The path percent-decoded; may hold any byte, NUL included.
   std::string path() const;
 
+  /// What a reference in this resource, such as a redirect's Location, leads to (RFC 3986, section
+  /// 5.2; dots in the path stay). Servers send more than the grammar allows, and clients take it:
+  /// what a path or query may not hold is percent-encoded, but for control characters. A fragment
+  /// is left out. Absent where no valid URL comes of it.
+  std::optional<URL> resolved(std::string_view reference) const;
+  /// Makes user and password those of the other URL, where this one names none and leads to the
+  /// same scheme, host and port.
+  void adoptUserOf(const URL& other);
+
  private:
+  std::string origin() const;
+
   std::string encodedText_;
   std::string scheme_;
   std::string encodedPath_;
@@ -41,8 +52,11 @@ class URL {
 /// The text percent-decoded: "%41" gives "A". A "%" without two hexadecimal digits stays.
 std::string percentDecoded(std::string_view text);
 
-/// The file URL of an absolute path ("/a b" gives "file:///a%20b"), every byte percent-encoded that
-/// RFC 3986 does not allow in a path.
+/// The path with every byte percent-encoded that RFC 3986 does not allow in one: "a b/c" gives
+/// "a%20b/c".
+std::string percentEncodedPath(std::string_view path);
+
+/// The file URL of an absolute path: "/a b" gives "file:///a%20b".
 std::string fileURLText(std::string_view absolutePath);
 
 }  // namespace platform

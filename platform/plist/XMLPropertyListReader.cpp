@@ -162,6 +162,9 @@ class Reader final : private XMLParserEvents {
 
   void startValue(const Element& element) {
     const bool isArray = element.kind == Kind::kArray;
+    parser_.count([this](MemoryBudget& budget) {
+      return builder_.isInDictionary() ? budget.takeFields() : budget.takeRecords();
+    });
     if (builder_.hasRoot()) {
       parser_.abort("a second value in a property list");
     } else if (builder_.isInDictionary() && !builder_.hasPendingKey()) {
@@ -195,6 +198,7 @@ class Reader final : private XMLParserEvents {
       if (places_ != nullptr) key_ = key;
       builder_.setKey(std::move(key));
     } else if (Value value = element.value(text_)) {
+      parser_.count([this](MemoryBudget& budget) { return budget.takeWritten(text_); });
       builder_.add(std::move(*value));
       if (places_ != nullptr) endPlace();
     } else {

@@ -3,6 +3,7 @@
 A killed run may leave hidden files, which the next run removes.
 """
 
+import itertools
 import os
 import random
 import re
@@ -22,11 +23,13 @@ class RandomMomentTest(InterruptionTestCase):
 
     SIGNALS = (*ENDING_SIGNALS, signal.SIGPIPE, signal.SIGKILL)
     TURNS = 40 if soaking() else 3  # for each signal
+    MOST_TURNS = 40
     OLD = b"the output of an earlier run"
 
     def assertInterruptible(self, arguments, prepare, judge):
         """Runs the tool once, and then again and again with a signal. `prepare` is called before each run and `judge`,
-        with the number of the signal that ended it or None, behind it."""
+        with the number of the signal that ended it or None, behind it. `judge` tells whether it found the work half
+        done, which some signal must have brought about: as many as that takes are sent."""
         prepare()
         began = time.monotonic()
         self.assertEqual(self.run_tool(*arguments).status, 0)
@@ -34,8 +37,10 @@ class RandomMomentTest(InterruptionTestCase):
         judge(None)
         seed = random.SystemRandom().randrange(1 << 32)
         moments = random.Random(seed)
-        ended = 0
-        for turn in range(self.TURNS):
+        sent = ended = amid = 0
+        for turn in itertools.count():
+            if turn >= self.TURNS and (amid or turn >= self.MOST_TURNS):
+                break
             for number in self.SIGNALS:
                 with self.subTest(seed=seed, turn=turn, signal=number):
                     prepare()
@@ -45,10 +50,12 @@ class RandomMomentTest(InterruptionTestCase):
                     process.send_signal(number)
                     process.wait(timeout=60)
                     self.assertIn(process.returncode, (0, -number))
-                    judge(number if process.returncode else None)
+                    sent += 1
                     ended += process.returncode != 0
+                    amid += judge(number if process.returncode else None)
         print(f"{self._testMethodName}, {arguments[0]} of {os.path.basename(arguments[1])}: "
-              f"{self.TURNS * len(self.SIGNALS)} signals, of which {ended} ended it", flush=True)
+              f"{sent} signals, of which {ended} ended it, {amid} amid its work", flush=True)
+        self.assertGreater(amid, 0, "no signal met the run at its work")
 
     def assertFileIsWritten(self, command, source):
         expected = self.run_tool(command, source).stdout
@@ -70,6 +77,8 @@ class RandomMomentTest(InterruptionTestCase):
                 self.assertNotEqual(number, signal.SIGPIPE)
                 self.assertTrue(undated(expected).startswith(undated(content)))
             self.assertEqual(sorted(path.name for path in self.directory.iterdir()), self.listing)
+            # What is written takes a moment, what comes before it takes longer.
+            return number is not None and number != signal.SIGPIPE
 
         self.assertInterruptible((command, source, "-d", "out"), prepare, judge)
 
@@ -83,8 +92,8 @@ class RandomMomentTest(InterruptionTestCase):
             self.assertFileIsWritten(command, kind)
 
     def assertBundleIsFilled(self, show, files, earlier):
-        """The run fills a bundle, in which the earlier files stand, with all of the files. After the signal each of
-        them is whole or missing, and the next run completes them."""
+        """The run fills a bundle, in which the earlier files stand, with all of the files, in their order. After the
+        signal those up to some file are new and whole, the others are as they were, and the next run completes them."""
         source = self.reference(show, name="show.plist")
 
         def prepare():
@@ -98,11 +107,11 @@ class RandomMomentTest(InterruptionTestCase):
             left = [path for path in found if os.path.basename(path).startswith(".")]
             if number != signal.SIGKILL:
                 self.assertEqual(left, [])
-            for path in found.keys() - left:
-                self.assertIn(digests(found)[path], (digests(files)[path], digests(earlier).get(path)), path)
-            self.assertLessEqual(earlier.keys(), found.keys())
-            if number is None:
-                self.assertEqual(found.keys(), files.keys())
+            done = sum(found.get(path) == content for path, content in files.items())
+            expected = {**earlier, **dict(itertools.islice(files.items(), done))}
+            self.assertEqual(digests({path: found[path] for path in found.keys() - left}), digests(expected))
+            if number is None or (self.bundle / "Info.plist").exists():
+                self.assertEqual(done, len(files))
             if number == signal.SIGPIPE:
                 self.assertEqual(found.keys(), earlier.keys())
             if number is None or (self.bundle / "Info.plist").exists():
@@ -112,6 +121,7 @@ class RandomMomentTest(InterruptionTestCase):
                 self.assertEqual(digests(self.files()), digests(files))
                 if earlier:  # a copy never takes the place of what is there
                     self.assertEqual(self.references(), list(files))
+            return 0 < done < len(files)
 
         self.assertInterruptible(("createbundle", source, "-d", self.bundle), prepare, judge)
 
@@ -123,7 +133,7 @@ class RandomMomentTest(InterruptionTestCase):
         files = self.media_files()
         self.assertBundleIsFilled({"Episodes": [{"EpisodeReference": web.serve(f"/{name}", content)}
                                                 for name, content in files.items()]}, files,
-                                  earlier={"0.mp3": files["0.mp3"], "7.mp3": b"another 7"})
+                                  earlier={"0.mp3": b"another 0" * 50_000, "7.mp3": b"another 7"})
 
     def test_filling_a_bundle_with_copies(self):
         files = self.media_files()
@@ -132,7 +142,8 @@ class RandomMomentTest(InterruptionTestCase):
 
 
 class KillTest(InterruptionTestCase):
-    """A kill at any moment leaves whole files, and hidden ones that the next run clears away."""
+    """A kill at any moment leaves whole files, and hidden ones that the next run clears away. What is served changes
+    from round to round, so that an old file that is written over shows."""
 
     EPISODES = 20
     ROUNDS = 80 if soaking() else 10
@@ -140,60 +151,74 @@ class KillTest(InterruptionTestCase):
 
     def setUp(self):
         super().setUp()
-        web = self.server()
-        self.contents_by_name = {}
-        episodes = []
-        for number in range(self.EPISODES):
-            media = random.Random(number).randbytes(20_000 + 20_000 * (number % 5))
-            poster = random.Random(-number).randbytes(3000)
-            name = f"{number}.mp3"
-            if number % 4 == 3:
-                url = self.write(name, media).as_uri()
-            elif number % 4 == 1:
-                url = web.dripping(f"/{name}", media, pause=0.003, piece=len(media) // 4)
-            elif number % 4 == 2:
-                url = web.chunked(f"/{name}", [media[:5000], media[5000:]])
-            else:
-                url = web.serve(f"/{name}", media)
-            episodes.append({"EpisodeName": str(number), "EpisodeReference": url,
-                             "EpisodePosterReference": web.serve(f"/{number}.jpg", poster)})
-            self.contents_by_name[name] = media
-            self.contents_by_name[f"Posters/{number}.jpg"] = poster
-        cover = random.Random(100).randbytes(9000)
-        self.contents_by_name["Posters/Podcast.png"] = cover
-        self.show = {"PodcastName": "Night Walks", "PodcastPosterReference": web.serve("/cover.png", cover),
-                     "PodcastPosterReferenceType": "remote", "Episodes": episodes}
+        self.web = self.server()
 
-    def assertWhole(self):
-        """Every file under a final name is one of the show's, to the last byte, and so is Info.plist."""
+    def edition(self, number):
+        """The files of an edition of the show, which is served from now on, and a reference file for it."""
+        made = random.Random(number)
+        files = {"Posters/Podcast.png": made.randbytes(made.randrange(9000))}
+        episodes = []
+        for episode in range(self.EPISODES):
+            media = made.randbytes(made.randrange(20_000 + 20_000 * (episode % 5)))
+            poster = made.randbytes(made.randrange(3000))
+            name = f"{episode}.mp3"
+            if episode % 4 == 3:
+                url = self.write(name, media).as_uri()
+            elif episode % 4 == 1:
+                url = self.web.dripping(f"/{name}", media, pause=0.003, piece=len(media) // 4 + 1)
+            elif episode % 4 == 2:
+                url = self.web.chunked(f"/{name}", [piece for piece in (media[:5000], media[5000:]) if piece])
+            else:
+                url = self.web.serve(f"/{name}", media)
+            episodes.append({"EpisodeName": str(episode), "EpisodeReference": url,
+                             "EpisodePosterReference": self.web.serve(f"/{episode}.jpg", poster)})
+            files[name] = media
+            files[f"Posters/{episode}.jpg"] = poster
+        return files, self.reference({
+            "PodcastName": f"Edition {number}",
+            "PodcastPosterReference": self.web.serve("/cover.png", files["Posters/Podcast.png"]),
+            "PodcastPosterReferenceType": "remote", "Episodes": episodes})
+
+    def assertWhole(self, editions):
+        """Every file under a final name is that of an edition, to the last byte, and so is Info.plist; where that is of
+        the newest edition, all files are. Whether some are, and others not."""
         found = self.files() if self.bundle.exists() else {}
+        found = {path: content for path, content in found.items() if not os.path.basename(path).startswith(".")}
+        newest = editions[-1]
         for path, content in found.items():
-            if not os.path.basename(path).startswith("."):
-                self.assertTrue(content == self.contents_by_name[path], f"{path} is not whole")
+            self.assertTrue(any(content == files[path] for files, _ in editions), f"{path} is not whole")
+        new = [path for path, content in found.items() if content == newest[0][path]]
         if (self.bundle / "Info.plist").exists():
-            self.assertComplete(self.info())
+            title = self.assertComplete(self.info())
+            self.assertIn(title, [title for _, title in editions])
+            if title == newest[1]:
+                self.assertEqual(len(new), len(newest[0]))
+        return 0 < len(new) < len(newest[0])
 
     def assertComplete(self, info):
         self.assertEqual([episode["EpisodeReference"] for episode in info["Episodes"]],
                          [f"{number}.mp3" for number in range(self.EPISODES)])
         self.assertEqual([episode["EpisodePosterReference"] for episode in info["Episodes"]],
                          [f"Posters/{number}.jpg" for number in range(self.EPISODES)])
+        return info["PodcastName"]
 
     def test_kills_at_random_moments(self):
-        source = self.reference(self.show)
+        files, source = self.edition(0)
         began = time.monotonic()
         self.assertWarns(self.create(source))
         duration = time.monotonic() - began
-        complete = digests(contents(self.bundle))
-        self.assertEqual(digests(self.files()), digests(self.contents_by_name))
         seed = random.SystemRandom().randrange(1 << 32)
         moments = random.Random(seed)
-        left_behind = killed = 0
-        for round_number in range(self.ROUNDS):
+        left_behind = killed = amid = 0
+        for round_number in range(1, self.ROUNDS + 1):
+            editions = [(files, f"Edition {round_number - 1}")]
             if round_number % 3 == 0:  # sometimes nothing is there yet
                 for path in self.files():
                     (self.bundle / path).unlink()
                 (self.bundle / "Info.plist").unlink()
+                editions.clear()
+            files, source = self.edition(round_number)
+            editions.append((files, f"Edition {round_number}"))
             for _ in range(self.KILLS):
                 process = self.begin(source, stdout=subprocess.DEVNULL)
                 time.sleep(moments.uniform(0, duration))
@@ -201,15 +226,18 @@ class KillTest(InterruptionTestCase):
                 process.communicate(timeout=60)
                 with self.subTest(seed=seed, round=round_number):
                     self.assertIn(process.returncode, (0, -signal.SIGKILL))
-                    self.assertWhole()
+                    amid += self.assertWhole(editions)
                 killed += process.returncode != 0
                 left_behind += len(hidden(self.bundle))
             with self.subTest(seed=seed, round=round_number, moment="after"):
                 self.assertWarns(self.create(source))
-                self.assertEqual(digests(contents(self.bundle)), complete)
-        print(f"{self.ROUNDS * self.KILLS} kills, of which {killed} met a run and {left_behind} a file half written; "
-              f"{self.ROUNDS} runs to the end", flush=True)
+                self.assertEqual(digests(self.files()), digests(files))
+                self.assertEqual(self.assertComplete(self.info()), f"Edition {round_number}")
+                self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", *files})
+        print(f"{self.ROUNDS * self.KILLS} kills, of which {killed} met a run, {amid} a bundle half made, and "
+              f"{left_behind} a file half written; {self.ROUNDS} runs to the end", flush=True)
         self.assertGreater(left_behind, 0, "no kill met a file half written")
+        self.assertGreater(amid, 0, "no kill met a bundle half made")
 
     def test_hidden_files_of_a_killed_run_are_cleared_away(self):
         url, gate = self.held(self.server(), "/one.mp3", b"half of it")
@@ -225,19 +253,6 @@ class KillTest(InterruptionTestCase):
         self.assertRuns(self.create({}), "Fetching 0 episodes")
         self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", ".qel-notes.part"})
         self.assertTrue(self.path(name).exists())
-
-    def test_a_run_beside_this_one_keeps_its_hidden_file(self):
-        web = self.server()
-        url, gate = self.held(web, "/one.mp3", b"first", b"later")
-        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        source = self.reference({"Episodes": [{"EpisodeReference": web.serve("/two.mp3", b"two")}]}, name="two.plist")
-        self.assertWarns(self.create(source))
-        gate.open()
-        process.communicate(timeout=60)
-        self.assertEqual(process.returncode, 0)
-        self.assertEqual(self.files(), {"one.mp3": b"firstlater", "two.mp3": b"two"})
 
 
 if __name__ == "__main__":
