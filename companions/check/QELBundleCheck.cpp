@@ -11,7 +11,6 @@
 #include "platform/files/Paths.h"
 #include "platform/files/PortablePaths.h"
 #include "platform/files/RegularFile.h"
-#include "platform/files/TemporaryFile.h"
 #include "platform/net/URLFault.h"
 #include "platform/text/Case.h"
 
@@ -113,7 +112,7 @@ void QELBundleCheck::checkName(const std::string& name) {
   };
   const std::string_view last = platform::lastPathComponent(name);
   if (last.starts_with('.')) {
-    return platform::isTemporaryFileName(last)
+    return last.starts_with(".qel-")  // of the tool, or of qel-keep
                ? warn("a run that did not end left this behind: remove it, or run qel-keep again")
                : warn("a hidden file, which is no part of the bundle: remove it");
   }

@@ -35,7 +35,7 @@ constexpr std::size_t kMostOfAKind = 3;
 bool isPropertyList(std::string_view head, const std::string& name) {
   if (head.starts_with("bplist")) return true;
   const std::optional<std::string> root = platform::rootElementName(head);
-  if (root) return *root == "plist";
+  if (root) return *root == "plist" || *root == "dict";
   return platform::lowercased(platform::pathExtension(name)) == "plist";
 }
 

@@ -24,22 +24,6 @@ using platform::TextPosition;
 
 constexpr std::string_view kRightDate = "Sat, 04 Apr 2026 04:30:00 GMT";
 
-/// The numbers of elements by their names, the most frequent ones first: `3 "title", 1 "link"`.
-std::string listed(const std::map<std::string, std::size_t>& counts) {
-  std::vector<std::pair<std::size_t, std::string>> byCount;
-  for (const auto& [name, count] : counts) byCount.emplace_back(count, name);
-  std::stable_sort(byCount.begin(), byCount.end(),
-                   [](const auto& left, const auto& right) { return left.first > right.first; });
-  constexpr std::size_t kMostNames = 12;
-  std::string text;
-  for (std::size_t i = 0; i < byCount.size() && i < kMostNames; ++i) {
-    if (i > 0) text += ", ";
-    text += std::to_string(byCount[i].first) + " " + QELQuoted(byCount[i].second);
-  }
-  if (byCount.size() <= kMostNames) return text;
-  return text + ", and " + std::to_string(byCount.size() - kMostNames) + " others";
-}
-
 /// Watches the tool's parser at its work.
 class Watch final : public FeedParser {
  public:
@@ -56,10 +40,10 @@ class Watch final : public FeedParser {
       if (isForPublishing_) checkChannel();
       tellNumbers();
     } else if (fault()) {
-      const char* const unknown =
-          "this is no feed, no reference file and no bundle: choose another";
+      const bool isMarkup = !root_.empty() || !fault()->description.starts_with("not well");
       findings_.add(QELSeverity::kError, {.position = fault()->position},
-                    root_.empty() ? unknown : "%@", {QELWithAdvice(fault()->description)});
+                    isMarkup ? "%@" : "this is no feed, no reference file and no bundle",
+                    {QELWithAdvice(fault()->description)});
     } else {
       findings_.add(QELSeverity::kError, {.position = TextPosition()},
                     "%@ (the first element here is %@)",
@@ -262,8 +246,8 @@ class Watch final : public FeedParser {
                   "date, %lu with a uuid, %lu with a poster",
                   {episodeCount_, facts_["url"], facts_["contentLength"], facts_["date"],
                    facts_["QELUUID"], facts_["poster"]});
-    if (!taken_.empty()) findings_.add(QELSeverity::kNote, {}, "taken: %@", {listed(taken_)});
-    if (!left_.empty()) findings_.add(QELSeverity::kNote, {}, "not taken: %@", {listed(left_)});
+    if (!taken_.empty()) findings_.add(QELSeverity::kNote, {}, "taken: %@", {QELListed(taken_)});
+    if (!left_.empty()) findings_.add(QELSeverity::kNote, {}, "not taken: %@", {QELListed(left_)});
   }
 
   static bool isAbsolute(std::string_view text) {

@@ -67,7 +67,9 @@ class Check {
       warn(QELPlaceOfKey(entry), "%@ is a key of %@, and is ignored in %@: move it there",
            {name, isEpisode ? "a podcast" : "an episode", owner});
     } else if (entry.kind() != key->kind) {
-      warn(QELPlaceOfKey(entry), "%@ must be %@, not %@", {name, key->kind, entry.kind()});
+      const std::string_view noun = key->kind.substr(key->kind.find(' ') + 1);
+      warn(QELPlaceOfKey(entry), "%@ must be %@, not %@: write it in <%@>",
+           {name, key->kind, entry.kind(), noun == "text" ? "string" : noun});
     } else {
       return true;
     }
@@ -87,7 +89,8 @@ class Check {
     if (!types) return;
     for (const platform::PropertyListPart& type : types->parts()) {
       if (type.kind() != "a text") {
-        warn(QELPlaceOf(type), "a file type must be a text, not %@", {type.kind()});
+        warn(QELPlaceOf(type), "a file type must be a text, not %@: write it in <string>",
+             {type.kind()});
         continue;
       }
       const std::string_view text = type.text();
@@ -108,17 +111,11 @@ class Check {
     const bool isSound = slash != 0 && slash + 1 < text.size() && text[slash + 1] != '/' &&
                          text.find_first_of(" \t\r\n") > slash + 1;
     if (slash != std::string_view::npos && isSound) return;
-    warn(QELPlaceOf(type), "%@ is no MIME type, such as \"audio/mpeg\"", {QELQuoted(text)});
+    warn(QELPlaceOf(type), "%@ is no MIME type: write one such as audio/mpeg", {QELQuoted(text)});
   }
 
   QELFindings& findings_;
 };
-
-void reportFault(const platform::PropertyListFault& fault, QELFindings& findings) {
-  QELPlace place{.position = fault.position};
-  if (fault.object) place.path = "object " + std::to_string(*fault.object);
-  findings.add(QELSeverity::kError, place, "%@", {QELWithAdvice(fault.description)});
-}
 
 }  // namespace
 
@@ -127,7 +124,11 @@ void QELCheckReferenceFile(platform::ByteSource bytes, QELFindings& findings,
   std::optional<platform::PropertyListFault> fault;
   platform::PropertyListPlaces places;
   const auto value = platform::readPropertyList(std::move(bytes), fault, &places);
-  if (!value) return reportFault(*fault, findings);
+  if (!value) {
+    const std::string object = fault->object ? "object " + std::to_string(*fault->object) : "";
+    return findings.add(QELSeverity::kError, {.position = fault->position, .path = object}, "%@",
+                        {QELWithAdvice(fault->description)});
+  }
   const platform::PropertyListPart root{.value = &*value, .places = &places};
   if (!value->asDictionary()) {
     findings.add(QELSeverity::kError, QELPlaceOf(root),
@@ -143,7 +144,7 @@ void QELCheckReferenceFile(platform::ByteSource bytes, QELFindings& findings,
   if (!episodes) return;
   for (const platform::PropertyListPart& part : episodes->parts()) {
     if (!part.value->asDictionary()) {
-      check.warn(QELPlaceOf(part), "an episode must be a dictionary, not %@: it has no fields",
+      check.warn(QELPlaceOf(part), "an episode must be a dictionary, not %@: put it into <dict>",
                  {part.kind()});
       continue;
     }

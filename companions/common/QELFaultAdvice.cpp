@@ -14,6 +14,7 @@ struct Advice {
 };
 
 constexpr auto kAdvice = std::to_array<Advice>({
+    {"syntax error", "give a feed, a reference file or a bundle"},
     {"not well-formed", "\"&\" and \"<\" in a text are written &amp; and &lt;"},
     {"undefined entity",
      "write the character itself; XML knows only &amp; &lt; &gt; &quot; &apos;"},
@@ -25,7 +26,8 @@ constexpr auto kAdvice = std::to_array<Advice>({
     {"a document whose root", "put <plist version=\"1.0\"> before it and </plist> behind it"},
     {"a property list without", "put a <dict> with the podcast's keys into it"},
     {"a second value", "remove it, or put it into the first one"},
-    {"an unexpected element", "values are string, integer, date, array and dict, and keys are key"},
+    {"an unexpected element",
+     "values are string, integer, date, array and dict; a \"<\" of a text is written &lt;"},
     {"an element \"", "write its \"<\" as &lt; or put the text into <![CDATA[...]]>"},
     {"text outside", "put it into <string> and </string>"},
     {"a key without a value", "write the value behind it, or remove the key before this"},

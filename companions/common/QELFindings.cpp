@@ -77,3 +77,18 @@ std::string QELQuoted(std::string_view text) {
   }
   return shown + "\"";
 }
+
+std::string QELListed(const std::map<std::string, std::size_t>& counts) {
+  std::vector<std::pair<std::size_t, std::string>> byCount;
+  for (const auto& [name, count] : counts) byCount.emplace_back(count, name);
+  std::stable_sort(byCount.begin(), byCount.end(),
+                   [](const auto& left, const auto& right) { return left.first > right.first; });
+  constexpr std::size_t kMostNames = 12;
+  std::string text;
+  for (std::size_t i = 0; i < byCount.size() && i < kMostNames; ++i) {
+    if (i > 0) text += ", ";
+    text += std::to_string(byCount[i].first) + " " + QELQuoted(byCount[i].second);
+  }
+  if (byCount.size() <= kMostNames) return text;
+  return text + ", and " + std::to_string(byCount.size() - kMostNames) + " others";
+}

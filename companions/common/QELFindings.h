@@ -72,3 +72,7 @@ class QELFindings {
 
 /// A text as a finding shows it: in quotes, on one line, and not too much of it.
 std::string QELQuoted(std::string_view text);
+
+/// Numbers of things by their names, the most frequent ones first: `3 "title", 1 "link", and 5
+/// others`.
+std::string QELListed(const std::map<std::string, std::size_t>& counts);
