@@ -62,7 +62,8 @@ class BundleTest(ToolTestCase):
         self.assertEqual(self.run_tool(bundle, program="qel-check"), (0, b"", b""))
         os.rename(bundle, self.path("lantern"))
         self.assertEqual(self.run_tool("lantern", program="qel-check"), (
-            1, b"lantern: warning: qel takes a directory for a bundle when its name ends in .podcast: rename it\n", b""))
+            1, b"lantern: warning: qel takes a directory for a bundle when its name ends in .podcast: rename it\n",
+            b""))
 
     def test_a_directory_that_is_none(self):
         (self.path("empty")).mkdir()
@@ -120,16 +121,16 @@ class BundleTest(ToolTestCase):
                     "it again"])
 
     def test_files_that_nobody_lists(self):
-        for name in ("a.mp3", "Posters/b.png", "Posters/c.png", ".DS_Store", ".qel-0123456789abcdef.part", ".qel-keep-0.note",
-                     ".git/config", "sub/d.mp3"):
+        left = (".qel-0123456789abcdef.part", ".qel-keep-0.note")
+        for name in (*left, "a.mp3", "Posters/b.png", "Posters/c.png", ".DS_Store", ".git/config", "sub/d.mp3"):
             self.put(name)
         (self.bundle / "empty").mkdir()
         self.list({"EpisodeReference": "a.mp3", "EpisodePosterReference": "Posters/b.png"})
         self.assertEqual(sorted(self.findings()), sorted([
             ".DS_Store: warning: a hidden file, which is no part of the bundle: remove it",
             ".git: warning: a hidden file, which is no part of the bundle: remove it",
-            ".qel-0123456789abcdef.part: warning: a run that did not end left this behind: remove it, or run qel-keep again",
-            ".qel-keep-0.note: warning: a run that did not end left this behind: remove it, or run qel-keep again",
+            *(f"{name}: warning: a run that did not end left this behind: remove it, or run qel-keep again"
+              for name in left),
             "Posters/c.png: warning: nobody lists this file: remove it, or add it to Info.plist",
             "sub/d.mp3: warning: nobody lists this file: remove it, or add it to Info.plist"]))
 

@@ -10,7 +10,8 @@ DATE = "Sat, 04 Apr 2026 04:30:00 GMT"
 RIGHT = f"write it like {DATE}"
 
 # Dates, and what is said of them; of the first ones nothing.
-GOOD_DATES = [DATE, "4 Apr 26 04:30 +0200", "sat, 04 april 2026 04:30:60 -05:30", "04 Apr 2026 04:30 z", "04 Apr 2026 04:30 pdt"]
+GOOD_DATES = [DATE, "4 Apr 26 04:30 +0200", "sat, 04 april 2026 04:30:60 -05:30", "04 Apr 2026 04:30 z",
+              "04 Apr 2026 04:30 pdt"]
 NO_DATES = ["", "2026-04-04", "Sat,  04 Apr 2026 04:30:00 GMT", "04 Apr 2026 0430 GMT", "04 Apr 2026 04:30 +1"]
 OTHER_DATES = [
     ("Sa, 04 Avril 2026 04:30:00 GMT", "2026-01-04T04:30:00Z", "the month is not known"),
@@ -103,8 +104,8 @@ class TakenTest(FeedTestCase):
                 "reads it here and in qel-keep")
         self.assertEqual(self.said(*parts), [note % "image", note % "category"])
         self.assertEqual(self.said(*parts, options=["--directory", "acme=https://acme.example/"]), [])
-        self.assertEqual(self.said('<orvane:image href="a.png"/>', options=["--directory=acme=https://acme.example/"]), [
-            note.replace("acme", "orvane") % "image"])
+        ours = self.said('<orvane:image href="a.png"/>', options=["--directory=acme=https://acme.example/"])
+        self.assertEqual(ours, [note.replace("acme", "orvane") % "image"])
 
 
 class RefusedTest(FeedTestCase):
@@ -112,8 +113,8 @@ class RefusedTest(FeedTestCase):
         for document, finding in [
                 (b"<rss>\n<channel></rss>", "2:12: error: mismatched tag; each <x> ends with its </x>, the one opened "
                  "last before the others"),
-                (b"<feed/>", "1:1: error: The feed was neither RSS nor Atom; give the address of the podcast's RSS feed "
-                 '(the first element here is "feed")'),
+                (b"<feed/>", "1:1: error: The feed was neither RSS nor Atom; give the address of the podcast's RSS "
+                 'feed (the first element here is "feed")'),
                 (b"\0\1\2", "1:1: error: this is no feed, no reference file and no bundle"),
                 (b"sound", "1:1: error: syntax error; give a feed, a reference file or a bundle"),
                 (b"", "1:1: error: no element found; the file is empty or cut off: take it from where it came once "
@@ -158,9 +159,10 @@ class PublishingTest(FeedTestCase):
     def test_what_qel_publish_writes_lacks_nothing(self):
         show = ROOT / "examples" / "show"
         feed = self.path("feed.xml")
-        self.assertEqual(self.run_tool("--base", "https://a.example/", "--link", "https://a.example/", "--language", "en",
-                                       "--self", "https://a.example/feed.xml", show / "reference.plist", feed,
-                                       program="qel-publish"), (0, b"", b""))
+        published = self.run_tool("--base", "https://a.example/", "--link", "https://a.example/", "--language", "en",
+                                  "--self", "https://a.example/feed.xml", show / "reference.plist", feed,
+                                  program="qel-publish")
+        self.assertEqual(published, (0, b"", b""))
         self.assertEqual(self.findings(feed.read_bytes(), "--for-publishing"), [])
 
 

@@ -285,7 +285,8 @@ class FindingsTest(ReferenceFileTestCase):
     def test_a_terminal_is_not_spoken_to(self):
         content = self.write("x.plist", podcast(text("Z\u009b31m", "x")).encode())
         output = subprocess.run(["script", "-qec", f"{tool('qel-check')} {content}", "/dev/null"],
-                                stdin=subprocess.DEVNULL, capture_output=True, env=environment(), timeout=60, check=False)
+                                stdin=subprocess.DEVNULL, capture_output=True, env=environment(), timeout=60,
+                                check=False)
         self.assertIn('"Z\ufffd31m" is no key'.encode(), output.stdout)
         self.assertIn("Z\u009b31m".encode(), self.check(content).stdout)
 
@@ -362,7 +363,7 @@ class OwnOutputTest(ReferenceFileTestCase):
     def test_a_feed_s_episode_without_media_is_still_a_fault(self):
         result = self.run_tool("parsefeed", self.feed(rss(item(element("title", "x")))))
         (fault,) = self.findings(result.stdout)
-        self.assertTrue(fault.endswith('this episode has no "EpisodeReference", and so no media: add their path or URL'), fault)
+        self.assertIn('this episode has no "EpisodeReference", and so no media: add their path or URL', fault)
 
     def test_the_keys_are_those_of_the_manual(self):
         manual = (ROOT / "docs" / "reference-file.md").read_text(encoding="utf-8")
