@@ -160,13 +160,16 @@ struct XMLParser::Run {
   /// The fault at the library's place, unless there is one already.
   void fail(XML_Error code, std::string description) {
     if (fault) return;
+    const TextPosition where = position();
+    fault = XMLFault{code, std::move(description), where};
+  }
+
+  TextPosition position() const {
     const std::size_t line = XML_GetCurrentLineNumber(handle.get());
     const std::size_t column = XML_GetCurrentColumnNumber(handle.get());  // from 0
     // On its first line the library counts the mark, and nothing of what was skipped before it.
-    const TextPosition position =
-        line <= 1 ? TextPosition{origin.line, origin.column + std::max<std::size_t>(column, 1) - 1}
-                  : TextPosition{origin.line + line - 1, column + 1};
-    fault = XMLFault{code, std::move(description), position};
+    if (line > 1) return {origin.line + line - 1, column + 1};
+    return {origin.line, origin.column + std::max<std::size_t>(column, 1) - 1};
   }
 
   /// Ends the run with a fault that the library does not see.
@@ -269,6 +272,10 @@ void XMLParser::refuseExpansion() {
 
 void XMLParser::abort(std::string description) {
   run_->refuse(XML_ERROR_ABORTED, std::move(description));
+}
+
+TextPosition XMLParser::position() const {
+  return run_->position();
 }
 
 }  // namespace platform
