@@ -31,7 +31,7 @@ class Sizes:
     large_copy_bytes: int
 
 
-FULL = Sizes(20_000, 200_000, 1_000, 50_000, 1_000 * MEGABYTE, 20, 20 * MEGABYTE)
+FULL = Sizes(20_000, 200_000, 1_000, 100_000, 1_000 * MEGABYTE, 20, 20 * MEGABYTE)
 QUICK = Sizes(200, 2_000, 20, 50_000, 10 * MEGABYTE, 2, MEGABYTE)
 
 
@@ -112,6 +112,11 @@ class Contests:
         """A contestant called after its program, and after what is said behind a comma."""
         path = shutil.which(name.partition(",")[0])
         return Contestant(name, [path, *arguments] if path else None, output, **options)
+
+    def synced(self, contestant):
+        """The same followed by `sync`, which has all that was written be on the disk, as a bundle is in the end."""
+        command = contestant.command and ["/bin/sh", "-c", '"$@" && sync', "sh", *contestant.command]
+        return dataclasses.replace(contestant, name=f"{contestant.name}, sync", command=command)
 
     # Contests: the programs, the rows, and how much of the rounds they get
 
@@ -215,7 +220,9 @@ class Contests:
         return (
             self.fetching(count, size),
             [
-                Row(work, "one `curl` process fetching the same list", 1.1, "createbundle", "curl", "curl"),
+                Row(work, "one `curl` process fetching the same list, then `sync`", 1.25, "createbundle", "curl, sync",
+                    "curl"),
+                Row(work, "the `curl` process alone", None, "createbundle", "curl", "curl"),
                 Row(work, "one `wget` process fetching it", None, "createbundle", "wget", "wget"),
             ],
             1.0,
@@ -227,7 +234,8 @@ class Contests:
         return (
             self.fetching(1, size),
             [
-                Row(work, "`curl -o`", 1.1, "createbundle", "curl", "curl"),
+                Row(work, "`curl -o`, then `sync`", 1.25, "createbundle", "curl, sync", "curl"),
+                Row(work, "`curl -o` alone", None, "createbundle", "curl", "curl"),
                 Row(work, "`wget`", None, "createbundle", "wget", "wget"),
                 Row("peak memory of that createbundle", "32 MB, whatever the size", 1.0, "createbundle", 32 << 20),
             ],
@@ -247,10 +255,12 @@ class Contests:
         curl_list.write_text("".join(f'url = "{url}/{name}"\noutput = "{by_curl / name}"\n' for name in names))
         wget_list.write_text("".join(f"{url}/{name}\n" for name in names))
         whole = self.holding(names, size)
+        curl = self.rival("curl", ["--silent", "--show-error", "--fail", "--config", curl_list], by_curl,
+                          needs_directory=True, check=whole)
         return [
             self.qel("createbundle", "createbundle", reference, bundle, check=whole),
-            self.rival("curl", ["--silent", "--show-error", "--fail", "--config", curl_list], by_curl,
-                       needs_directory=True, check=whole),
+            curl,
+            self.synced(curl),
             self.rival("wget", ["--quiet", "--input-file", wget_list, "--directory-prefix", by_wget], by_wget,
                        needs_directory=True, check=whole),
         ]
@@ -269,15 +279,18 @@ class Contests:
             reference, copies = self.scratch / f"local-{size}.plist", self.scratch / f"copies-{size}"
             inputs.write_reference(reference, [str(media / name) for name in names])
             whole = self.holding(names, size)
+            copying = self.rival(f"cp{kind}", [*(media / name for name in names), copies], copies, needs_directory=True,
+                                 check=whole)
             contestants += [
                 self.qel(f"createbundle{kind}", "createbundle", reference, self.scratch / f"local-{size}.podcast",
                          check=whole),
-                self.rival(f"cp{kind}", [*(media / name for name in names), copies], copies, needs_directory=True,
-                           check=whole),
+                copying,
+                self.synced(copying),
             ]
             shown = f"{size // MEGABYTE} MB" if size >= MEGABYTE else f"{size // 1000} KB"
-            rows.append(Row(f"createbundle of local media, {count:,} of {shown}", "`cp` of the same files", 1.2,
-                            f"createbundle{kind}", f"cp{kind}", "cp"))
+            work = f"createbundle of local media, {count:,} of {shown}"
+            rows += [Row(work, "`cp` of the same files, then `sync`", None, f"createbundle{kind}", f"cp{kind}, sync", "cp"),
+                     Row(work, "`cp` alone", None, f"createbundle{kind}", f"cp{kind}", "cp")]
         return contestants, rows, 1.0
 
     def start(self):

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "cli/common/QELReferenceType.h"
+#include "fuzz/AskedHost.h"
 #include "fuzz/FuzzTarget.h"
 #include "generators/QELBundleNames.h"
 #include "generators/QELNameLedger.h"
@@ -33,9 +34,25 @@ void requireSoundURL(std::string_view text) {
                   sent->encodedPath() == url->encodedPath(),
               "what is sent of a URL is the same URL");
   const bool isHTTP = url->scheme() == "http" || url->scheme() == "https";
+  if (isHTTP) {
+    const Server shown = shownServer(text);
+    requireThat(askedServer(url->encodedText()) == shown, "the host that is shown is asked");
+  }
   requireThat(!(isHTTP || url->scheme() == "file") ||
                   QELReferenceType(text) == platform::Text(kReferenceTypeRemote),
               "what is fetched as a URL counts as remote");
+}
+
+/// Of a redirect's Location, whatever it looks like.
+void requireSoundRedirect(std::string_view reference) {
+  const platform::URL base = *platform::URL::parse("http://u:p@host:1/a/b?c");
+  const std::optional<platform::URL> target = base.resolved(reference);
+  if (!target || target->scheme() != "http") return;
+  const bool hasScheme = reference.substr(0, reference.find_first_of("/?#")).ends_with(':');
+  const bool showsHost = hasScheme || reference.starts_with("//");
+  const Server shown = shownServer(showsHost ? reference : base.encodedText());
+  requireThat(askedServer(target->encodedText()) == shown,
+              "a redirect leads to the host that it shows, or stays");
 }
 
 void requirePathAsURL(std::string_view text) {
@@ -101,6 +118,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   Bundle bundle;
   for (const std::string_view line : platform::splitAt(text, '\n')) {
     requireSoundURL(line);
+    requireSoundRedirect(line);
     requirePathAsURL(line);
     requireStandardised(line);
     bundle.add(line, QELReferenceType(line));

@@ -46,7 +46,11 @@ void prepareProcess() {
   std::signal(SIGXFSZ, SIG_IGN);
   for (const int descriptor : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
     // Those below it are open, so that the lowest free one, which open gives, is this one.
-    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF) ::open("/dev/null", O_RDWR);
+    if (::fcntl(descriptor, F_GETFD) < 0 && errno == EBADF &&
+        ::open("/dev/null", O_RDWR) != descriptor) {
+      writeToStandardError("A standard stream is closed, and /dev/null cannot be opened.\n");
+      ::_exit(EXIT_FAILURE);
+    }
   }
   keepFreedMemory();
   std::set_new_handler(&endForWantOfMemory);

@@ -188,8 +188,7 @@ TemporaryFile::~TemporaryFile() {
   discard();
 }
 
-bool TemporaryFile::create(const FilePlace& place, ErrorSlot& error,
-                           const std::optional<FileAttributes>& attributes) {
+bool TemporaryFile::openDirectory(const FilePlace& place, ErrorSlot& error) {
   discard();
   const std::size_t parentLength =
       place.directory != nullptr ? 0 : place.name.rfind('/') + 1;  // npos + 1 is 0
@@ -198,21 +197,59 @@ bool TemporaryFile::create(const FilePlace& place, ErrorSlot& error,
     error = posixError(place.name.empty() ? ENOENT : EINVAL);
     return false;
   }
-  attributes_ = attributes;
-  needsLock_ = place.directory == nullptr || !place.directory->isLocked();
   if (place.directory != nullptr) {
     directory_ = place.directory->descriptor();
-  } else {
-    ownDirectory_ = FileDescriptor::open(
-        parentLength == 0 ? "." : place.name.substr(0, parentLength), O_PATH | O_DIRECTORY);
-    directory_ = ownDirectory_.get();
-    if (directory_ < 0) {
-      error = posixError(errno);
-      return false;
-    }
+    return true;
   }
+  ownDirectory_ = FileDescriptor::open(parentLength == 0 ? "." : place.name.substr(0, parentLength),
+                                       O_PATH | O_DIRECTORY);
+  directory_ = ownDirectory_.get();
+  if (directory_ < 0) error = posixError(errno);
+  return directory_ >= 0;
+}
+
+bool TemporaryFile::create(const FilePlace& place, ErrorSlot& error,
+                           const std::optional<FileAttributes>& attributes) {
+  if (!openDirectory(place, error)) return false;
+  attributes_ = attributes;
+  needsLock_ = place.directory == nullptr || !place.directory->isLocked();
+  isPart_ = false;
   Registry::handleSignals();
   return createHidden(error);
+}
+
+bool TemporaryFile::createPart(const FilePlace& place, const std::string& partName,
+                               std::uint64_t keptSize, ErrorSlot& error) {
+  constexpr unsigned kEveryone = 0666;
+  if (!openDirectory(place, error)) return false;
+  attributes_.reset();
+  needsLock_ = false;
+  isPart_ = true;
+  if (!isFileName(partName)) return fail(EINVAL, error);
+  // Another name of the same file would get the bytes as well; a new file has one.
+  if (keptSize == 0 && ::unlinkat(directory_, partName.c_str(), 0) != 0 && errno != ENOENT) {
+    return fail(errno, error);
+  }
+  const int flags = keptSize == 0 ? O_CREAT | O_EXCL : O_NONBLOCK;
+  descriptor_ =
+      FileDescriptor::openAt(directory_, partName, O_WRONLY | O_NOFOLLOW | flags, kEveryone);
+  struct stat found {};
+  if (!descriptor_.isOpen() || ::fstat(descriptor_.get(), &found) != 0) return fail(errno, error);
+  const auto size = static_cast<off_t>(keptSize);
+  if (!S_ISREG(found.st_mode) || found.st_nlink != 1 || found.st_size < size) {
+    return fail(EINVAL, error);
+  }
+  if (::ftruncate(descriptor_.get(), size) != 0 || ::lseek(descriptor_.get(), size, SEEK_SET) < 0) {
+    return fail(errno, error);
+  }
+  hiddenName_ = partName;
+  return true;
+}
+
+bool TemporaryFile::fail(int code, ErrorSlot& error) {
+  error = posixError(code);
+  discard();
+  return false;
 }
 
 bool TemporaryFile::createHidden(ErrorSlot& error) {
@@ -255,16 +292,12 @@ bool TemporaryFile::takeLock(const std::string& name) {
 
 bool TemporaryFile::write(std::string_view bytes, ErrorSlot& error) {
   if (descriptor_.isOpen() && writeAll(descriptor_.get(), bytes)) return true;
-  error = posixError(descriptor_.isOpen() ? errno : EBADF);
-  discard();
-  return false;
+  return fail(descriptor_.isOpen() ? errno : EBADF, error);
 }
 
 bool TemporaryFile::sync(ErrorSlot& error) {
-  if (descriptor_.isOpen() && isSynced(&::fsync, descriptor_.get())) return true;
-  error = posixError(descriptor_.isOpen() ? errno : EBADF);
-  discard();
-  return false;
+  if (descriptor_.isOpen() && isSynced(&::fdatasync, descriptor_.get())) return true;
+  return fail(descriptor_.isOpen() ? errno : EBADF, error);
 }
 
 /// Where the file system has none, it goes on without.
@@ -278,7 +311,10 @@ void TemporaryFile::applyAttributes() {
 }
 
 bool TemporaryFile::commitReplacing(ErrorSlot& error) {
-  return commit(&moveReplacing, error);
+  struct stat replaced {};
+  const bool isReplacing = descriptor_.isOpen() && ::fstatat(directory_, name_.c_str(), &replaced,
+                                                             AT_SYMLINK_NOFOLLOW) == 0;
+  return (!isReplacing || sync(error)) && commit(&moveReplacing, error);
 }
 
 bool TemporaryFile::commitNew(ErrorSlot& error) {
@@ -287,10 +323,7 @@ bool TemporaryFile::commitNew(ErrorSlot& error) {
 
 bool TemporaryFile::commit(bool (*move)(int directory, const char* from, const char* to),
                            ErrorSlot& error) {
-  if (!descriptor_.isOpen()) {
-    error = posixError(EBADF);
-    return false;
-  }
+  if (!descriptor_.isOpen()) return fail(EBADF, error);
   applyAttributes();
   // The second descriptor keeps the lock until the file has its final name.
   FileDescriptor lockHolder;
@@ -302,14 +335,11 @@ bool TemporaryFile::commit(bool (*move)(int directory, const char* from, const c
     isDone = move(directory_, hiddenName_.c_str(), name_.c_str());
     failure = errno;
     if (isDone) {
-      Registry::remove(*this, hold);
+      if (!isPart_) Registry::remove(*this, hold);
       hiddenName_.clear();
     }
   }
-  if (isDone) return true;
-  error = posixError(failure);
-  discard();
-  return false;
+  return isDone || fail(failure, error);
 }
 
 void TemporaryFile::removeAllAndExit(int status) {
@@ -319,8 +349,9 @@ void TemporaryFile::removeAllAndExit(int status) {
 }
 
 void TemporaryFile::discard() {
-  if (hiddenName_.empty()) return;
   descriptor_.close();
+  if (isPart_) hiddenName_.clear();
+  if (hiddenName_.empty()) return;
   const Registry::Hold hold;
   ::unlinkat(directory_, hiddenName_.c_str(), 0);
   Registry::remove(*this, hold);
@@ -337,12 +368,11 @@ bool isTemporaryFileName(std::string_view name) {
 }
 
 void removeStaleTemporaryFiles(const Directory& directory) {
-  FileDescriptor listed =
-      FileDescriptor::openAt(directory.descriptor(), ".", O_RDONLY | O_DIRECTORY);
-  if (!listed.isOpen()) return;
+  FileDescriptor listed(::fcntl(directory.descriptor(), F_DUPFD_CLOEXEC, 0));
   const std::unique_ptr<DIR, int (*)(DIR*)> entries(::fdopendir(listed.get()), &::closedir);
   if (!entries) return;
   listed.release();  // closed with the list
+  ::rewinddir(entries.get());
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string name = entry->d_name;
     if (!isTemporaryFileName(name) || !directory.fileSize(name)) continue;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -35,12 +36,18 @@ class TemporaryFile {
   /// system has them.
   bool create(const FilePlace& place, ErrorSlot& error,
               const std::optional<FileAttributes>& attributes = std::nullopt);
+  /// The same under a name of its own beside the place, for a file that is to outlive a failure:
+  /// nothing but a commit and `create` changes that name. Of the file there, which must be a
+  /// regular one, the first `keptSize` bytes stay, and it fails when there are fewer.
+  bool createPart(const FilePlace& place, const std::string& partName, std::uint64_t keptSize,
+                  ErrorSlot& error);
   /// Appends the bytes; a short write is a failure.
   bool write(std::string_view bytes, ErrorSlot& error);
   /// Returns once the content is on the disk.
   bool sync(ErrorSlot& error);
   /// Closes the file, checks that, and moves it to the destination, replacing what is there (but
-  /// never a directory).
+  /// never a directory). What replaces something is on the disk before: after a power cut either of
+  /// the two is there whole.
   bool commitReplacing(ErrorSlot& error);
   /// The same, failing when anything exists at the destination, be it a dangling symbolic link.
   bool commitNew(ErrorSlot& error);
@@ -55,7 +62,9 @@ class TemporaryFile {
  private:
   class Registry;
 
+  bool openDirectory(const FilePlace& place, ErrorSlot& error);
   bool createHidden(ErrorSlot& error);
+  bool fail(int code, ErrorSlot& error);
   bool takeLock(const std::string& name);
   void applyAttributes();
   bool commit(bool (*move)(int directory, const char* from, const char* to), ErrorSlot& error);
@@ -68,6 +77,7 @@ class TemporaryFile {
   std::string name_;
   std::optional<FileAttributes> attributes_;
   bool needsLock_ = false;
+  bool isPart_ = false;            // not in the registry
   TemporaryFile* next_ = nullptr;  // in the registry
 };
 

@@ -3,6 +3,7 @@
 #include <charconv>
 #include <limits>
 #include <system_error>
+#include <utility>
 
 #include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
@@ -23,14 +24,19 @@ void MessageFraming::takeLine(std::string_view line) {
   if (trimmed(line).empty()) return;
   if (kWhitespace.find(line.front()) != std::string_view::npos) {
     // A field's second line, which servers must not send and few clients read alike.
-    if (field_ != Field::kOther) fault_ = kBrokenField;
+    if (field_ == Field::kContentCoding) {
+      takeValue(line);
+    } else if (field_ != Field::kOther) {
+      fault_ = kBrokenField;
+    }
     return;
   }
   const std::size_t colon = line.find(':');
   const std::string_view name = line.substr(0, colon);
   const std::string plainName = lowercased(trimmed(name));
   field_ = plainName == "content-length"      ? Field::kLength
-           : plainName == "transfer-encoding" ? Field::kCoding
+           : plainName == "transfer-encoding" ? Field::kTransferCoding
+           : plainName == "content-encoding"  ? Field::kContentCoding
                                               : Field::kOther;
   if (field_ == Field::kOther) return;
   if (colon == std::string_view::npos || plainName.size() != name.size()) {
@@ -38,11 +44,21 @@ void MessageFraming::takeLine(std::string_view line) {
     fault_ = kBrokenField;
     return;
   }
-  for (const std::string_view piece : splitAt(line.substr(colon + 1), ',')) {
+  takeValue(line.substr(colon + 1));
+}
+
+void MessageFraming::takeValue(std::string_view value) {
+  for (const std::string_view piece : splitAt(value, ',')) {
     if (field_ == Field::kLength) {
       takeLength(trimmed(piece));
+      continue;
+    }
+    std::string name = lowercased(trimmed(piece));
+    if (name.empty() || name == "identity") continue;
+    if (field_ == Field::kTransferCoding) {
+      takeTransferCoding(name);
     } else {
-      takeCoding(lowercased(trimmed(piece)));
+      contentCodings_.push_back(std::move(name));
     }
   }
 }
@@ -62,10 +78,10 @@ void MessageFraming::takeLength(std::string_view digits) {
   length_ = length;
 }
 
-void MessageFraming::takeCoding(std::string_view name) {
+void MessageFraming::takeTransferCoding(std::string_view name) {
   if (name == "chunked") {
     isChunked_ = true;
-  } else if (!name.empty() && name != "identity") {
+  } else {
     fault_ = "The body comes in a transfer coding that was not asked for";
   }
 }

@@ -4,10 +4,12 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace platform {
 
-/// Where the body of an HTTP answer ends, as its header says (RFC 9112, section 6).
+/// Where the body of an HTTP answer ends, and in which form it comes, as its header says (RFC 9112,
+/// section 6; RFC 9110, section 8.4).
 ///
 /// A transfer library is lenient here: of two lengths it may believe the last, it may read "0x20"
 /// as 0 and pass over a coding that it does not know, so that a body cut short, or in another form,
@@ -23,15 +25,24 @@ class MessageFraming {
   /// The announced length; absent without one, and for a body in chunks, which end by themselves.
   std::optional<std::uint64_t> length() const { return isChunked_ ? std::nullopt : length_; }
 
- private:
-  enum class Field { kLength, kCoding, kOther };
+  /// Whether nothing but the end of the connection ends the body.
+  bool endsWithConnection() const { return !isChunked_ && !length_; }
 
+  /// The content codings that were applied to the body, in lower case and in their order, of all
+  /// lines that name some; "identity" is none.
+  const std::vector<std::string>& contentCodings() const { return contentCodings_; }
+
+ private:
+  enum class Field { kLength, kTransferCoding, kContentCoding, kOther };
+
+  void takeValue(std::string_view value);
   void takeLength(std::string_view digits);
-  void takeCoding(std::string_view name);
+  void takeTransferCoding(std::string_view name);
 
   Field field_ = Field::kOther;  // of the last line
   std::optional<std::uint64_t> length_;
   bool isChunked_ = false;
+  std::vector<std::string> contentCodings_;
   std::string_view fault_;
 };
 

@@ -2,15 +2,15 @@
 
 #include <algorithm>
 #include <cstddef>
-#include <initializer_list>
+#include <string>
 #include <string_view>
 #include <utility>
+#include <vector>
 
-#include "platform/net/GzipDecoder.h"
+#include "platform/net/ContentDecoder.h"
 #include "platform/net/NetworkTransfer.h"
 #include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
-#include "platform/text/Splitting.h"
 
 namespace platform {
 namespace {
@@ -19,8 +19,27 @@ namespace {
 constexpr std::uint64_t kLargestRatio = 100;
 constexpr std::uint64_t kAnyRatioSize = std::uint64_t{64} << 20U;
 
-bool isOneOf(std::string_view text, std::initializer_list<std::string_view> texts) {
-  return std::find(texts.begin(), texts.end(), text) != texts.end();
+/// The encoding that the field names (RFC 9110, section 8.3): of "text/xml; charset=\"koi8-r\""
+/// that is koi8-r. Empty for none.
+std::string charsetOf(std::string_view contentType) {
+  std::vector<std::string> parameters(1);
+  bool isQuoted = false;
+  for (std::size_t i = 0; i < contentType.size(); ++i) {
+    if (contentType[i] == '"') {
+      isQuoted = !isQuoted;
+    } else if (contentType[i] == ';' && !isQuoted) {
+      parameters.emplace_back();
+    } else {
+      if (contentType[i] == '\\' && isQuoted && i + 1 < contentType.size()) ++i;
+      parameters.back() += contentType[i];
+    }
+  }
+  for (const std::string_view parameter : parameters) {
+    const std::size_t nameLength = std::min(parameter.find('='), parameter.size());
+    if (lowercased(trimmed(parameter.substr(0, nameLength))) != "charset") continue;
+    return std::string(trimmed(parameter.substr(std::min(nameLength + 1, parameter.size()))));
+  }
+  return "";
 }
 
 /// Collects a body in memory, decompressed.
@@ -28,10 +47,13 @@ class BodyCollector : public NetworkTransfer::Sink {
  public:
   explicit BodyCollector(std::uint64_t limit) : limit_(limit) {}
 
-  bool begin(std::int64_t expectedLength, std::string_view contentEncoding,
+  /// Servers name codings that are none ("utf-8"); what such a name stands for shows in the
+  /// document.
+  bool begin(std::int64_t expectedLength, const std::vector<std::string>& contentCodings,
              ErrorSlot& error) override {
-    if (!beginDecoding(lowercased(contentEncoding), error)) return false;
-    if (decoder_ || expectedLength <= 0) return true;
+    if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kIgnored, error))
+      return false;
+    if (decoder_.isCoded() || expectedLength <= 0) return true;
     const auto length = static_cast<std::uint64_t>(expectedLength);
     if (length > limit_) return refuseAsTooLarge(error);
     // The announcement may be a lie; beyond this the body grows as its bytes come.
@@ -42,35 +64,17 @@ class BodyCollector : public NetworkTransfer::Sink {
 
   bool take(std::string_view bytes, ErrorSlot& error) override {
     receivedSize_ += bytes.size();
-    if (!decoder_) return append(bytes, error);
-    const auto sink = [this, &error](std::string_view piece) { return append(piece, error); };
-    if (decoder_->decode(bytes, sink)) return true;
-    return !error && refuseCoding("The compressed body is malformed", error);
+    return decoder_.decode(
+        bytes, [this, &error](std::string_view piece) { return append(piece, error); }, error);
   }
 
   /// The body once all bytes have come.
   std::optional<std::string> finish(ErrorSlot& error) {
-    if (!decoder_ || decoder_->isWhole()) return std::move(body_);
-    refuseCoding("The compressed body is cut short", error);
-    return std::nullopt;
+    if (!decoder_.finish(error)) return std::nullopt;
+    return std::move(body_);
   }
 
  private:
-  /// Servers name codings that are none ("utf-8"), so only those that are known to need decoding
-  /// are refused; what an unknown name stands for shows in the document.
-  bool beginDecoding(const std::string& codings, ErrorSlot& error) {
-    for (const std::string_view piece : splitAt(codings, ',')) {
-      const std::string_view name = trimmed(piece);
-      const bool isGzip = isOneOf(name, {"gzip", "x-gzip"});
-      if ((isGzip && decoder_) ||
-          isOneOf(name, {"br", "compress", "x-compress", "deflate", "zstd"})) {
-        return refuseCoding("The body comes in a content coding that was not asked for", error);
-      }
-      if (isGzip) decoder_.emplace();
-    }
-    return true;
-  }
-
   bool append(std::string_view bytes, ErrorSlot& error) {
     if (bytes.size() > limit_ - body_.size()) return refuseAsTooLarge(error);
     const std::uint64_t size = body_.size() + bytes.size();
@@ -83,11 +87,6 @@ class BodyCollector : public NetworkTransfer::Sink {
     return true;
   }
 
-  static bool refuseCoding(std::string_view cause, ErrorSlot& error) {
-    error = transferError(CURLE_BAD_CONTENT_ENCODING, cause);
-    return false;
-  }
-
   bool refuseAsTooLarge(ErrorSlot& error) const {
     error = transferError(CURLE_FILESIZE_EXCEEDED,
                           "The resource is larger than " + std::to_string(limit_) + " bytes");
@@ -97,7 +96,7 @@ class BodyCollector : public NetworkTransfer::Sink {
   std::uint64_t limit_;
   std::uint64_t receivedSize_ = 0;  // as it was sent
   std::string body_;
-  std::optional<GzipDecoder> decoder_;
+  ContentDecoder decoder_;
 };
 
 }  // namespace
@@ -106,13 +105,17 @@ std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::ui
   if (url.scheme() == "file") return openWholeFile(url.path(), error);
 
   BodyCollector collector(limit);
-  const NetworkTransfer transfer(url, "gzip", collector);
+  const NetworkTransfer transfer(url, {.acceptedEncoding = "gzip"}, collector);
   while (!transfer.hasEnded()) NetworkTransfer::runAll();
   if (transfer.error()) {
     error = transfer.error();
     return std::nullopt;
   }
-  return collector.finish(error);
+  std::optional<std::string> body = collector.finish(error);
+  if (!body) return std::nullopt;
+  ByteSource source(std::move(*body));
+  source.setEncodingHint(charsetOf(transfer.field("Content-Type")));
+  return source;
 }
 
 }  // namespace platform

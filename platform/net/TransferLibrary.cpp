@@ -36,12 +36,16 @@ ErrorRecord transferError(CURLcode code, std::string_view description) {
   return {"transfer", code, std::move(shown)};
 }
 
-TransferLibrary::Symbol TransferLibrary::find(const char* name) {
+TransferLibrary::Symbol TransferLibrary::findIfThere(const char* name) {
   // It stays loaded: what it registered with the thread and the process outlives every transfer.
   static void* const file = dlopen(kFile, RTLD_LAZY | RTLD_LOCAL);
-  void* const address = file != nullptr ? dlsym(file, name) : nullptr;
-  if (address == nullptr && !error_) error_ = loadingError();
-  return {address};
+  return {file != nullptr ? dlsym(file, name) : nullptr};
+}
+
+TransferLibrary::Symbol TransferLibrary::find(const char* name) {
+  const Symbol symbol = findIfThere(name);
+  if (symbol.address == nullptr && !error_) error_ = loadingError();
+  return symbol;
 }
 
 TransferLibrary::TransferLibrary() {

@@ -2,6 +2,7 @@
 
 #include <curl/curl.h>
 
+#include <cstddef>
 #include <string_view>
 
 #include "platform/text/ErrorRecord.h"
@@ -41,6 +42,8 @@ class TransferLibrary {
   static const TransferLibrary& instance();
   /// Looks a function up. The first failure becomes the error.
   Symbol find(const char* name);
+  /// A function of one of the libraries that this one brings along; null without it.
+  static Symbol findIfThere(const char* name);
 
   ErrorSlot error_;  // before the functions, as finding them fills it
 
@@ -59,9 +62,15 @@ class TransferLibrary {
   decltype(&::curl_multi_poll) multiPoll = find("curl_multi_poll");
   decltype(&::curl_multi_perform) multiPerform = find("curl_multi_perform");
   decltype(&::curl_multi_info_read) multiInfoRead = find("curl_multi_info_read");
+  decltype(&::curl_slist_append) slistAppend = find("curl_slist_append");
+  decltype(&::curl_slist_free_all) slistFreeAll = find("curl_slist_free_all");
   decltype(&::curl_url) url = find("curl_url");
   decltype(&::curl_url_cleanup) urlCleanup = find("curl_url_cleanup");
   decltype(&::curl_url_set) urlSet = find("curl_url_set");
+
+  /// Whether something lies in the session (of OpenSSL, of GnuTLS) that was not taken from it yet.
+  int (*openSSLHasPending)(const void* session) = findIfThere("SSL_has_pending");
+  std::size_t (*gnuTLSPending)(void* session) = findIfThere("gnutls_record_check_pending");
 };
 
 }  // namespace platform

@@ -128,10 +128,12 @@ bool isWellFormed(const Authority& authority) {
 }
 
 /// The host in the ASCII form that the domain name system knows ("bücher.example" gives
-/// "xn--bcher-kva.example"). The transfer library would take the host's encoding from the locale,
-/// ICU takes it as the UTF-8 that it is.
-std::optional<std::string> hostInASCII(std::string_view host) {
-  if (isASCII(host)) return std::string(host);
+/// "xn--bcher-kva.example", and so does "b%C3%BCcher.example"). The transfer library would take the
+/// host's encoding from the locale, ICU takes it as the UTF-8 that it is.
+std::optional<std::string> hostInASCII(std::string_view writtenHost) {
+  const std::string host = percentDecoded(writtenHost);
+  if (isASCII(host)) return std::string(writtenHost);
+  if (!hasAcceptableCharacters(host)) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
   const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
@@ -146,10 +148,9 @@ std::optional<std::string> hostInASCII(std::string_view host) {
   if (U_FAILURE(status) != 0 || info.errors != 0) return std::nullopt;
   // Some characters become ASCII ones: a full-width "/" would end the host where the text goes on.
   const std::string_view name(ascii.data(), static_cast<std::size_t>(length));
-  const bool isWholeHost =
-      hasAcceptableCharacters(name) && name.find_first_of(":/?#[]@") == std::string_view::npos &&
-      std::count(name.begin(), name.end(), '%') == std::count(host.begin(), host.end(), '%');
-  if (!isWholeHost) return std::nullopt;
+  if (!hasAcceptableCharacters(name) || name.find_first_of("%:/?#[]@") != std::string_view::npos) {
+    return std::nullopt;
+  }
   return std::string(name);
 }
 
@@ -208,6 +209,52 @@ std::optional<URL> URL::parse(std::string_view text) {
 
 std::string URL::path() const {
   return percentDecoded(encodedPath_);
+}
+
+std::optional<URL> URL::resolved(std::string_view reference) const {
+  reference = reference.substr(0, reference.find('#'));
+  const std::size_t end = reference.find_first_of(":/?");
+  std::string text;
+  if (end == std::string_view::npos || reference[end] != ':') {  // no scheme
+    text = scheme_ + ":";
+    if (!reference.starts_with("//")) {
+      text.append("//").append(componentsOf(encodedText_)->authority.value_or(""));
+    }
+    if (reference.empty() || reference.front() == '?') {
+      text += encodedPath_;
+    } else if (reference.front() != '/') {
+      text += encodedPath_.empty() ? "/" : encodedPath_.substr(0, encodedPath_.rfind('/') + 1);
+    }
+  }
+  text += reference;
+
+  const std::optional<Components> target = componentsOf(text);
+  if (!target) return std::nullopt;
+  const std::size_t pathStart = static_cast<std::size_t>(target->path.data() - text.data());
+  const std::string_view tail = std::string_view(text).substr(pathStart);
+  std::size_t position = 0;
+  return parse(text.substr(0, pathStart) + percentEncoded(tail, [&](char c) {
+                 constexpr std::string_view kNotAllowed = " <>\"{}|\\^`[]";
+                 const std::size_t at = position++;
+                 if (c == '%') return isPercentTriplet(tail, at);
+                 return isASCII(c) && kNotAllowed.find(c) == std::string_view::npos;
+               }));
+}
+
+std::string URL::origin() const {
+  const Components components = *componentsOf(encodedText_);
+  const std::optional<Authority> authority = authorityOf(components.authority.value_or(""));
+  std::string_view port = authority->port;
+  if (port.size() < 2) port = scheme_ == "https" ? ":443" : ":80";
+  return scheme_ + "://" + lowercased(authority->host) + std::string(port);
+}
+
+void URL::adoptUserOf(const URL& other) {
+  const auto userOf = [](const URL& url) {
+    return authorityOf(componentsOf(url.encodedText_)->authority.value_or(""))->userInfo;
+  };
+  if (!userOf(*this).empty() || origin() != other.origin()) return;
+  encodedText_.insert(scheme_.size() + std::string_view("://").size(), userOf(other));
 }
 
 std::string percentDecoded(std::string_view text) {

@@ -32,7 +32,18 @@ class URL {
   /// The path percent-decoded; may hold any byte, NUL included.
   std::string path() const;
 
+  /// What a reference in this resource, such as a redirect's Location, leads to (RFC 3986, section
+  /// 5.2; dots in the path stay). Servers send more than the grammar allows, and clients take it:
+  /// what a path or query may not hold is percent-encoded, but for control characters. A fragment
+  /// is left out. Absent where no valid URL comes of it.
+  std::optional<URL> resolved(std::string_view reference) const;
+  /// Makes user and password those of the other URL, where this one names none and leads to the
+  /// same scheme, host and port.
+  void adoptUserOf(const URL& other);
+
  private:
+  std::string origin() const;
+
   std::string encodedText_;
   std::string scheme_;
   std::string encodedPath_;

@@ -28,6 +28,11 @@ class ByteSource {
 
   std::uint64_t expectedSize() const { return expectedSize_; }
 
+  /// The name of the text encoding that came beside the bytes, for readers to whom the bytes tell
+  /// none; empty when none came.
+  const std::string& encodingHint() const { return encodingHint_; }
+  void setEncodingHint(std::string name) { encodingHint_ = std::move(name); }
+
   /// The first bytes, which are still to be read: 64 KiB of a file, or all that is in memory.
   /// Called before anything is read. Empty only where there are none at all, and, with the slot
   /// filled, on failure.
@@ -42,6 +47,7 @@ class ByteSource {
 
  private:
   std::uint64_t expectedSize_;
+  std::string encodingHint_;
   std::string held_;      // of the bytes to be read, the first ones
   std::size_t next_ = 0;  // of these, the first that is still to be read
   Read read_;             // of the others; none for bytes in memory

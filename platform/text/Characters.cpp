@@ -14,6 +14,13 @@ std::int32_t nextNonASCIICharacter(std::string_view text, std::size_t& position)
   return character;
 }
 
+bool isUTF8(std::string_view text) {
+  for (std::size_t position = 0; position < text.size();) {
+    if (nextCharacter(text, position) < 0) return false;
+  }
+  return true;
+}
+
 std::size_t characterCount(std::string_view text) {
   std::size_t count = 0;
   for (std::size_t position = 0; position < text.size(); ++count) nextCharacter(text, position);

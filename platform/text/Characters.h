@@ -20,6 +20,9 @@ inline std::int32_t nextCharacter(std::string_view text, std::size_t& position) 
   return isASCII(text[position]) ? text[position++] : nextNonASCIICharacter(text, position);
 }
 
+/// Whether the text holds no malformed sequence.
+bool isUTF8(std::string_view text);
+
 std::size_t characterCount(std::string_view text);
 
 /// The first `count` characters, or all of a shorter text.

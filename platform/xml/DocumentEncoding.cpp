@@ -4,6 +4,7 @@
 #include <array>
 
 #include "platform/text/ASCII.h"
+#include "platform/text/Characters.h"
 #include "platform/text/TextEncoding.h"
 
 namespace platform {
@@ -72,7 +73,7 @@ std::optional<std::string> encodingMeantBy(std::string_view label) {
 
 }  // namespace
 
-DocumentEncoding DocumentEncoding::of(std::string_view bytes) {
+DocumentEncoding DocumentEncoding::of(std::string_view bytes, std::string_view hint) {
   for (const ByteOrderMark& mark : kByteOrderMarks) {
     if (bytes.starts_with(mark.bytes)) {
       return {.name = std::string(mark.encoding), .markLength = mark.bytes.size()};
@@ -81,7 +82,10 @@ DocumentEncoding DocumentEncoding::of(std::string_view bytes) {
   const std::string_view shown = encodingOfZeros(bytes);
   if (!shown.empty()) return {.name = std::string(shown)};
   const std::string_view label = declaredEncoding(bytes);
-  if (label.empty()) return {.name = "UTF-8"};
+  if (label.empty()) {
+    const std::optional<std::string> hinted = encodingMeantBy(hint);
+    return {.name = hinted && !isUTF8(bytes) ? hinted : "UTF-8"};
+  }
   return {.name = encodingMeantBy(label),
           .label = std::string(label),
           .position = positionBehind({bytes.data(), label.data()})};

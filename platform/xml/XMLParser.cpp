@@ -46,7 +46,8 @@ bool makeUTF8(ByteSource& document, std::optional<XMLFault>& fault) {
   std::string_view head = document.head(error);
   DocumentEncoding encoding = DocumentEncoding::of(head);
   // The declaration may end behind the head.
-  const bool isTold = encoding.name == "UTF-8" && head.find('>') != std::string_view::npos;
+  const bool isTold = encoding.name == "UTF-8" && head.find('>') != std::string_view::npos &&
+                      document.encodingHint().empty();
   if (isTold) return true;
 
   std::optional<std::string> bytes;
@@ -55,7 +56,7 @@ bool makeUTF8(ByteSource& document, std::optional<XMLFault>& fault) {
     fault = faultOfReading(error);
     return false;
   }
-  encoding = DocumentEncoding::of(*bytes);
+  encoding = DocumentEncoding::of(*bytes, document.encodingHint());
   if (encoding.name && encoding.name != "UTF-8") {
     bytes = convertedToUTF8(std::string_view(*bytes).substr(encoding.markLength), *encoding.name);
   }

@@ -12,7 +12,7 @@ struct NamedError {
   int value;
 };
 
-constexpr std::array<NamedError, 14> kErrors = {{{"EACCES", EACCES},
+constexpr std::array<NamedError, 16> kErrors = {{{"EACCES", EACCES},
                                                  {"EAGAIN", EAGAIN},
                                                  {"EEXIST", EEXIST},
                                                  {"EINTR", EINTR},
@@ -20,9 +20,11 @@ constexpr std::array<NamedError, 14> kErrors = {{{"EACCES", EACCES},
                                                  {"EIO", EIO},
                                                  {"EMFILE", EMFILE},
                                                  {"ENOENT", ENOENT},
+                                                 {"ENOLCK", ENOLCK},
                                                  {"ENOMEM", ENOMEM},
                                                  {"ENOSPC", ENOSPC},
                                                  {"ENOSYS", ENOSYS},
+                                                 {"EPERM", EPERM},
                                                  {"EROFS", EROFS},
                                                  {"EWOULDBLOCK", EWOULDBLOCK},
                                                  {"EXDEV", EXDEV}}};

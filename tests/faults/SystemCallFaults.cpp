@@ -74,6 +74,8 @@ constexpr auto kCalls = std::to_array<Call>({
     {.number = SYS_fchmod, .kind = "fchmod", .descriptor = 0},
     {.number = SYS_fsync, .kind = "fsync", .descriptor = 0},
     {.number = SYS_fdatasync, .kind = "fsync", .descriptor = 0},
+    {.number = SYS_syncfs, .kind = "syncfs", .descriptor = 0},
+    {.number = SYS_utimensat, .kind = "utimens", .path = 1, .directory = 0},
     {.number = SYS_fadvise64, .kind = "fadvise", .descriptor = 0},
     {.number = SYS_flock, .kind = "flock", .descriptor = 0},
     {.number = SYS_fcntl, .kind = "fcntl", .descriptor = 0},

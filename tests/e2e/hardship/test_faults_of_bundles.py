@@ -11,7 +11,7 @@ import plistlib
 import unittest
 
 from bundle_support import contents
-from fault_support import (COVER, FACE, ITEMS, LEFTOVER, NAMES, NO_INFO, ORIGINALS, Tally, show, show_feed)
+from fault_support import (COVER, FACE, INFO, ITEMS, LEFTOVER, NAMES, NO_INFO, ORIGINALS, Tally, show, show_feed)
 from fault_sweep import REFERENCE, STREAMS, Sweep, table
 from support import LOADING, soaking
 
@@ -22,36 +22,48 @@ def tearDownModule():
     TALLY.show()
 
 
-# A directory that cannot be looked at is made, and one that exists is accepted then. Leftovers of earlier runs
-# are removed where that can be done. "Posters" may be a way out of the bundle as long as that is not known.
+# A directory that cannot be looked at is made, and one that exists is accepted then. One that may not be read is
+# opened all the same, and not listed. Leftovers of earlier runs are removed where that can be done. A "Posters" that
+# is not known to lie inside is not used. What cannot be locked is filled without a lock.
 DIRECTORIES = """
     stat                                    parent       done
     mkdir                                   parent       Could not generate bundle: Could not create bundle: {error}\\n
     stat                                    bundle       done
     mkdir                                   bundle       Could not generate bundle: Could not create bundle: {error}\\n
-    opendir fstat fcntl getdents close      bundle       leftovers may stay
+    opendir                                 bundle       Could not generate bundle: Could not create bundle: {error}\\n
+    fstat                                   bundle#1     done
+    flock                                   bundle       done
+    fstat                                   bundle#2     leftovers may stay
+    dup fcntl getdents close                bundle       leftovers may stay
+    lseek                                   bundle       done
     lstat reopen flock unlink close         leftover     leftovers may stay
-    stat                                    Posters      done
-    mkdir                                   Posters      without posters
-    opendir fstat fcntl getdents close      Posters      leftovers may stay
-    lstat                                   Posters#1    without posters
-    lstat                                   Posters#2    no path for the cover
-    lstat                                   Posters#3    no path for the face
+    fstat                                   bundle#3     posters lost
+    opendir mkdir                           Posters      posters lost
+    fstat                                   Posters#1    posters lost
+    opendir fstat                           above        posters lost
+    close                                   above        done
+    fstat                                   Posters#2    done
+    flock                                   Posters      done
+    fstat                                   Posters#3    leftovers may stay
+    dup fcntl getdents close                Posters      leftovers may stay
+    lseek                                   Posters      done
+    fstat                                   Posters#4    done
+    fstat                                   bundle#4     done
+    syncfs                                  bundle       reference file lost
+    fsync                                   bundle       known too late
 """
 
-# An original, the hidden file that is made of it, and its final name. A hidden file that is not surely ours is
-# left for another one; copying inside of the kernel is only tried.
+# An original, the hidden file that is made of it, and its final name. Copying inside of the kernel is only tried, and
+# so is giving a copy what its original has. What replaces a file, and a copy, is told to the disk.
 FETCHING = """
     stat                                    original     done
     open fstat read                         original     item lost
     close                                   original     done
     lstat                                   final        done
     create                                  hidden       item lost
-    flock fstat lstat                       hidden       done
-    copy_file_range                         hidden       done
-    write dup                               hidden       item lost
-    close                                   hidden#1     item lost
-    close                                   hidden#2     done
+    copy_file_range fchmod utimens          hidden       done
+    write fsync                             hidden       item lost
+    close                                   hidden       item lost
     rename                                  final        item lost
 """
 
@@ -66,7 +78,7 @@ class BundleFaultTest(Sweep):
         super().setUp()
         self.originals()
         self.roles = {"sub": "parent", self.in_bundle("."): "bundle", self.in_bundle("Posters"): "Posters",
-                      "show.plist": "source"}
+                      self.in_bundle("Posters") + "/..": "above", "show.plist": "source"}
         self.source = "show.plist"
 
     def reference_file(self, locate):
@@ -107,20 +119,23 @@ class BundleFaultTest(Sweep):
             return self.assertBundle(run, {self.item_of(run, call)})
         if told == "leftovers may stay":
             return self.assertBundle(run, leftovers=self.leftovers())
-        if told == "without posters":
-            exist = self.in_bundle("Posters") in self.before
-            return self.assertBundle(run, () if exist else {COVER, FACE}, self.leftovers(), posters=exist)
-        if told.startswith("no path for the "):
-            lost, subject = (COVER, 'podcast "Show"') if told.endswith("cover") else (FACE, 'episode "One"')
-            return self.assertBundle(run, {lost}, warnings={
-                lost: f"Could not generate sane path for poster image for {subject}"})
+        if call.kind == "opendir" and run.faults[0].error == "EACCES" and call.path != self.in_bundle("Posters") + "/..":
+            return self.assertBundle(run, leftovers=self.leftovers())
+        if told == "posters lost":
+            exist = self.in_bundle("Posters") in contents(self.root)
+            return self.assertBundle(run, {COVER, FACE}, self.leftovers(), posters=exist)
+        if told == "reference file lost":
+            return self.assertBundle(run, {INFO})
+        if told == "known too late":
+            self.assertEqual((run.status, run.stderr.decode()), (1, NO_INFO), run)
+            return self.assertBundle(run._replace(status=0, stderr=b"", stdout=run.stdout + b"[N] Done!\n"))
         if told == "unsaid":
             return self.assertBundle(run._replace(stdout=self.whole.stdout))
         progress = LOADING if self.is_late(told) else b""
         self.assertEqual((run.status, run.stderr.decode(), run.stdout), (1, self.message(told, run), progress), run)
         # What was made on the way to the failure stays: directories, and nothing in them.
         added = contents(self.root).items() - self.before.items()
-        return self.assertLessEqual(added, {("sub", None)}, run)
+        return self.assertLessEqual(added, {("sub", None), (self.in_bundle("."), None)}, run)
 
     def prepare(self, locate, source=None):
         """A server of runs for a source, the show's reference file by default; a run without faults is judged."""
@@ -196,10 +211,13 @@ class BundleFaultTest(Sweep):
         self.assertBundle(run._replace(stdout=self.whole.stdout))
 
     def test_a_file_system_without_exclusive_renaming(self):
-        # A link under the final name serves instead. What it leaves under the hidden name is removed, else it stays.
+        # A link under the final name serves instead; what it leaves under the hidden name is removed, else it stays.
+        # Without links, an empty file that is made under the final name is replaced, or removed.
         server = self.prepare(self.in_root)
         for refusal, (number, name) in itertools.product(("EINVAL", "ENOSYS"), enumerate(ITEMS[:-1], 1)):
-            for then, lost in (("", ()), (",link@1=EIO", {name}), (",link@1=EEXIST", {name})):
+            for then, lost in (("", ()), (",link@1=EEXIST", {name}), (",link@1=EPERM", ()),
+                               (f",link@1=EPERM,create@{number + 1}=EEXIST", {name}),
+                               (f",link@1=EPERM,rename@{number + 1}=EIO", {name})):
                 with self.subTest(name, refusal=refusal, then=then):
                     self.restore()
                     run = server.run(f"rename@{number}={refusal}{then}")
@@ -217,7 +235,8 @@ class BundleFaultTest(Sweep):
 
     def test_hidden_names_that_are_taken(self):
         server = self.prepare(self.in_root)
-        for plan in ("create@1=EEXIST", "create@3=EEXIST", "flock@2=EAGAIN", "create@/2=EEXIST", "flock@/2=EAGAIN"):
+        for plan in ("create@1=EEXIST", "create@3=EEXIST", "create@/2=EEXIST", "flock@1=ENOLCK,flock@3=EAGAIN",
+                     "flock@1=ENOLCK,flock@2=ENOLCK,flock@/2=EAGAIN"):
             with self.subTest(plan):
                 self.restore()
                 run = server.run(plan)
@@ -252,7 +271,7 @@ class BundleFaultTest(Sweep):
     def test_a_disk_that_is_full_from_now_on(self):
         full = "write@{number}+=ENOSPC,copy_file_range@{number}+=ENOSPC"
         created = "create@{number}+=ENOSPC,copy_file_range@1+=EXDEV"
-        opened = "open@{number}+=EMFILE,create@{number}+=EMFILE,dup@{number}+=EMFILE,opendir@1+=EMFILE"
+        opened = "open@{number}+=EMFILE,create@{number}+=EMFILE,dup@{number}+=EMFILE,opendir@{number}+=EMFILE"
         self.earlier_bundle()
         server = self.prepare(self.as_url)
         for plan in (full, created, opened):

@@ -13,7 +13,7 @@ def tearDownModule():
     TALLY.show()
 
 
-INTERRUPTIBLE = ("open", "create", "reopen", "flock", "read", "write", "copy_file_range", "poll")
+INTERRUPTIBLE = ("open", "opendir", "create", "reopen", "flock", "read", "write", "copy_file_range", "fsync", "syncfs", "poll")
 PIECEWISE = ("read", "write", "copy_file_range", "send", "recv")
 
 

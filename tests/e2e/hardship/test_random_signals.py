@@ -255,19 +255,6 @@ class KillTest(InterruptionTestCase):
         self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", ".qel-notes.part"})
         self.assertTrue(self.path(name).exists())
 
-    def test_a_run_beside_this_one_keeps_its_hidden_file(self):
-        web = self.server()
-        url, gate = self.held(web, "/one.mp3", b"first", b"later")
-        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        source = self.reference({"Episodes": [{"EpisodeReference": web.serve("/two.mp3", b"two")}]}, name="two.plist")
-        self.assertWarns(self.create(source))
-        gate.open()
-        process.communicate(timeout=60)
-        self.assertEqual(process.returncode, 0)
-        self.assertEqual(self.files(), {"one.mp3": b"firstlater", "two.mp3": b"two"})
-
 
 if __name__ == "__main__":
     unittest.main()

@@ -109,11 +109,12 @@ class FeedServer:
                 exchange.send(body[start:start + piece])
         return self.route(path, answer)
 
-    def raw(self, path, answer_bytes):
-        """Sends the bytes, whatever they are, and closes the connection."""
+    def raw(self, path, answer_bytes, closes=True):
+        """Sends the bytes, whatever they are, and closes the connection or not."""
         def answer(exchange):
             exchange.send(answer_bytes)
-            exchange.close()
+            if closes:
+                exchange.close()
         return self.route(path, answer)
 
 

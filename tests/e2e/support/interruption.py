@@ -6,7 +6,8 @@ import subprocess
 from bundle_support import BundleTestCase, hidden
 from support import start
 
-ENDING_SIGNALS = (signal.SIGINT, signal.SIGTERM, signal.SIGHUP)
+ENDING_SIGNALS = (signal.SIGINT, signal.SIGTERM, signal.SIGHUP, signal.SIGQUIT, signal.SIGXCPU, signal.SIGALRM,
+                  signal.SIGUSR1, signal.SIGUSR2, signal.SIGVTALRM, signal.SIGRTMIN)
 
 
 def expect_signals():

@@ -34,7 +34,8 @@ SANITIZER_STATUS = 99
 _CLOSING = {0: "<&-", 1: ">&-", 2: "2>&-"}
 
 # Nothing of the machine may decide a result, unless a test asks for it.
-_HIDDEN_VARIABLES = {"http_proxy", "https_proxy", "all_proxy", "no_proxy", "lang", "language"}
+_HIDDEN_VARIABLES = {"http_proxy", "https_proxy", "all_proxy", "no_proxy", "lang", "language", "curl_ca_bundle",
+                     "ssl_cert_file", "ssl_cert_dir", "sslkeylogfile"}
 
 
 class Result(NamedTuple):

@@ -227,6 +227,70 @@ TEST_F(FileManagerTest, CopyLeavesAloneWhatAppearsMeanwhile) {
   EXPECT_THAT(directory_.names(), ElementsAre("copy", "source"));
 }
 
+TEST_F(FileManagerTest, CopyHasThePermissionsAndTheTimeOfItsOriginal) {
+  const std::string source = directory_.addFile("source", "content");
+  const std::array<timespec, 2> times = {timespec{5, 0}, timespec{1234567890, 123456789}};
+  ::utimensat(AT_FDCWD, source.c_str(), times.data(), 0);
+  for (const mode_t mode : {0644U, 0600U, 04755U, 0400U}) {
+    ::chmod(source.c_str(), mode);
+    EXPECT_TRUE(copyFile(source, directory_ / "copy"));
+    struct stat status {};
+    EXPECT_EQ(::stat((directory_ / "copy").c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777U, mode & 0777U);
+    EXPECT_EQ(status.st_mtim.tv_sec, 1234567890);
+    EXPECT_EQ(status.st_mtim.tv_nsec, 123456789);
+    std::filesystem::remove(directory_ / "copy");
+  }
+}
+
+TEST_F(FileManagerTest, CopyOfAFileThatIsCutMeanwhileIsRefused) {
+  const std::string source = directory_ / "source";
+  for (const std::size_t left : {0U, 1U, 299999U}) {
+    for (const bool isCopiedBefore : {false, true}) {
+      directory_.addFile("source", largeContent(300000));
+      int calls = 0;
+      const Interposed cut(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+        // Before anything of it was read, and after all was.
+        if (isCopiedBefore && ++calls == 1) return ssize_t{300000};
+        std::filesystem::resize_file(source, left);
+        if (!isCopiedBefore) return ssize_t{0};
+        errno = EXDEV;
+        return ssize_t{-1};
+      }));
+      EXPECT_FALSE(copyFile(source, directory_ / "copy")) << left << isCopiedBefore;
+      EXPECT_THAT(directory_.names(), ElementsAre("source"));
+    }
+  }
+}
+
+TEST_F(FileManagerTest, CopyOfAFileThatGrowsMeanwhileHasWhatWasFound) {
+  const std::string source = directory_.addFile("source", "content");
+  const Interposed growing(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+    directory_.addFile("source", "content and more");
+    return ssize_t{0};
+  }));
+  EXPECT_TRUE(copyFile(source, directory_ / "copy"));
+  EXPECT_EQ(contentOf(directory_ / "copy"), "content and more");
+}
+
+TEST_F(FileManagerTest, CopyIsOnTheDiskBeforeItHasItsName) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  const std::string source = directory_.addFile("source", "content");
+  EXPECT_TRUE(holdsInChild([&] {
+    return refuseSystemCall(SYS_fdatasync, EIO) && !copyFile(source, directory_ / "copy");
+  }));
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
+}
+
+TEST_F(FileManagerTest, CopiesIntoAnOpenDirectory) {
+  const std::string source = directory_.addFile("source", "content");
+  const Directory open = *Directory::open(directory_.path(), error_);
+  EXPECT_TRUE(copyFile(source, {open, "copy"}));
+  EXPECT_EQ(contentOf(directory_ / "copy"), "content");
+  EXPECT_FALSE(copyFile(source, {open, "copy"}));
+  EXPECT_FALSE(copyFile(source, {open, "sub/copy"}));
+}
+
 TEST_F(FileManagerTest, FailedReadFailsTheWhole) {
   if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
   const std::string source = directory_.addFile("source", "content");

@@ -18,6 +18,7 @@
 #include "platform/files/StandardStreams.h"
 #include "platform/files/TemporaryFile.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace platform {
@@ -72,6 +73,22 @@ TEST(ProcessTest, ClosedStandardStreamsAreOpenedOnNothing) {
                 return ::open(path.c_str(), O_RDONLY) > 2 ? 0 : 2;
               }),
               0);
+  }
+}
+
+TEST(ProcessTest, EndsWhereAClosedStreamCannotBeOpened) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  for (const int closed : {STDIN_FILENO, STDOUT_FILENO}) {
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(exitStatusOfChild([&] {
+                ::close(closed);
+                if (!refuseSystemCall(SYS_openat, ENOENT)) return 2;
+                prepareProcess();
+                return 0;
+              }),
+              1);
+    EXPECT_EQ(testing::internal::GetCapturedStderr(),
+              "A standard stream is closed, and /dev/null cannot be opened.\n");
   }
 }
 

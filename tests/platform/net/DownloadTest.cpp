@@ -16,6 +16,7 @@
 #include "platform/net/EventLoop.h"
 #include "platform/net/ResourceReader.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/GzipSamples.h"
 #include "tests/support/HTTPTestServer.h"
 #include "tests/support/TemporaryDirectory.h"
 
@@ -114,11 +115,30 @@ TEST_F(DownloadTest, UnknownLengthIsAnnouncedAsMinusOne) {
   EXPECT_EQ(contentOf(destination_), "media");
 }
 
-TEST_F(DownloadTest, AsksForNoCodingAndKeepsWhatComes) {
-  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("coded", "Content-Encoding: gzip\r\n")).back(),
-            "finished");
-  EXPECT_EQ(contentOf(destination_), "coded");
-  EXPECT_EQ(server_.requests().at(0).find("Accept-Encoding"), std::string::npos);
+TEST_F(DownloadTest, AsksForNoCodingAndUndoesGzip) {
+  const std::string size = std::to_string(kGzipText.size());
+  EXPECT_THAT(downloadAnswer(HTTPTestServer::response(kGzipStream, "Content-Encoding: gzip\r\n")),
+              ElementsAre("response -1", "data " + size, "finished"));
+  EXPECT_EQ(contentOf(destination_), kGzipText);
+  EXPECT_NE(server_.requests().at(0).find("\r\nAccept-Encoding: identity\r\n"), std::string::npos);
+  EXPECT_THAT(downloadAnswer(HTTPTestServer::response("media", "Content-Encoding: Identity\r\n")),
+              ElementsAre("response 5", "data 5", "finished"));
+}
+
+TEST_F(DownloadTest, OtherCodingsAreFailures) {
+  const std::string foreign =
+      "failed: transfer 61: The body comes in a content coding that was not asked for";
+  for (const std::string coding : {"br", "gzip, br", "gzip\r\nContent-Encoding: gzip", "utf-8"}) {
+    EXPECT_THAT(
+        downloadAnswer(HTTPTestServer::response("media", "Content-Encoding: " + coding + "\r\n")),
+        ElementsAre(foreign));
+  }
+  const std::string gzip = "Content-Encoding: gzip\r\n";
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response(kGzipStream.substr(0, 30), gzip)).back(),
+            "failed: transfer 61: The compressed body is cut short");
+  EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media", gzip)).back(),
+            "failed: transfer 61: The compressed body is malformed");
+  EXPECT_THAT(directory_.names(), ElementsAre());
 }
 
 TEST_F(DownloadTest, DataEventsComeAsTheDataComes) {

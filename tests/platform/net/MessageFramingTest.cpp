@@ -52,6 +52,34 @@ TEST(MessageFramingTest, TellsTheAnnouncedLength) {
   }
 }
 
+TEST(MessageFramingTest, TellsTheContentCodings) {
+  const struct {
+    std::vector<std::string_view> lines;
+    std::vector<std::string> codings;
+  } rows[] = {
+      {{}, {}},
+      {{"Content-Encoding: gzip\r\n", "\r\n"}, {"gzip"}},
+      {{"content-encoding:X-GZip , BR\r\n"}, {"x-gzip", "br"}},
+      {{"Content-Encoding: identity, ,,Identity"}, {}},
+      {{"Content-Encoding:"}, {}},
+      {{"Content-Encoding: gzip", "Vary: *", "Content-Encoding: gzip"}, {"gzip", "gzip"}},
+      {{"Content-Encoding: gzip,", "\tbr"}, {"gzip", "br"}},
+      {{"Content-Encoding: br", "Vary: *", " gzip"}, {"br"}},
+      {{"Content-Encoding: br", "HTTP/1.1 200 OK", "Content-Encoding: gzip"}, {"gzip"}},
+  };
+  for (const auto& row : rows) {
+    const MessageFraming framing = framingOf(row.lines);
+    EXPECT_EQ(framing.contentCodings(), row.codings);
+    EXPECT_EQ(framing.fault(), "");
+  }
+}
+
+TEST(MessageFramingTest, TellsWhetherTheConnectionEndsTheBody) {
+  EXPECT_TRUE(framingOf({"Transfer-Encoding: identity"}).endsWithConnection());
+  EXPECT_FALSE(framingOf({"Transfer-Encoding: chunked"}).endsWithConnection());
+  EXPECT_FALSE(framingOf({"Content-Length: 0"}).endsWithConnection());
+}
+
 TEST(MessageFramingTest, FaultsAreNamed) {
   struct Row {
     std::vector<std::string_view> lines;
@@ -79,6 +107,7 @@ TEST(MessageFramingTest, FaultsAreNamed) {
       {{"Transfer-Encoding: xchunked"}, kUnknownCoding},
       {{"Content-Length : 5"}, kBrokenField},
       {{"Transfer-Encoding\t: chunked"}, kBrokenField},
+      {{"Content-Encoding : gzip"}, kBrokenField},
       {{"Content-Length"}, kBrokenField},
       {{"Content-Length: 5", " 6"}, kBrokenField},
       {{"Transfer-Encoding: chunked", "\tgzip"}, kBrokenField},

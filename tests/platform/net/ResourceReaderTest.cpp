@@ -4,6 +4,8 @@
 #include <sys/stat.h>
 
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "tests/support/GzipSamples.h"
 #include "tests/support/HTTPTestServer.h"
@@ -119,6 +121,26 @@ TEST_F(ResourceReaderTest, ContentCodingsThatWereNotAskedForAreFailures) {
 TEST_F(ResourceReaderTest, NamesThatAreNoContentCodingsDoNoHarm) {
   for (const char* coding : {"", "identity", "none", "utf-8", "binary, identity"}) {
     EXPECT_EQ(readCoded(coding), "<rss/>") << coding;
+  }
+}
+
+TEST_F(ResourceReaderTest, TheCharsetIsTheEncodingHint) {
+  const std::vector<std::pair<std::string, std::string>> rows = {
+      {"text/xml", ""},
+      {"text/xml; charset=koi8-r", "koi8-r"},
+      {"text/xml;CharSet = \"KOI8-R\" ;charset=utf-8", "KOI8-R"},
+      {"text/xml; a=\"b;charset=c\\\"; charset=d\"; charset=\"e\\-f\"", "e-f"},
+      {"text/xml; charset", ""},
+      {"text/xml; charset=", ""},
+      {"charset=koi8-r; x", "koi8-r"},
+      {"\"", ""},
+  };
+  for (const auto& [type, hint] : rows) {
+    server_.serve("/", HTTPTestServer::response("<rss/>", "Content-Type: " + type + "\r\n"));
+    ErrorSlot error;
+    const auto source = readResource(URL::parse(server_.url("/")).value(), error);
+    ASSERT_TRUE(source);
+    EXPECT_EQ(source->encodingHint(), hint) << type;
   }
 }
 

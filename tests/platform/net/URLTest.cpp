@@ -42,6 +42,8 @@ TEST(URLTest, Accepts) {
        "http://h/%F0%9F%98%80%E2%80%AF"},
       {"http://\u00FCser@B\u00FCcher.example:80/", "http", "/", "/",
        "http://%C3%BCser@xn--bcher-kva.example:80/"},
+      {"http://b%C3%BCcher.%65xample/", "http", "/", "/", "http://xn--bcher-kva.example/"},
+      {"http://%65xample/", "http", "/", "/", "http://%65xample/"},
       {"file:/p", "file", "/p", "/p", "file:/p"},
       {"file:///p", "file", "/p", "/p", "file:///p"},
       {"file://localhost/p", "file", "/p", "/p", "file://localhost/p"},
@@ -155,6 +157,11 @@ TEST(URLTest, Rejects) {
       "http://a\uFF1A80/",
       "http://a\uFF0541/",
       "http://a\uFF3Bb/",
+      "http://\u00FC%2Fb/",
+      "http://\u00FC%2541/",
+      "http://\u00FC%20/",
+      "http://%FC/",
+      "http://%C3%BC%40b/",
       "x://a\u2009b/",
       "file:",
       "file:p",
@@ -171,6 +178,65 @@ TEST(URLTest, Rejects) {
   };
   for (const std::string& row : rows) {
     EXPECT_FALSE(URL::parse(row).has_value()) << "accepted: " << ::testing::PrintToString(row);
+  }
+}
+
+TEST(URLTest, ResolvesReferences) {
+  const URL base = *URL::parse("HTTP://u:p@h:81/a/b?q#f");
+  const struct {
+    std::string reference, text;
+  } rows[] = {
+      {"c", "http://u:p@h:81/a/c"},
+      {"./../c?d/e", "http://u:p@h:81/a/./../c?d/e"},
+      {"/c:d", "http://u:p@h:81/c:d"},
+      {"?c:d", "http://u:p@h:81/a/b?c:d"},
+      {"", "http://u:p@h:81/a/b"},
+      {"#c", "http://u:p@h:81/a/b"},
+      {"//other/c", "http://other/c"},
+      {"//other?c", "http://other?c"},
+      {"HTTPS://\u00FC/\u00FC?\u00FC#c#d", "HTTPS://xn--tda/%C3%BC?%C3%BC"},
+      {"c d|\"<>{}\\^`[]", "http://u:p@h:81/a/c%20d%7C%22%3C%3E%7B%7D%5C%5E%60%5B%5D"},
+      {"?a[]=100%&b=%41%4", "http://u:p@h:81/a/b?a%5B%5D=100%25&b=%41%254"},
+      {"\xFC\u0085", "http://u:p@h:81/a/%FC%C2%85"},
+      {"file:///c", "file:///c"},
+      {"data:c d", "data:c%20d"},
+      {"c:d", "c:d"},
+      {":c", "none"},
+      {"//other c/", "none"},
+      {"//\xFC/", "none"},
+      {"http://", "none"},
+      {"http:c", "none"},
+      {"c\x01", "none"},
+      {"c\x7F", "none"},
+      {"//a\\b/", "none"},
+      {"http://h:99999/", "none"},
+  };
+  for (const auto& row : rows) {
+    const std::optional<URL> url = base.resolved(row.reference);
+    EXPECT_EQ(url ? url->encodedText() : "none", row.text) << row.reference;
+  }
+  EXPECT_EQ(URL::parse("http://h")->resolved("a")->encodedText(), "http://h/a");
+  EXPECT_EQ(URL::parse("http://h")->resolved("?a")->encodedText(), "http://h?a");
+}
+
+TEST(URLTest, AdoptsTheUserOfTheSameServerAlone) {
+  const struct {
+    std::string first, second, text;
+  } rows[] = {
+      {"http://u:p@h/", "http://h/a", "http://u:p@h/a"},
+      {"http://u@H:80/", "HTTP://h/a", "HTTP://u@h/a"},
+      {"https://u@h:443/", "https://h:/a", "https://u@h:/a"},
+      {"http://u@h/", "http://v@h/a", "http://v@h/a"},
+      {"http://h/", "http://h/a", "http://h/a"},
+      {"http://u@h/", "https://h/a", "https://h/a"},
+      {"http://u@h/", "https://h:80/a", "https://h:80/a"},
+      {"http://u@h/", "http://h:8080/a", "http://h:8080/a"},
+      {"http://u@h/", "http://h.example/a", "http://h.example/a"},
+  };
+  for (const auto& row : rows) {
+    URL url = *URL::parse(row.second);
+    url.adoptUserOf(*URL::parse(row.first));
+    EXPECT_EQ(url.encodedText(), row.text);
   }
 }
 

@@ -10,6 +10,13 @@
 
 namespace {
 
+TEST(CharactersTest, TellsUTF8) {
+  for (const char* text : {"", "abc", "\u00E9", "a\U0001F600"}) EXPECT_TRUE(platform::isUTF8(text));
+  for (const char* text : {"\xE9", "a\xC3", "\xC0\xAF", "\xED\xA0\x80"}) {
+    EXPECT_FALSE(platform::isUTF8(text));
+  }
+}
+
 TEST(CharactersTest, LengthsAndFirstCharacters) {
   const struct {
     std::string_view text;

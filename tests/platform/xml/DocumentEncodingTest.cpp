@@ -53,6 +53,27 @@ TEST(DocumentEncodingTest, AMarkDecidesBeforeTheZerosAndTheseBeforeTheDeclaratio
   }
 }
 
+TEST(DocumentEncodingTest, AHintCountsWhereTheDocumentTellsNothingAndIsNoUTF8) {
+  const struct {
+    std::string_view document;
+    std::string_view hint;
+    std::string_view name;
+  } rows[] = {
+      {"<r>\xC4</r>", "windows-1251", "ibm-5347_P100-1998"},
+      {"<?xml version='1.0'?><r>\xC4</r>", "latin1", "windows-1252"},
+      {"<r>\xC4</r>", "us-ascii", "windows-1252"},
+      {"<r>\xC4</r>", "utf-16", "UTF-8"},
+      {"<r>\xC4</r>", "unheard-of", "UTF-8"},
+      {"<r>\xC4</r>", "", "UTF-8"},
+      {"<r>\u00C4</r>", "KOI8-R", "UTF-8"},
+      {"\xEF\xBB\xBF<r>\xC4</r>", "KOI8-R", "UTF-8"},
+      {"<?xml version='1.0' encoding='UTF-8'?><r>\xC4</r>", "KOI8-R", "UTF-8"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(DocumentEncoding::of(row.document, row.hint).name, row.name) << row.document;
+  }
+}
+
 TEST(DocumentEncodingTest, TheDeclarationNamesIt) {
   const struct {
     std::string_view document;
