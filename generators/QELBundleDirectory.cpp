@@ -3,9 +3,12 @@
 #include <string_view>
 #include <utility>
 
+#include "cli/common/QELError.h"
 #include "generators/QELBundleNames.h"
 #include "platform/files/FileManager.h"
+#include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
+#include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListWriter.h"
 
 using platform::Directory;
@@ -13,12 +16,15 @@ using platform::ErrorSlot;
 using platform::FileIdentity;
 using platform::FilePlace;
 
-bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error) {
+bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error, Directory::Wait wait) {
   if (!platform::createDirectories(path, error)) return false;
   std::optional<Directory> opened = Directory::open(path, error);
   if (!opened) return false;
   bundle_ = std::move(*opened);
-  bundle_.lock(Directory::Wait::kForever);
+  if (bundle_.lock(wait) == Directory::Lock::kHeldByAnother) {
+    error = QELError(2, "Another run is filling it");
+    return false;
+  }
   platform::removeStaleTemporaryFiles(bundle_);
 
   ErrorSlot ignored;  // a poster that then cannot be saved is warned about
@@ -29,6 +35,19 @@ bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error) {
     platform::removeStaleTemporaryFiles(posters_);
   }
   return true;
+}
+
+std::optional<platform::Dictionary> QELBundleDirectory::readReferenceFile(const std::string& path,
+                                                                          ErrorSlot& error) {
+  const std::string file = platform::joinedPath(path, kReferenceFileName);
+  if (!platform::fileExists(file)) return platform::Dictionary();
+  std::optional<platform::ByteSource> bytes = platform::openWholeFile(file, error);
+  if (!bytes) return std::nullopt;
+  std::optional<platform::PropertyListFault> fault;
+  const auto value = platform::readPropertyList(std::move(*bytes), fault);
+  if (value && value->asDictionary()) return *value->asDictionary();
+  error = QELError(1, fault ? fault->description : "no dictionary at its root");
+  return std::nullopt;
 }
 
 std::optional<FilePlace> QELBundleDirectory::mediaPlace(const std::string& name) const {
@@ -67,14 +86,14 @@ bool QELBundleDirectory::isInUse(const FilePlace& place) const {
   return !isSamePlace && other.directory->identity(other.name) == identity;
 }
 
-bool QELBundleDirectory::writeReferenceFile(const platform::Dictionary& dictionary) {
+bool QELBundleDirectory::writeReferenceFile(const platform::Dictionary& dictionary,
+                                            ErrorSlot& error) {
   const std::string name(kReferenceFileName);
-  ErrorSlot ignored;  // the caller's message does not tell causes apart
   platform::TemporaryFile file;
-  return file.create({bundle_, name}, ignored, bundle_.attributesForSuccessor(name)) &&
+  return file.create({bundle_, name}, error, bundle_.attributesForSuccessor(name)) &&
          platform::writePropertyList(
-             dictionary, [&](std::string_view bytes) { return file.write(bytes, ignored); }) &&
-         syncFiles(ignored) && file.commitReplacing(ignored) && bundle_.sync(ignored);
+             dictionary, [&](std::string_view bytes) { return file.write(bytes, error); }) &&
+         syncFiles(error) && file.commitReplacing(error) && bundle_.sync(error);
 }
 
 /// The directories that were made, and the reference file in the making, are on the bundle's file

@@ -27,9 +27,18 @@ class QELBundleDirectory {
   static constexpr std::string_view kPostersName = "Posters";
 
   /// Makes the directory and its parents where they are missing, and "Posters", whose failure is
-  /// left to those who want to put something there; waits for the lock; removes what killed runs
-  /// left. False, and the slot filled, when there is no such directory.
-  bool open(const std::string& path, platform::ErrorSlot& error);
+  /// left to those who want to put something there; takes the lock, waiting for it or not; removes
+  /// what killed runs left. False, and the slot filled, when there is no such directory, and when
+  /// the lock is not waited for and held by another run.
+  bool open(const std::string& path, platform::ErrorSlot& error,
+            platform::Directory::Wait wait = platform::Directory::Wait::kForever);
+
+  const platform::Directory& directory() const { return bundle_; }
+
+  /// The reference dictionary of the bundle at the path, empty where there is none yet. Absent, and
+  /// the slot filled, when it cannot be read.
+  static std::optional<platform::Dictionary> readReferenceFile(const std::string& path,
+                                                               platform::ErrorSlot& error);
 
   /// Absent for a name that no file can have, and for the one that the reference file has.
   std::optional<platform::FilePlace> mediaPlace(const std::string& name) const;
@@ -42,8 +51,9 @@ class QELBundleDirectory {
   bool save(const platform::FilePlace& place, const std::function<bool()>& put);
 
   /// Writes the reference file, which replaces an earlier one and keeps its permissions. It gets
-  /// its name when everything that was saved is on the disk, and is there itself in the end.
-  bool writeReferenceFile(const platform::Dictionary& dictionary);
+  /// its name when everything that was saved is on the disk, and is there itself in the end. False,
+  /// and the slot filled, on failure.
+  bool writeReferenceFile(const platform::Dictionary& dictionary, platform::ErrorSlot& error);
 
  private:
   bool isInUse(const platform::FilePlace& place) const;

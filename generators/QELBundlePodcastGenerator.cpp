@@ -143,7 +143,7 @@ bool QELBundlePodcastGenerator::generateFromSource(QELPodcastSource& source, Err
   }
   if (!entries.empty()) dictionary.insert_or_assign("Episodes", std::move(entries));
 
-  if (!bundle.writeReferenceFile(dictionary)) {
+  if (!bundle.writeReferenceFile(dictionary, cause)) {
     error = QELError(1, "Could not write Info.plist file");
     return false;
   }

@@ -111,12 +111,24 @@ void populate(XMLElement element, const Item& item, bool stampNow, const QELFeed
 /// What the feed will hardly exceed, in bytes: one that moves while it grows stands in memory twice
 /// for a moment. What is not used of it costs nothing.
 std::size_t likelySize(const QELPodcastSource& source) {
-  constexpr std::size_t kSizeWithoutDescription = 1024;
-  std::size_t size = kSizeWithoutDescription;
+  std::size_t size = 1024;
+  // Each of these texts also brings its share of the markup, and of the texts that are short.
+  const auto add = [&size](const std::optional<Text>& text, std::size_t times) {
+    constexpr std::size_t kShare = 256;
+    if (text) size += kShare + times * text->size();
+  };
+  // A description stands there twice, and longer by what is escaped; of a path each byte may become
+  // three.
+  add(source.podcastDescription(), 3);
+  add(source.posterLocation(), 6);
   if (!source.episodes()) return size;
   for (const auto& episode : *source.episodes()) {
-    // It stands there twice, and longer by what is escaped.
-    size += kSizeWithoutDescription + 3 * episode->episodeDescription().value_or(Text()).size();
+    constexpr std::size_t kSizeOfEmptyItem = 16;
+    size += kSizeOfEmptyItem;
+    add(episode->title(), 1);
+    add(episode->episodeDescription(), 3);
+    add(episode->location(), 3);
+    add(episode->posterLocation(), 3);
   }
   return size;
 }

@@ -81,18 +81,23 @@ void FeedParser::didStartElement(const platform::XMLName& name,
     endItem();
     currentEpisode_ = &episodes_.emplace_back();
     currentEpisode_->reserve(kMostItemKeys);
+    feedParser_.count([](platform::MemoryBudget& budget) { return budget.takeRecords(); });
   } else if (name.local == "enclosure") {
     readEnclosure(attributes);
   } else if (name.local == "image") {
     parsingImage_ = true;
     if (isOfDirectory(name)) {
       if (const auto href = attributes.value("href")) {
+        countField(*href);
         target().insert_or_assign("poster"_text, Text(*href));
       }
     }
   } else if (name.local == "category" && isOfDirectory(name)) {
     // The first category wins: later ones and nested subcategories find the key taken.
-    if (const auto text = attributes.value("text")) target().emplace("category"_text, Text(*text));
+    if (const auto text = attributes.value("text")) {
+      countField(*text);
+      target().emplace("category"_text, Text(*text));
+    }
   }
 
   const auto* const end = RSScdataElements.end();
@@ -122,7 +127,10 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (local == "image") {
     parsingImage_ = false;
   } else if (local == "url") {
-    if (parsingImage_) target().emplace("poster"_text, Text(std::string_view(cdataBuffer_)));
+    if (parsingImage_) {
+      countField(cdataBuffer_);
+      target().emplace("poster"_text, Text(std::string_view(cdataBuffer_)));
+    }
     emptyBuffer();
   } else if (local == "link") {
     readLink();
@@ -151,18 +159,24 @@ void FeedParser::endItem() {
 void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
   if (!currentEpisode_) return;
   if (const auto url = attributes.value("url")) {
+    countField(*url);
     currentEpisode_->insert_or_assign("url"_text, Text(*url));
   }
   if (const auto length = attributes.value("length")) {
     const std::int64_t number = platform::leadingInteger(*length);
-    if (number > 0) currentEpisode_->insert_or_assign("contentLength"_text, number);
+    if (number > 0) {
+      countField();
+      currentEpisode_->insert_or_assign("contentLength"_text, number);
+    }
   }
   if (const auto type = attributes.value("type")) {
+    countField(*type);
     currentEpisode_->insert_or_assign("contentType"_text, Text(*type));
   }
 }
 
 void FeedParser::readAdvisoryLabel() {
+  countField();
   const std::string label = platform::lowercased(cdataBuffer_);
   if (label == "yes") {
     target().insert_or_assign("advisoryLabel"_text, "Explicit"_text);
@@ -174,6 +188,7 @@ void FeedParser::readAdvisoryLabel() {
 
 void FeedParser::readDate() {
   if (const auto date = dateWithRFC822String(cdataBuffer_)) {
+    countField();
     target().insert_or_assign("date"_text, *date);
   }
   emptyBuffer();
@@ -183,13 +198,21 @@ void FeedParser::readDate() {
 /// buffer is not emptied.
 void FeedParser::readLink() {
   if (const auto uuid = leadingUuid(documentMarker_.textBehindMarker(cdataBuffer_))) {
+    countField(*uuid);
     if (currentEpisode_) currentEpisode_->insert_or_assign("QELUUID"_text, Text(*uuid));
   } else if (const auto feedUuid = leadingUuid(collectionMarker_.textBehindMarker(cdataBuffer_))) {
     feedAttributes_.insert_or_assign("QELUUID"_text, Text(*feedUuid));
   }
 }
 
+void FeedParser::countField(std::string_view text) {
+  feedParser_.count([text](platform::MemoryBudget& budget) {
+    return budget.takeFields() && budget.takeWritten(text);
+  });
+}
+
 void FeedParser::takeText(const Text& key) {
+  countField(cdataBuffer_);
   target().insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
   emptyBuffer();
 }

@@ -100,6 +100,8 @@ class FeedParser : private platform::XMLParserEvents {
   /// The open item, or the channel between items.
   platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
   void takeText(const platform::Text& key);
+  /// Counts a value that is kept, and the characters of a text.
+  void countField(std::string_view text = {});
   void emptyBuffer();
 
   platform::Dictionary* currentEpisode_ = nullptr;  // the last of episodes_, or null between items

@@ -11,6 +11,7 @@
 #include "platform/net/URL.h"
 #include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
+#include "platform/text/FormattedText.h"
 
 namespace {
 
@@ -63,7 +64,8 @@ std::optional<int> QELCommandLine::parse(std::span<const char* const> arguments)
 
 void QELCommandLine::report(std::string_view message) const {
   platform::flushStandardOutput();
-  platform::writeToStandardError(std::string(name_).append(": ").append(message).append("\n"));
+  platform::writeToStandardError(
+      platform::formattedText("%@: %@\n", {name_, message}, platform::controlsOfStandardError()));
 }
 
 int QELCommandLine::wrongUse(std::string_view message) const {

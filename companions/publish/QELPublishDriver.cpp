@@ -1,11 +1,191 @@
 #include "companions/publish/QELPublishDriver.h"
 
+#include <algorithm>
+#include <chrono>
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <system_error>
+#include <utility>
+#include <vector>
+
+#include "cli/QELSourceResolution.h"
 #include "companions/common/QELCommandLine.h"
+#include "companions/publish/QELPublication.h"
+#include "companions/publish/QELPublishedFeedGenerator.h"
+#include "platform/files/FileReplacement.h"
+#include "platform/files/Paths.h"
+#include "platform/net/URL.h"
+#include "platform/text/ASCII.h"
+#include "platform/time/PointInTime.h"
+#include "sources/QELBundlePodcastSource.h"
+#include "sources/QELFeedPodcastSource.h"
+
+namespace {
+
+using OptionalString = std::optional<std::string>;
+
+/// As a source and as a feed: the standard streams.
+constexpr std::string_view kStandardStream = "-";
+
+struct Options {
+  OptionalString base;
+  OptionalString link;
+  OptionalString language;
+  OptionalString self;
+  QELDirectory directory;
+};
+
+/// A `take` that stores the text if it is a URL of the network.
+std::function<bool(const std::string&)> takeURL(OptionalString& text) {
+  return [&text](const std::string& value) {
+    const auto url = platform::URL::parse(value);
+    if (!url || (url->scheme() != "http" && url->scheme() != "https")) return false;
+    text = url->encodedText();
+    return true;
+  };
+}
+
+/// The same for one that others are made of: nothing stands behind its path.
+std::function<bool(const std::string&)> takeBase(OptionalString& text) {
+  return [&text, take = takeURL(text)](const std::string& value) {
+    if (!take(value) || value.find_first_of("?#") != std::string::npos) return false;
+    if (!text->ends_with('/')) *text += '/';
+    return true;
+  };
+}
+
+/// A `take` that stores what looks like a language tag of RFC 5646: letters first, hyphens between
+/// the parts.
+std::function<bool(const std::string&)> takeLanguage(OptionalString& tag) {
+  return [&tag](const std::string& value) {
+    const auto isOfTag = [](char c) {
+      return platform::isASCIILetter(c) || platform::isASCIIDigit(c) || c == '-';
+    };
+    tag = value;
+    return !value.empty() && platform::isASCIILetter(value.front()) && value.back() != '-' &&
+           value.find("--") == std::string::npos &&
+           std::all_of(value.begin(), value.end(), isOfTag);
+  };
+}
+
+/// The date that SOURCE_DATE_EPOCH gives to what is made, in seconds since 1970, and whether it is
+/// one at all.
+bool readStamp(std::optional<platform::PointInTime>& stamp) {
+  const char* text = std::getenv("SOURCE_DATE_EPOCH");
+  if (text == nullptr || *text == '\0') return true;
+  constexpr std::int64_t kEndOfYear9999 = 253402300799;
+  std::int64_t seconds = 0;
+  if (!QELTakeNumber(seconds, 0)(text) || seconds > kEndOfYear9999) return false;
+  stamp = platform::PointInTime(std::chrono::seconds(seconds));
+  return true;
+}
+
+/// Null when the text names no source, and when standard input holds none. A feed's directory
+/// elements are read under the prefix under which they are written, and under ours.
+std::unique_ptr<QELPodcastSource> sourceOf(const std::string& text, const QELDirectory& directory) {
+  if (text != kStandardStream) {
+    return initWithSourceString(text, {QELDirectory().prefix, directory.prefix});
+  }
+  return QELValidateSource(std::nullopt, true) ? initWithStandardInput() : nullptr;
+}
+
+/// The directory in which the files of the loaded source lie; absent for a feed of the network.
+OptionalString rootOf(const std::string& text, const QELPodcastSource& source) {
+  if (dynamic_cast<const QELBundlePodcastSource*>(&source) != nullptr) {
+    return source.location()->string();
+  }
+  std::string path = text;
+  if (dynamic_cast<const QELFeedPodcastSource*>(&source) != nullptr) {
+    const auto url = platform::URL::parse(text);
+    if (!url || url->scheme() != "file") return std::nullopt;
+    path = url->path();
+  }
+  path.erase(path.rfind('/') + 1);
+  if (platform::isAbsolutePath(path)) return platform::standardisedPath(path);
+  platform::ErrorSlot ignored;
+  const OptionalString directory = platform::currentDirectory(ignored);
+  if (!directory) return std::nullopt;
+  return platform::standardisedPath(platform::joinedPath(*directory, path));
+}
+
+/// Whether the feed would take the place of what it is made from.
+bool isSourceItself(const std::string& feed, const std::string& source) {
+  std::error_code ignored;
+  return std::filesystem::equivalent(feed, source, ignored) ||
+         std::filesystem::equivalent(feed, platform::joinedPath(source, "Info.plist"), ignored);
+}
+
+int publish(const QELCommandLine& commandLine, const Options& options,
+            const std::string& sourceText, const std::string& feed) {
+  std::optional<platform::PointInTime> stamp;
+  if (!readStamp(stamp)) {
+    commandLine.report("SOURCE_DATE_EPOCH is not a number of seconds since 1970");
+    return kNothingDone;
+  }
+  if (isSourceItself(feed, sourceText)) {
+    return commandLine.wrongUse("'" + feed + "' is the source itself");
+  }
+  const auto source = sourceOf(sourceText, options.directory);
+  if (!source) {
+    commandLine.report(
+        "'" + sourceText +
+        "' is no podcast: neither the URL of a feed nor a reference file (.plist) or "
+        "a bundle (.podcast) that can be read");
+    return kNothingDone;
+  }
+  platform::ErrorSlot error;
+  if (!source->loadSourceWithError(error)) {
+    commandLine.report("cannot load '" + sourceText + "': " + error->description);
+    return kNothingDone;
+  }
+
+  QELPublication publication(rootOf(sourceText, *source), options.base);
+  publication.setLink(options.link);
+  publication.prepare(*source);
+  QELPublishedFeedGenerator generator(options.directory, stamp);
+  generator.setLanguage(options.language);
+  generator.setSelfURL(options.self);
+  if (!generator.generateFromSource(*source, error) ||
+      !platform::replaceFile(feed, *generator.xmlData(), error)) {
+    commandLine.report("cannot write '" + feed + "': " + error->description);
+    return kSomethingToLookAt;
+  }
+
+  QELRemarks remarks = publication.remarks();
+  if (!options.language) remarks.add("the show has no language: name it with --language");
+  if (!options.self) remarks.add("the feed does not say where it will lie: name that with --self");
+  for (const std::string& line : remarks.lines()) commandLine.report("warning: " + line);
+  return kAllWell;
+}
+
+}  // namespace
 
 int QELRunPublish(std::span<const char* const> commandLine) {
-  QELCommandLine arguments("qel-publish", "[OPTION]... SOURCE FEED",
-                           "Writes the feed of a show as readers and podcast directories want it.",
-                           {});
+  Options options;
+  QELCommandLine arguments(
+      "qel-publish", "[OPTION]... SOURCE FEED",
+      "Writes the feed of a show as readers and podcast directories want it.\n"
+      "SOURCE is the URL of a feed, a reference file (.plist), a bundle (.podcast),\n"
+      "or - for a reference file on standard input. FEED is a file, or - for standard\n"
+      "output.",
+      {{"base", 'b', "URL", "where the directory of the show will lie", takeBase(options.base)},
+       {"link", 'l', "URL", "the page of the show", takeURL(options.link)},
+       {"language", 'L', "TAG", "the language of the show, as in en or pt-BR",
+        takeLanguage(options.language)},
+       {"self", 's', "URL", "where the feed will lie", takeURL(options.self)},
+       {"directory", 'd', "NAME=URI", "the prefix and namespace of directory elements",
+        QELTakeDirectory(options.directory)}});
   if (const auto status = arguments.parse(commandLine)) return *status;
-  return kAllWell;
+  const std::vector<std::string>& operands = arguments.operands();
+  if (operands.empty()) return arguments.wrongUse("SOURCE and FEED are missing");
+  if (operands.size() == 1) return arguments.wrongUse("FEED is missing");
+  if (operands.size() > 2) return arguments.wrongUse("'" + operands[2] + "' is one word too many");
+  return publish(arguments, options, operands[0], operands[1]);
 }

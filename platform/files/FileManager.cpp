@@ -111,13 +111,21 @@ bool createDirectories(const std::string& path, ErrorSlot& error) {
   return true;
 }
 
-bool copyFile(const std::string& source, const FilePlace& place) {
-  ErrorSlot error;
+bool copyFile(const std::string& source, const FilePlace& place, ErrorSlot& error) {
   std::optional<RegularFile> original = RegularFile::open(source, error);
-  if (!original || isTaken(place)) return false;
+  if (!original) return false;
+  if (isTaken(place)) {
+    error = posixError(EEXIST);
+    return false;
+  }
   TemporaryFile copy;
   return copy.create(place, error, original->attributes()) && copyAll(*original, copy, error) &&
          copy.sync(error) && copy.commitNew(error);
+}
+
+bool copyFile(const std::string& source, const FilePlace& place) {
+  ErrorSlot ignored;
+  return copyFile(source, place, ignored);
 }
 
 }  // namespace platform

@@ -22,7 +22,8 @@ EventSource::~EventSource() {
   *link = next_;
 }
 
-bool runEventLoopOnce() {
+bool runEventLoopOnce(std::optional<std::chrono::milliseconds> limit) {
+  bool hasWaited = false;
   while (firstSource != nullptr) {
     for (EventSource* source = firstSource; source != nullptr; source = source->next_) {
       if (!source->hasEvent()) continue;
@@ -30,7 +31,9 @@ bool runEventLoopOnce() {
       source->deliverEvent();
       return true;
     }
-    if (!NetworkTransfer::runAll()) return false;
+    if (limit && hasWaited) return true;
+    if (!NetworkTransfer::runAll(limit)) return false;
+    hasWaited = true;
   }
   return false;
 }

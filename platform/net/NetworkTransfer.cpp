@@ -114,10 +114,11 @@ class NetworkTransfer::Connections {
     return !isKnown;
   }
 
-  bool run() {
+  bool run(std::optional<std::chrono::milliseconds> limit) {
     if (running_.empty()) return false;
     int count = 0;
-    CURLMcode code = library().multiPoll(handle_.get(), nullptr, 0, INT_MAX, nullptr);
+    const int longestWait = limit ? static_cast<int>(limit->count()) : INT_MAX;
+    CURLMcode code = library().multiPoll(handle_.get(), nullptr, 0, longestWait, nullptr);
     if (code == CURLM_OK) code = library().multiPerform(handle_.get(), &count);
     if (code != CURLM_OK) {
       while (!running_.empty()) running_.back()->end(CURLE_FAILED_INIT);
@@ -384,8 +385,8 @@ bool NetworkTransfer::didReceiveBody(std::string_view bytes) {
   return !framing_.endsWithConnection() && ignoredSize_ <= kIgnoredBodyLimit;
 }
 
-bool NetworkTransfer::runAll() {
-  return Connections::ofThisThread().run();
+bool NetworkTransfer::runAll(std::optional<std::chrono::milliseconds> limit) {
+  return Connections::ofThisThread().run(limit);
 }
 
 }  // namespace platform

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <array>
+#include <chrono>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -69,9 +70,9 @@ class NetworkTransfer {
   /// The first field of this name in the answer's header, of any status; empty when there is none.
   std::string field(const char* name) const;
 
-  /// Waits without a deadline until something happens on one of the thread's transfers, and lets
-  /// all of them proceed. False when none is running.
-  static bool runAll();
+  /// Waits until something happens on one of the thread's transfers, without a deadline or no
+  /// longer than the limit, and lets all of them proceed. False when none is running.
+  static bool runAll(std::optional<std::chrono::milliseconds> limit = std::nullopt);
 
  private:
   class Connections;

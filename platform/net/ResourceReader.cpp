@@ -15,9 +15,10 @@
 namespace platform {
 namespace {
 
-/// A few KiB can decompress to GiB. No document comes near this ratio; a small one may, by chance.
-constexpr std::uint64_t kLargestRatio = 100;
-constexpr std::uint64_t kAnyRatioSize = std::uint64_t{64} << 20U;
+/// A few KiB can decompress to GiB. Feeds come near no such ratio; a small one may, by chance. What
+/// is made of a body that keeps to it is counted by its parser.
+constexpr std::uint64_t kLargestRatio = 50;
+constexpr std::uint64_t kAnyRatioSize = std::uint64_t{1} << 20U;
 
 /// The encoding that the field names (RFC 9110, section 8.3): of "text/xml; charset=\"koi8-r\""
 /// that is koi8-r. Empty for none.
@@ -69,9 +70,10 @@ class BodyCollector : public NetworkTransfer::Sink {
   }
 
   /// The body once all bytes have come.
-  std::optional<std::string> finish(ErrorSlot& error) {
+  std::optional<ByteSource> finish(ErrorSlot& error) {
     if (!decoder_.finish(error)) return std::nullopt;
-    return std::move(body_);
+    if (!decoder_.isCoded()) return ByteSource(std::move(body_));
+    return ByteSource(std::move(body_), receivedSize_);
   }
 
  private:
@@ -80,7 +82,7 @@ class BodyCollector : public NetworkTransfer::Sink {
     const std::uint64_t size = body_.size() + bytes.size();
     if (size > kAnyRatioSize && size / kLargestRatio > receivedSize_) {
       error = transferError(CURLE_FILESIZE_EXCEEDED,
-                            "The body is more than 100 times as large as its compressed form");
+                            "The body is more than 50 times as large as its compressed form");
       return false;
     }
     body_.append(bytes);
@@ -111,11 +113,9 @@ std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::ui
     error = transfer.error();
     return std::nullopt;
   }
-  std::optional<std::string> body = collector.finish(error);
-  if (!body) return std::nullopt;
-  ByteSource source(std::move(*body));
-  source.setEncodingHint(charsetOf(transfer.field("Content-Type")));
-  return source;
+  std::optional<ByteSource> body = collector.finish(error);
+  if (body) body->setEncodingHint(charsetOf(transfer.field("Content-Type")));
+  return body;
 }
 
 }  // namespace platform

@@ -16,8 +16,8 @@ namespace platform {
 /// http and https: a final status of 200 is success and nothing else is; at most 20 redirects, to
 /// http and https only; a compressed body is asked for and decompressed; a body cut short is a
 /// failure. On any failure gives no value and fills the slot. More than `limit` bytes, counted
-/// after decompression, are a failure too, and so are more than 64 MiB that are over 100 times
-/// their compressed size. The charset of the Content-Type is the encoding hint. For a file: URL see
+/// after decompression, are a failure too, and so is more than 1 MiB that is over 50 times its
+/// compressed size. The charset of the Content-Type is the encoding hint. For a file: URL see
 /// openWholeFile.
 std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error,
                                        std::uint64_t limit = kWholeReadLimit);

@@ -23,11 +23,13 @@ bool isPercentTriplet(std::string_view text, std::size_t at) {
          hexDigitValue(text[at + 2]) >= 0;
 }
 
-/// The text with all bytes percent-encoded but those that the predicate keeps.
+/// The text with all bytes percent-encoded but those that the predicate keeps, behind a beginning.
 template <typename Predicate>
-std::string percentEncoded(std::string_view text, Predicate isKept) {
+std::string percentEncoded(std::string_view text, Predicate isKept, std::string_view start = {}) {
+  const auto keptCount = std::count_if(text.begin(), text.end(), isKept);
   std::string encoded;
-  encoded.reserve(text.size());
+  encoded.reserve(start.size() + 3 * text.size() - 2 * static_cast<std::size_t>(keptCount));
+  encoded = start;
   for (const char c : text) {
     if (isKept(c)) {
       encoded += c;
@@ -271,12 +273,15 @@ std::string percentDecoded(std::string_view text) {
   return decoded;
 }
 
-std::string fileURLText(std::string_view absolutePath) {
+std::string percentEncodedPath(std::string_view path) {
   constexpr std::string_view kAllowedMarks = "-._~!$&'()*+,;=:@/";
-  return "file://" + percentEncoded(absolutePath, [=](char c) {
-           return isASCIILetter(c) || isASCIIDigit(c) ||
-                  kAllowedMarks.find(c) != std::string_view::npos;
-         });
+  return percentEncoded(path, [=](char c) {
+    return isASCIILetter(c) || isASCIIDigit(c) || kAllowedMarks.find(c) != std::string_view::npos;
+  });
+}
+
+std::string fileURLText(std::string_view absolutePath) {
+  return "file://" + percentEncodedPath(absolutePath);
 }
 
 }  // namespace platform

@@ -52,8 +52,11 @@ class URL {
 /// The text percent-decoded: "%41" gives "A". A "%" without two hexadecimal digits stays.
 std::string percentDecoded(std::string_view text);
 
-/// The file URL of an absolute path ("/a b" gives "file:///a%20b"), every byte percent-encoded that
-/// RFC 3986 does not allow in a path.
+/// The path with every byte percent-encoded that RFC 3986 does not allow in one: "a b/c" gives
+/// "a%20b/c".
+std::string percentEncodedPath(std::string_view path);
+
+/// The file URL of an absolute path: "/a b" gives "file:///a%20b".
 std::string fileURLText(std::string_view absolutePath);
 
 }  // namespace platform

@@ -12,6 +12,7 @@
 #include "platform/plist/PropertyListBuilder.h"
 #include "platform/text/ASCII.h"
 #include "platform/text/TextEncoding.h"
+#include "platform/xml/MemoryBudget.h"
 
 namespace platform {
 namespace {
@@ -21,16 +22,11 @@ constexpr std::size_t kTrailerSize = 32;
 constexpr std::size_t kWidestInteger = 8;
 
 /// Containers that share their parts can make a list of any size out of a few bytes, and so can
-/// long texts and data that stand in many places. A list may therefore take a fixed multiple of its
-/// bytes in memory, which is several times of what one without shared containers takes. The
-/// allowance on top is for lists that are small whatever they do.
-///
-/// What is made of the list counts, too: an element may become a record of its own, and a text is
-/// written wherever it stands, though it is held once.
-constexpr std::uint64_t kMemoryAllowance = std::uint64_t{16} << 20;
-constexpr std::uint64_t kMemoryPerByte = 128;
-constexpr std::uint64_t kMemoryOfElement = 512;
-constexpr std::uint64_t kMemoryOfEntry = 128;
+/// long texts and data that stand in many places. So what is made of a list is counted, and may
+/// take a fixed multiple of its bytes in memory, which is several times of what one without shared
+/// containers takes. The allowance on top is for lists that are small whatever they do.
+constexpr std::uint64_t kMemoryAllowance = std::uint64_t{6} << 20;
+constexpr std::uint64_t kMemoryPerByte = 40;
 
 /// 2001-01-01 00:00:00 UTC, from where dates count, in seconds since 1970.
 constexpr double kDateOrigin = 978307200.0;
@@ -70,7 +66,7 @@ struct Level {
 class Reader {
  public:
   explicit Reader(std::string_view bytes)
-      : bytes_(bytes), memoryLeft_(kMemoryAllowance + kMemoryPerByte * bytes.size()) {}
+      : bytes_(bytes), memory_(kMemoryAllowance + kMemoryPerByte * bytes.size()) {}
 
   std::optional<PropertyListValue> read(std::optional<PropertyListFault>& fault) {
     bool succeeded = readTrailer();
@@ -101,7 +97,7 @@ class Reader {
 
     // There are no more objects than bytes, so this is always there.
     static_assert(sizeof(Text) <= kMemoryPerByte);
-    memoryLeft_ -= objectCount_ * sizeof(Text);
+    memory_.take(objectCount_ * sizeof(Text));
     texts_.resize(objectCount_);
     isOpen_.resize(objectCount_);
     return readObject(root);
@@ -129,6 +125,8 @@ class Reader {
     if (!object) return false;
     const auto key = text(number, *object);
     if (!key) return fail("a key that is no text", number);
+    // Keys are not written, but compared wherever they stand.
+    if (!allow(memory_.take(key->size()))) return false;
     builder_.setKey(*key);
     return true;
   }
@@ -158,10 +156,12 @@ class Reader {
     if (!holds(object, object.size, isDictionary ? 2 * referenceWidth_ : referenceWidth_)) {
       return fail("an array or dictionary that is cut", number);
     }
-    if (!spend(object.size * (isDictionary ? kMemoryOfEntry : kMemoryOfElement))) return false;
+    if (!allow(isDictionary ? memory_.takeFields(object.size) : memory_.takeRecords(object.size))) {
+      return false;
+    }
 
     if (isDictionary) {
-      builder_.beginDictionary();
+      builder_.beginDictionary(object.size);
     } else {
       builder_.beginArray(object.size);
     }
@@ -219,8 +219,12 @@ class Reader {
       case Kind::kData:
         return data(object);
       default:
-        return text(number, object);
+        break;
     }
+    auto shared = text(number, object);
+    // It is held once, and written wherever it stands.
+    if (!shared || !allow(memory_.takeWritten(*shared))) return std::nullopt;
+    return PropertyListValue(std::move(*shared));
   }
 
   std::optional<PropertyListValue> integer(const Object& object) const {
@@ -261,7 +265,7 @@ class Reader {
   }
 
   std::optional<PropertyListValue> data(const Object& object) {
-    if (!holds(object, object.size, 1) || !spend(object.size)) return std::nullopt;
+    if (!holds(object, object.size, 1) || !allow(memory_.take(object.size))) return std::nullopt;
     return PropertyListValue(
         PropertyListValue::Data{std::string(bytes_.substr(object.content, object.size))});
   }
@@ -272,16 +276,13 @@ class Reader {
       return std::nullopt;
     }
     Text& text = texts_[number];
-    if (!text.empty()) {
-      if (!spend(text.size())) return std::nullopt;
-      return text;
-    }
+    if (!text.empty()) return text;
 
     if (!holds(object, object.size, isUTF16 ? 2 : 1)) return std::nullopt;
     const std::string_view encoded =
         bytes_.substr(object.content, isUTF16 ? 2 * object.size : object.size);
     // Objects may overlap, so that even unshared texts can exceed the bytes by any factor.
-    if (!spend(encoded.size())) return std::nullopt;
+    if (!allow(memory_.take(encoded.size()))) return std::nullopt;
     if (!isUTF16 && isASCII(encoded)) {
       text = Text(encoded);
     } else {
@@ -290,7 +291,8 @@ class Reader {
                                                                           : "UTF-8";
       auto converted = convertedToUTF8(encoded, encoding);
       if (!converted) return std::nullopt;
-      if (converted->size() > encoded.size() && !spend(converted->size() - encoded.size())) {
+      if (converted->size() > encoded.size() &&
+          !allow(memory_.take(converted->size() - encoded.size()))) {
         return std::nullopt;
       }
       text = Text(*converted);
@@ -312,12 +314,8 @@ class Reader {
     return number;
   }
 
-  bool spend(std::uint64_t memory) {
-    if (memory > memoryLeft_) {
-      return fail("a binary property list whose shared objects make it too large");
-    }
-    memoryLeft_ -= memory;
-    return true;
+  bool allow(bool isWithinBudget) {
+    return isWithinBudget || fail("a binary property list whose shared objects make it too large");
   }
 
   /// Keeps the first fault that is told, of the object if one is named; returns false.
@@ -338,7 +336,7 @@ class Reader {
   std::vector<Level> levels_;
   std::vector<bool> isOpen_;  // by object number: whether it is one of the levels
   std::vector<Text> texts_;   // by object number: read once, then shared
-  std::uint64_t memoryLeft_;
+  MemoryBudget memory_;
   std::optional<PropertyListFault> fault_;
 };
 

@@ -22,8 +22,8 @@ void PropertyListBuilder::beginArray(std::size_t expectedCount) {
   levels_.emplace_back().container.emplace<PropertyListValue::Array>().reserve(expectedCount);
 }
 
-void PropertyListBuilder::beginDictionary() {
-  levels_.emplace_back().container.emplace<Dictionary::Entries>();
+void PropertyListBuilder::beginDictionary(std::size_t expectedCount) {
+  levels_.emplace_back().container.emplace<Dictionary::Entries>().reserve(expectedCount);
 }
 
 void PropertyListBuilder::end() {

@@ -22,7 +22,7 @@ class PropertyListBuilder {
 
   /// Opens a container inside the innermost one; it is added to that one when it ends.
   void beginArray(std::size_t expectedCount = 0);
-  void beginDictionary();
+  void beginDictionary(std::size_t expectedCount = 0);
   /// Ends the innermost open container.
   void end();
 

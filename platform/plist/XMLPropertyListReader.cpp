@@ -158,6 +158,9 @@ class Reader final : private XMLParserEvents {
 
   void startValue(const Element& element) {
     const bool isArray = element.kind == Kind::kArray;
+    parser_.count([this](MemoryBudget& budget) {
+      return builder_.isInDictionary() ? budget.takeFields() : budget.takeRecords();
+    });
     if (builder_.hasRoot()) {
       parser_.abort("a second value in a property list");
     } else if (builder_.isInDictionary() && !builder_.hasPendingKey()) {
@@ -182,6 +185,7 @@ class Reader final : private XMLParserEvents {
     if (element.kind == Kind::kKey) {
       builder_.setKey(text_);
     } else if (Value value = element.value(text_)) {
+      parser_.count([this](MemoryBudget& budget) { return budget.takeWritten(text_); });
       builder_.add(std::move(*value));
     } else {
       parser_.abort(element.fault);

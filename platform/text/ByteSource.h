@@ -21,12 +21,16 @@ class ByteSource {
   /// failure.
   using Read = std::function<std::optional<std::size_t>(std::span<char> room, ErrorSlot& error)>;
 
-  ByteSource(std::string bytes) : expectedSize_(bytes.size()), held_(std::move(bytes)) {}
+  /// Bytes that were received compressed name the size of what was received.
+  ByteSource(std::string bytes, std::optional<std::uint64_t> compressedSize = std::nullopt)
+      : expectedSize_(bytes.size()), compressedSize_(compressedSize), held_(std::move(bytes)) {}
   /// The size is what may be expected, and need not be true.
   ByteSource(std::uint64_t expectedSize, Read read)
       : expectedSize_(expectedSize), read_(std::move(read)) {}
 
   std::uint64_t expectedSize() const { return expectedSize_; }
+  /// Absent for bytes that were not compressed.
+  std::optional<std::uint64_t> compressedSize() const { return compressedSize_; }
 
   /// The name of the text encoding that came beside the bytes, for readers to whom the bytes tell
   /// none; empty when none came.
@@ -48,6 +52,7 @@ class ByteSource {
  private:
   std::uint64_t expectedSize_;
   std::string encodingHint_;
+  std::optional<std::uint64_t> compressedSize_;
   std::string held_;      // of the bytes to be read, the first ones
   std::size_t next_ = 0;  // of these, the first that is still to be read
   Read read_;             // of the others; none for bytes in memory

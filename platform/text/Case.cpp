@@ -16,6 +16,12 @@
 namespace platform {
 namespace {
 
+/// Folding knows no locale.
+void foldUTF8(const char* /*locale*/, std::uint32_t options, icu::StringPiece text,
+              icu::ByteSink& sink, icu::Edits* edits, UErrorCode& status) {
+  icu::CaseMap::utf8Fold(options, text, sink, edits, status);
+}
+
 using CaseMapping = void (*)(const char*, std::uint32_t, icu::StringPiece, icu::ByteSink&,
                              icu::Edits*, UErrorCode&);
 
@@ -52,6 +58,10 @@ std::string lowercased(std::string_view text) {
 
 std::string uppercased(std::string_view text) {
   return caseMapped(text, uppercasedASCII, icu::CaseMap::utf8ToUpper);
+}
+
+std::string caseFolded(std::string_view text) {
+  return caseMapped(text, lowercasedASCII, foldUTF8);
 }
 
 }  // namespace platform

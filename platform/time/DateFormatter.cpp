@@ -53,10 +53,14 @@ icu::Locale locale(std::string_view name) {
 
 }  // namespace
 
-DateFormatter::DateFormatter(std::string_view pattern) {
+DateFormatter::DateFormatter(std::string_view pattern)
+    : DateFormatter(pattern, localeVariable(), TimeZone::local()) {}
+
+DateFormatter::DateFormatter(std::string_view pattern, std::string_view localeName, TimeZone zone)
+    : zone_(std::move(zone)) {
   UErrorCode status = U_ZERO_ERROR;
   format_ = std::make_unique<icu::SimpleDateFormat>(
-      icu::UnicodeString::fromUTF8(icu::StringPiece(pattern)), locale(localeVariable()), status);
+      icu::UnicodeString::fromUTF8(icu::StringPiece(pattern)), locale(localeName), status);
   if (U_FAILURE(status) != 0) {
     format_.reset();
     return;

@@ -23,6 +23,8 @@ namespace platform {
 class DateFormatter {
  public:
   explicit DateFormatter(std::string_view pattern);
+  /// In another locale, named as those variables name it, and in another zone.
+  DateFormatter(std::string_view pattern, std::string_view localeName, TimeZone zone);
   ~DateFormatter();
   DateFormatter(const DateFormatter&) = delete;
   DateFormatter& operator=(const DateFormatter&) = delete;
@@ -31,7 +33,7 @@ class DateFormatter {
 
  private:
   std::unique_ptr<icu::SimpleDateFormat> format_;  // null when the pattern cannot be used
-  TimeZone zone_ = TimeZone::local();
+  TimeZone zone_;
 };
 
 }  // namespace platform

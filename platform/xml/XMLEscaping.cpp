@@ -5,6 +5,7 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "platform/text/ASCII.h"
 #include "platform/text/Characters.h"
 
 namespace platform {
@@ -90,6 +91,17 @@ bool isXMLText(std::string_view text) {
     next += length;
   }
   return true;
+}
+
+std::size_t sizeOfReferences(std::string_view text) {
+  std::size_t size = 0;
+  for (const char byte : text) {
+    if (isASCII(byte) && kAttributeRules.isSpecial(byte)) {
+      const std::size_t length = reference(byte).size();
+      if (length > 0) size += length - 1;
+    }
+  }
+  return size;
 }
 
 void appendEscapedText(std::string& output, std::string_view text) {

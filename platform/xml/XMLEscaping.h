@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -16,5 +17,8 @@ void appendEscapedText(std::string& output, std::string_view text);
 /// The same for an attribute value in double quotes: tabs, line breaks and double quotes as
 /// references too.
 void appendEscapedAttribute(std::string& output, std::string_view value);
+
+/// By how much the text grows, at the most, when it is escaped.
+std::size_t sizeOfReferences(std::string_view text);
 
 }  // namespace platform

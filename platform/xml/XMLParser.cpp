@@ -1,5 +1,7 @@
 #include "platform/xml/XMLParser.h"
 
+// The header declares the limits of entities only to those who say that the library has them.
+#define XML_DTD 1  // NOLINT(cppcoreguidelines-macro-usage)
 #include <expat.h>
 
 #include <algorithm>
@@ -31,6 +33,11 @@ constexpr std::size_t kPieceSize = std::size_t{64} << 20;
 /// piece also where a document is larger than expected.
 constexpr std::uint64_t kSmallestSize = std::uint64_t{64} << 10;
 
+/// The library's own limit, for one attribute made of many references: it is counted only when it
+/// is there, and stands in memory four times by then.
+constexpr float kLargestAmplification = 12;
+constexpr unsigned long long kAnyAmplificationSize = 4ULL << 20U;
+
 XMLName nameOf(const XML_Char* name) {
   const std::string_view qualified(name);
   return {qualified, qualified.substr(qualified.find(':') + 1)};
@@ -61,7 +68,7 @@ bool makeUTF8(ByteSource& document, std::optional<XMLFault>& fault) {
     bytes = convertedToUTF8(std::string_view(*bytes).substr(encoding.markLength), *encoding.name);
   }
   if (encoding.name && bytes) {
-    document = ByteSource(std::move(*bytes));
+    document = ByteSource(std::move(*bytes), document.compressedSize());
     return true;
   }
   constexpr std::size_t kShownLength = 64;  // the names of encodings are shorter
@@ -87,12 +94,14 @@ std::optional<std::string_view> XMLAttributes::value(std::string_view name) cons
 
 /// One run of the library's parser over a document, which is UTF-8.
 struct XMLParser::Run {
-  explicit Run(XMLParser& parser) : owner(parser) {
+  explicit Run(XMLParser& parser) : owner(parser), budget(parser.document_.compressedSize()) {
     XML_SetUserData(handle.get(), this);
     XML_SetElementHandler(handle.get(), startElement, endElement);
     XML_SetCharacterDataHandler(handle.get(), characters);
     XML_SetEntityDeclHandler(handle.get(), declareEntity);
     XML_SetAttlistDeclHandler(handle.get(), declareAttribute);
+    XML_SetBillionLaughsAttackProtectionMaximumAmplification(handle.get(), kLargestAmplification);
+    XML_SetBillionLaughsAttackProtectionActivationThreshold(handle.get(), kAnyAmplificationSize);
     owner.run_ = this;
   }
   ~Run() { owner.run_ = nullptr; }
@@ -156,6 +165,11 @@ struct XMLParser::Run {
   void refuseExpansion(std::string description) {
     refuse(XML_ERROR_AMPLIFICATION_LIMIT_BREACH, std::move(description));
   }
+  void refuseExpansion() {
+    refuseExpansion(budget.isCompressed()
+                        ? "a document out of all proportion to its compressed form"
+                        : XML_ErrorString(XML_ERROR_AMPLIFICATION_LIMIT_BREACH));
+  }
 
   // The library may have events left when the run has been ended: the end of an empty element.
 
@@ -185,13 +199,15 @@ struct XMLParser::Run {
     if (run.budget.takeElement(name, attributes)) {
       run.owner.events_.didStartElement(nameOf(name), XMLAttributes(attributes));
     } else {
-      run.refuseExpansion(XML_ErrorString(XML_ERROR_AMPLIFICATION_LIMIT_BREACH));
+      run.refuseExpansion();
     }
   }
 
   static void XMLCALL endElement(void* pointer, const XML_Char* name) {
     Run& run = *static_cast<Run*>(pointer);
-    if (!run.fault) run.owner.events_.didEndElement(nameOf(name));
+    if (run.fault) return;
+    run.budget.endElement(name);
+    run.owner.events_.didEndElement(nameOf(name));
   }
 
   static void XMLCALL characters(void* pointer, const XML_Char* characters, int length) {
@@ -201,7 +217,7 @@ struct XMLParser::Run {
     if (run.budget.takeText(text.size())) {
       run.owner.events_.foundCharacters(text);
     } else {
-      run.refuseExpansion(XML_ErrorString(XML_ERROR_AMPLIFICATION_LIMIT_BREACH));
+      run.refuseExpansion();
     }
   }
 
@@ -215,15 +231,29 @@ struct XMLParser::Run {
 };
 
 bool XMLParser::parse(std::optional<XMLFault>& fault) {
+  const std::uint64_t receivedSize = document_.expectedSize();
   if (!makeUTF8(document_, fault)) return false;
   Run run(*this);
-  if (run.feed()) return true;
+  const std::uint64_t size = document_.expectedSize();
+  if (!run.budget.takeConversion(size - std::min(size, receivedSize))) {
+    run.refuseExpansion();
+  } else if (run.feed()) {
+    return true;
+  }
   if (const XML_Error code = XML_GetErrorCode(run.handle.get()); !run.fault) {
     run.fail(code, code == XML_ERROR_NO_MEMORY ? "a tag or text too long for the parser"
                                                : XML_ErrorString(code));
   }
   fault = std::move(run.fault);
   return false;
+}
+
+MemoryBudget* XMLParser::budgetToCount() {
+  return run_->budget.isCounting() ? &run_->budget.memory() : nullptr;
+}
+
+void XMLParser::refuseExpansion() {
+  run_->refuseExpansion();
 }
 
 void XMLParser::abort(std::string description) {

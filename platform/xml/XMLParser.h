@@ -9,6 +9,7 @@
 
 #include "platform/text/ByteSource.h"
 #include "platform/text/ErrorRecord.h"
+#include "platform/xml/MemoryBudget.h"
 #include "platform/xml/TextPosition.h"
 
 namespace platform {
@@ -74,12 +75,13 @@ class XMLParserEvents {
 /// The encoding is what DocumentEncoding detects, any that the conversion library knows. White
 /// space before the declaration is skipped.
 ///
-/// Internal entities and attributes by default are resolved as long as what they add is not much
-/// more than the document itself, and their declarations not too many; beyond that the document is
-/// refused, so that what is delivered stays within a few times of it. External entities and DTDs
-/// are never loaded. A reference to a declared external entity gives no characters; a
-/// reference to an undeclared one is a fault, unless the document names an external DTD that could
-/// declare it and is not standalone: then it gives no characters either.
+/// Internal entities and attributes by default are resolved as long as what is made of them is not
+/// much more than the document itself, and their declarations not too many; beyond that the
+/// document is refused, and so is a compressed one of which much more is made than was received. To
+/// make something of a document is the receiver's work, so it counts, too (see `count`). External
+/// entities and DTDs are never loaded. A reference to a declared external entity gives no
+/// characters; a reference to an undeclared one is a fault, unless the document names an external
+/// DTD that could declare it and is not standalone: then it gives no characters either.
 class XMLParser {
  public:
   /// Up to this size a document is parsed in one buffer: the fastest way, and the most that expat
@@ -100,8 +102,22 @@ class XMLParser {
   /// this fault, at the place of the event.
   void abort(std::string description);
 
+  /// Counts, inside an event, what the receiver makes of the document by this function of a
+  /// MemoryBudget, which gives false when there is too little left: that ends the parse as `abort`
+  /// does. Documents that cannot grow are not counted, and the function is not called.
+  template <typename Take>
+  void count(Take take) {
+    if (MemoryBudget* const budget = budgetToCount(); budget != nullptr && !take(*budget)) {
+      refuseExpansion();
+    }
+  }
+
  private:
   struct Run;
+
+  /// Null where nothing is counted.
+  MemoryBudget* budgetToCount();
+  void refuseExpansion();
 
   ByteSource document_;
   XMLParserEvents& events_;

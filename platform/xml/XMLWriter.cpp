@@ -24,6 +24,14 @@ void XMLElement::appendAttribute(std::string_view name, std::string_view value) 
   writer_->output_ += '"';
 }
 
+void XMLElement::endWithText(std::string_view text) const {
+  writer_->output_ += '>';
+  appendEscapedText(writer_->output_, text);
+  writer_->output_.append("</").append(writer_->open_.back()).append(">\n");
+  writer_->open_.pop_back();
+  writer_->isTagOpen_ = false;
+}
+
 XMLWriter::XMLWriter(std::string& output, Layout layout) : output_(output), layout_(layout) {
   output_ += "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n";
 }

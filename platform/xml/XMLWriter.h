@@ -20,6 +20,8 @@ class XMLElement {
   void appendChild(std::string_view name, std::string_view text) const;
   /// Appends an attribute; all of them come before the first child.
   void appendAttribute(std::string_view name, std::string_view value) const;
+  /// Makes the text the content of the element, which has no child, and ends it.
+  void endWithText(std::string_view text) const;
 
  private:
   friend class XMLWriter;

@@ -48,12 +48,12 @@ class Crash(AssertionError):
     """The tool was ended by a signal or by a sanitizer, which no input may bring about."""
 
 
-def tool():
-    """The path of the executable under test."""
+def tool(program="qel"):
+    """The path of the executable under test; a companion's stands beside it."""
     path = os.environ.get("QEL")
     if not path:
         raise RuntimeError("the environment variable QEL must name the executable to test")
-    return path
+    return path if program == "qel" else str(Path(path).with_name(Path(path).name.replace("qel", program)))
 
 
 def environment(changes=None):
@@ -89,9 +89,9 @@ def soaking():
     return os.environ.get("QEL_SOAK") == "1"
 
 
-def start(*arguments, env=None, **options):
+def start(*arguments, env=None, program="qel", **options):
     """Starts the tool with Popen's options and returns the process."""
-    return subprocess.Popen([tool(), *arguments], env=environment(env), **options)
+    return subprocess.Popen([tool(program), *arguments], env=environment(env), **options)
 
 
 def checked(arguments, status, stdout=b"", stderr=b""):
@@ -101,11 +101,13 @@ def checked(arguments, status, stdout=b"", stderr=b""):
     return Result(status, stdout, stderr)
 
 
-def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=(), prefix=(), **options):
+def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=(), prefix=(), program="qel",
+        **options):
     """Runs the tool to its end. A crash and a run longer than the timeout (seconds) are failures.
 
     memory_limit is the number of bytes that the tool may take, for input made to exhaust memory; closed
-    lists those of the descriptors 0 to 2 that the tool starts without; prefix is a command that runs it.
+    lists those of the descriptors 0 to 2 that the tool starts without; prefix is a command that runs it. Another
+    program than the tool is a companion of it.
     """
     env = dict(env or {})
     shell = ['exec "$0" "$@"', *(_CLOSING[descriptor] for descriptor in closed)]
@@ -117,7 +119,7 @@ def run(*arguments, stdin=b"", env=None, timeout=120, memory_limit=None, closed=
     if len(shell) > 1:  # a shell prepares the process: Python's own way is unsafe beside a server's threads
         prefix = ("/bin/sh", "-c", " ".join(shell), *prefix)
     options = {"stdout": subprocess.PIPE, "stderr": subprocess.PIPE, **options}
-    finished = subprocess.run([*prefix, tool(), *arguments], input=stdin, env=environment(env), timeout=timeout,
+    finished = subprocess.run([*prefix, tool(program), *arguments], input=stdin, env=environment(env), timeout=timeout,
                               check=False, **options)
     return checked(arguments, finished.returncode, finished.stdout, finished.stderr)
 

@@ -271,4 +271,10 @@ TEST(URLTest, FileURLTextReadsBackAsThePath) {
 }
 
 }  // namespace
+TEST(URLTest, PathsArePercentEncoded) {
+  EXPECT_EQ(percentEncodedPath("a b/c?d#e%20[f]"), "a%20b/c%3Fd%23e%2520%5Bf%5D");
+  EXPECT_EQ(percentEncodedPath("\xC3\xBC\xFF\n"), "%C3%BC%FF%0A");
+  EXPECT_EQ(percentEncodedPath("-._~!$&'()*+,;=:@/09azAZ"), "-._~!$&'()*+,;=:@/09azAZ");
+}
+
 }  // namespace platform

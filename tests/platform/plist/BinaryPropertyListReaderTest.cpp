@@ -301,17 +301,20 @@ TEST(BinaryPropertyListReaderTest, RefusesOverlappingTextsThatExplode) {
 }
 
 TEST(BinaryPropertyListReaderTest, RefusesSharedTextsThatWouldBeWrittenTooOften) {
-  const auto outcomeOf = [](std::size_t size, std::size_t count) {
+  const auto outcomeOf = [](char character, std::size_t size, std::size_t count) {
     BinaryPropertyList list(2);
     const auto key = list.addText("EpisodeName");
-    const auto text = list.addText(std::string(size, 'x'));
+    const auto text = list.addText(std::string(size, character));
     std::vector<std::uint64_t> entries;
     for (std::size_t i = 0; i < count; ++i) entries.push_back(list.addDictionary({key}, {text}));
     return readOutcome(list.bytes(list.addArray(entries))).substr(0, 100);
   };
-  EXPECT_TRUE(outcomeOf(10'000, 1000).starts_with("[{\"EpisodeName\": \"xxx"));
-  EXPECT_EQ(outcomeOf(100'000, 1000),
-            "a binary property list whose shared objects make it too large");
+  const std::string tooLarge = "a binary property list whose shared objects make it too large";
+  EXPECT_TRUE(outcomeOf('x', 10'000, 300).starts_with("[{\"EpisodeName\": \"xxx"));
+  EXPECT_EQ(outcomeOf('x', 10'000, 400), tooLarge);
+  // A feed has "&amp;" for it.
+  EXPECT_TRUE(outcomeOf('&', 10'000, 35).starts_with("[{\"EpisodeName\": \"&&&"));
+  EXPECT_EQ(outcomeOf('&', 10'000, 45), tooLarge);
 }
 
 TEST(BinaryPropertyListReaderTest, CountsWhatTextsBecome) {
@@ -324,9 +327,9 @@ TEST(BinaryPropertyListReaderTest, CountsWhatTextsBecome) {
     list.addBytes(std::string(size, '\xFF'));
     return readOutcome(list.bytes(list.addArray(texts))).substr(0, 100);
   };
-  // 10 MB of bytes, which would pass, but nearly 30 MB of UTF-8.
-  EXPECT_EQ(outcomeOf(10'000, 100).substr(0, 2), "[\"");
-  EXPECT_EQ(outcomeOf(10'000, 1000),
+  // 1.5 MB of bytes, which would pass, but 4.5 MB of UTF-8, and as much twice in a feed.
+  EXPECT_EQ(outcomeOf(10'000, 70).substr(0, 2), "[\"");
+  EXPECT_EQ(outcomeOf(10'000, 150),
             "a binary property list whose shared objects make it too large");
 }
 

@@ -245,5 +245,32 @@ TEST(XMLPropertyListReaderTest, LimitsTheDepthOfXML) {
             "column 3592");
 }
 
+TEST(XMLPropertyListReaderTest, CountsWhatEntitiesDeliver) {
+  const std::string amps = repeated("&#38;amp;", 10'000);
+  const struct {
+    std::string entity;
+    std::string_view around;
+    std::size_t fits;
+    std::size_t exceeds;
+  } rows[] = {
+      {"<dict/>", "<array>N</array>", 50'000, 90'000},
+      {"<array/>", "<array>N</array>", 50'000, 90'000},
+      {"<true/>", "<array>N</array>", 50'000, 90'000},
+      {"<key/><true/>", "<dict>N</dict>", 55'000, 65'000},
+      {amps, "<string>N</string>", 30, 100},
+  };
+  for (const auto& row : rows) {
+    const auto outcome = [&row](std::size_t count) {
+      std::string content(row.around);
+      content.replace(content.find('N'), 1, repeated("&e;", count));
+      return readOutcome("<!DOCTYPE plist [<!ENTITY e '" + row.entity + "'>]><plist>" + content +
+                         "</plist>");
+    };
+    EXPECT_NE(outcome(row.fits).substr(0, 5), "limit") << row.entity.substr(0, 20);
+    EXPECT_EQ(outcome(row.exceeds).substr(0, 32), "limit on input amplification fac")
+        << row.entity.substr(0, 20);
+  }
+}
+
 }  // namespace
 }  // namespace platform

@@ -28,6 +28,14 @@ TEST(CaseTest, MapsByUnicode) {
   }
 }
 
+TEST(CaseTest, FoldsWhatDiffersInCaseAlone) {
+  EXPECT_EQ(platform::caseFolded("Show.MP3"), "show.mp3");
+  EXPECT_EQ(platform::caseFolded("Straße"), platform::caseFolded("STRASSE"));
+  EXPECT_EQ(platform::caseFolded("ΟΔΟΣ"), platform::caseFolded("οδος"));
+  EXPECT_EQ(platform::caseFolded("K"), "k");  // the Kelvin sign
+  EXPECT_EQ(platform::caseFolded("A\xFF"), "a\xFF");
+}
+
 TEST(CaseTest, KeepsNUL) {
   EXPECT_EQ(platform::lowercased(std::string_view("A\0B", 3)), std::string_view("a\0b", 3));
   EXPECT_EQ(platform::uppercased(std::string_view("ä\0b", 4)), std::string_view("Ä\0B", 4));

@@ -172,4 +172,12 @@ TEST(DateFormatterTest, PatternsWithoutSymbols) {
   EXPECT_EQ(DateFormatter("'year' yyyy").format(kDate), "year 2007");
 }
 
+TEST(DateFormatterTest, AnotherLocaleAndZoneAreThoseOfTheCaller) {
+  const Settings settings("de_DE.UTF-8", nullptr, nullptr, "Asia/Tokyo");
+  EXPECT_EQ(DateFormatter(kPattern, "C", platform::TimeZone::withOffset(0)).format(kDate),
+            "Tue, 05 Jun 2007 21:30:00 GMT");
+  EXPECT_EQ(DateFormatter("EEE HH:mm", "fr_FR", platform::TimeZone::withOffset(3600)).format(kDate),
+            "mar. 22:30");
+}
+
 }  // namespace

@@ -6,6 +6,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "platform/xml/XMLParser.h"
 #include "tests/support/XMLEventRecorder.h"
@@ -30,7 +31,7 @@ class Meter : public XMLParserEvents {
 };
 
 /// The fault of the document with its line, empty when there is none.
-std::string faultOf(std::string document, Meter& meter) {
+std::string faultOf(ByteSource document, Meter& meter) {
   std::optional<XMLFault> fault;
   if (XMLParser(std::move(document), meter).parse(fault)) return {};
   return fault->description + " at line " + std::to_string(fault->position.line);
@@ -134,13 +135,11 @@ TEST(ExpansionBudgetTest, DeclarationsMakeNothingMuchLargerThanTheDocument) {
     std::string_view part;
     std::size_t fits;     // so many parts are read
     std::size_t exceeds;  // and so many are not
-    std::size_t allowance;
-    std::size_t perByte;
   } rows[] = {
-      {"text", entity, "&e;", 4250, 4350, 4U << 20, 8},
-      {"text in an attribute", entity, "<i a='&e;'/>", 1000, 1100, 1U << 20, 3},
-      {"elements", elements, "&e;", 850, 950, 1U << 20, 3},
-      {"attributes by default", attribute, "<i/>", 1000, 1100, 1U << 20, 3},
+      {"text", entity, "&e;", 3350, 3400},
+      {"text in an attribute", entity, "<i a='&e;'/>", 4100, 4300},
+      {"elements", elements, "&e;", 4200, 4350},
+      {"attributes by default", attribute, "<i/>", 7200, 7600},
   };
   for (const auto& row : rows) {
     Meter meter;
@@ -150,9 +149,73 @@ TEST(ExpansionBudgetTest, DeclarationsMakeNothingMuchLargerThanTheDocument) {
       meter.size = 0;
       const std::string document = row.head + repeated(row.part, count) + "</r>";
       EXPECT_EQ(faultOf(document, meter), std::string(kBreach) + " at line 2") << row.name;
-      const std::size_t root = 1;  // its name, which no text is
-      EXPECT_LE(meter.size, root + row.allowance + row.perByte * document.size()) << row.name;
+      EXPECT_LE(meter.size, (6U << 20) + 40 * document.size()) << row.name;
     }
+  }
+}
+
+TEST(ExpansionBudgetTest, CompressedDocumentsStayInProportion) {
+  constexpr const char* kOutOfProportion =
+      "a document out of all proportion to its compressed form at line 1";
+  const std::string deep = repeated("<a>", 50'000) + repeated("</a>", 50'000);
+  const std::string wide = "<r>" + repeated("<a></a>", 50'000) + "</r>";
+  const std::string text = "<r>" + std::string(5'000'000, 'x') + "</r>";
+  const std::string latin = "<?xml version='1.0' encoding='ISO-8859-1'?><r>";
+  const struct {
+    std::string_view name;
+    const std::string& document;
+    std::size_t fits;     // compressed to so many bytes
+    std::size_t exceeds;  // and not to so many
+  } rows[] = {
+      {"open elements", deep, 8000, 4000},
+      {"elements that are over", wide, 0, 0},
+      {"text", text, 11'000, 10'000},
+      {"text that grows", latin + std::string(2'500'000, '\xE9') + "</r>", 26'000, 24'000},
+  };
+  for (const auto& row : rows) {
+    const auto outcome = [&row](std::size_t compressedSize) {
+      Meter meter;
+      return faultOf(ByteSource(row.document, compressedSize), meter);
+    };
+    EXPECT_EQ(outcome(row.fits), "") << row.name;
+    if (row.exceeds > 0) {
+      EXPECT_EQ(outcome(row.exceeds), kOutOfProportion) << row.name;
+    }
+  }
+}
+
+TEST(ExpansionBudgetTest, ReceiversCountWhatMayGrow) {
+  struct Keeper : XMLParserEvents {
+    explicit Keeper(ByteSource document) : parser(std::move(document), *this) {}
+    void didStartElement(const XMLName&, const XMLAttributes&) override {
+      ++elements;
+      parser.count([this](MemoryBudget& budget) { return ++counted, budget.take(1'000'000); });
+    }
+    void didEndElement(const XMLName&) override {}
+    void foundCharacters(std::string_view) override {}
+
+    XMLParser parser;
+    std::size_t elements = 0;
+    std::size_t counted = 0;
+  };
+  const std::string elements = "<r>" + repeated("<a/>", 99) + "</r>";
+  const struct {
+    ByteSource document;
+    std::size_t elements;
+    std::size_t counted;
+  } rows[] = {
+      {elements, 100, 0},
+      {ByteSource(elements, 0), 7, 7},
+      {"<!DOCTYPE r [<!ENTITY e 'x'>]>" + elements, 7, 7},
+      {"<!DOCTYPE r [<!ATTLIST a b CDATA 'x'>]>" + elements, 7, 7},
+      {"<!DOCTYPE r SYSTEM 'x'>" + elements, 100, 0},
+  };
+  for (const auto& row : rows) {
+    Keeper keeper(row.document);
+    std::optional<XMLFault> fault;
+    EXPECT_EQ(keeper.parser.parse(fault), row.counted == 0);
+    EXPECT_EQ(keeper.elements, row.elements);
+    EXPECT_EQ(keeper.counted, row.counted);
   }
 }
 

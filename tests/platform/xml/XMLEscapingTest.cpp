@@ -46,7 +46,10 @@ TEST(XMLEscapingTest, EscapesWhatAParserWouldReadDifferently) {
   for (const auto& row : rows) {
     EXPECT_EQ(escapedText(row.plain), row.text) << testing::PrintToString(row.plain);
     EXPECT_EQ(escapedAttribute(row.plain), row.attribute) << testing::PrintToString(row.plain);
+    EXPECT_EQ(row.plain.size() + sizeOfReferences(row.plain), row.attribute.size())
+        << testing::PrintToString(row.plain);
   }
+  EXPECT_EQ(sizeOfReferences("\x01\xC3\xA9\xFF"), 0U);  // what is left out shortens nothing
 }
 
 TEST(XMLEscapingTest, AppendsToWhatIsThere) {

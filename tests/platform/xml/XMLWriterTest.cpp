@@ -182,4 +182,18 @@ TEST(XMLWriterTest, TakesAQuarterMillionChildrenOfOneElement) {
 }
 
 }  // namespace
+TEST(XMLWriterTest, TextCanFollowAttributes) {
+  std::string document;
+  XMLWriter writer(document, {.indentation = ' ', .indentationWidth = 2, .emptyTagEnd = " />"});
+  const XMLElement root = writer.appendRoot("a");
+  const XMLElement child = root.appendChild("b");
+  child.appendAttribute("c", "1");
+  child.endWithText("<&");
+  root.appendChild("d");
+  writer.finish();
+  EXPECT_EQ(document,
+            "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
+            "<a>\n  <b c=\"1\">&lt;&amp;</b>\n  <d />\n</a>\n");
+}
+
 }  // namespace platform

@@ -1,0 +1,253 @@
+#include "companions/keep/QELKeptShow.h"
+
+#include <algorithm>
+#include <array>
+#include <utility>
+
+#include "generators/QELBundleNames.h"
+#include "model/QELEpisodeMatching.h"
+#include "model/QELPodcastKeys.h"
+#include "platform/files/Paths.h"
+#include "platform/files/RegularFile.h"
+#include "platform/text/FormattedText.h"
+
+namespace {
+
+using platform::Dictionary;
+using platform::OptionalText;
+using platform::PropertyListValue;
+using platform::Text;
+
+/// Of the keys of an entry, those of the files that the bundle has for it.
+constexpr std::array<std::string_view, 5> kFileKeys = {"EpisodeFileSize", "EpisodePosterReference",
+                                                       "EpisodePosterReferenceType",
+                                                       "EpisodeReference", "EpisodeReferenceType"};
+
+std::string quoted(const OptionalText& title, const OptionalText& otherwise) {
+  const OptionalText& text = title ? title : otherwise;
+  return platform::formattedText("\"%@\"", {text.value_or(platform::Text())});
+}
+
+void setFile(Dictionary& dictionary, const std::string& key, const std::string& reference) {
+  dictionary.insert_or_assign(key, reference);
+  dictionary.insert_or_assign(key + "Type", Text(kReferenceTypeLocal));
+}
+
+bool isDone(const std::shared_ptr<QELFetch>& fetch) {
+  return fetch && fetch->state() == QELFetch::State::kDone;
+}
+
+}  // namespace
+
+QELKeptShow::QELKeptShow(const Dictionary& kept, const QELBundleDirectory& directory,
+                         const std::string& path)
+    : directory_(directory), path_(path) {
+  podcast_.dictionary = kept;
+  podcast_.dictionary.erase("Episodes");
+  const PropertyListValue* episodes = platform::valueForKey(kept, "Episodes");
+  if (episodes == nullptr || episodes->asArray() == nullptr) return;
+  for (const PropertyListValue& value : *episodes->asArray()) {
+    if (value.asDictionary()) entries_.emplace_back().dictionary = *value.asDictionary();
+  }
+}
+
+/// Absent for a file that is not there; an empty one is as good as none.
+std::optional<std::uint64_t> QELKeptShow::sizeOf(const OptionalText& reference) const {
+  if (!reference || reference->empty()) return std::nullopt;
+  platform::ErrorSlot ignored;
+  const auto file = platform::RegularFile::open(platform::joinedPath(path_, *reference), ignored);
+  return file && file->size() > 0 ? std::optional(file->size()) : std::nullopt;
+}
+
+void QELKeptShow::update(const QELPodcastSource& source, const std::string& origin,
+                         const std::vector<bool>& isWanted, bool allowsLocalFiles) {
+  allowsLocalFiles_ = allowsLocalFiles;
+  static const QELEpisodeList none;
+  const QELEpisodeList& episodes = source.episodes() ? *source.episodes() : none;
+  std::vector<QELEpisodeIdentity> identities;
+  for (const auto& episode : episodes) identities.push_back(QELIdentityOf(*episode));
+  std::vector<QELEpisodeIdentity> keptIdentities;
+  for (const Entry& entry : entries_) keptIdentities.push_back(QELIdentityOf(entry.dictionary));
+  const auto matches = QELMatchedEpisodes(identities, keptIdentities);
+  std::vector<bool> isCurrent(entries_.size());
+  for (const auto& match : matches) {
+    if (match) isCurrent[*match] = true;
+  }
+
+  mediaNames_.take(QELBundleDirectory::kReferenceFileName);
+  mediaNames_.take(QELBundleDirectory::kPostersName);
+  mediaNames_.takeAllOf(path_);
+  posterNames_.takeAllOf(platform::joinedPath(path_, QELBundleDirectory::kPostersName));
+  notePoster(podcast_, "Podcast");
+  for (std::size_t index = 0; index < entries_.size(); ++index) {
+    noteFiles(entries_[index], isCurrent[index]);
+  }
+
+  QELAddPodcastKeys(QELPodcastDescriptiveKeys(), source, podcast_.dictionary);
+  podcast_.dictionary.insert_or_assign("PodcastOrigin", origin);
+  updatePoster(podcast_, "Podcast", source.posterReference(), quoted(source.title(), origin),
+               "Podcast");
+  std::vector<Entry> updated(episodes.size());
+  // A file that is gone gets its name back before a new one takes it.
+  for (const bool isKept : {true, false}) {
+    for (std::size_t index = 0; index < episodes.size(); ++index) {
+      if (matches[index].has_value() != isKept) continue;
+      if (isKept) updated[index] = std::move(entries_[*matches[index]]);
+      if (isKept || isWanted[index]) updateEntry(updated[index], *episodes[index]);
+    }
+  }
+  for (std::size_t index = 0; index < entries_.size(); ++index) {
+    if (isCurrent[index]) continue;
+    if (entries_[index].file == Entry::File::kNone) lose(entries_[index]);
+    updated.push_back(std::move(entries_[index]));
+  }
+  entries_ = std::move(updated);
+  collectFetches();
+}
+
+/// Notes what is there of an entry, and which names that leaves. One that is gone is to have its
+/// name again, where the source has it.
+void QELKeptShow::noteFiles(Entry& entry, bool isCurrent) {
+  const OptionalText reference = platform::textForKey(entry.dictionary, "EpisodeReference");
+  const std::optional<std::uint64_t> size = sizeOf(reference);
+  if (size) {
+    entry.file = Entry::File::kThere;
+    entry.dictionary.insert_or_assign("EpisodeFileSize", *size);
+  }
+  if (reference && (size || !isCurrent)) mediaNames_.take(platform::lastPathComponent(*reference));
+  notePoster(entry, "Episode");
+}
+
+void QELKeptShow::notePoster(const Entry& entry, const std::string& prefix) {
+  const OptionalText reference = platform::textForKey(entry.dictionary, prefix + "PosterReference");
+  if (!reference) return;
+  posterNames_.take(platform::lastPathComponent(*reference));
+  const OptionalText origin = platform::textForKey(entry.dictionary, prefix + "PosterOrigin");
+  if (origin && sizeOf(reference)) posters_.emplace(origin->view(), reference->view());
+}
+
+/// Takes over what the source says; what it does not say stays.
+void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
+  for (const auto& [key, value] : episode.dictionary()) {
+    if (std::ranges::find(kFileKeys, key.view()) != kFileKeys.end()) continue;
+    entry.dictionary.insert_or_assign(key, value);
+  }
+  const OptionalText location = episode.location();
+  if (location) entry.dictionary.insert_or_assign("EpisodeOrigin", *location);
+  const std::string title = quoted(episode.title(), location);
+  OptionalText reference = platform::textForKey(entry.dictionary, "EpisodeReference");
+  if (entry.file == Entry::File::kThere) {
+    ++knownCount_;
+  } else if (location) {
+    const QELMediaReference media = episode.mediaReference();
+    const std::string old = reference ? reference->string() : QELFileName(media).value_or("");
+    const std::string base = QELBaseName(platform::lastPathComponent(old));
+    const std::string name = mediaNames_.reserve(base, platform::pathExtension(old));
+    entry.media = makeFetch(title, media, directory_.mediaPlace(name), true);
+    reference = name;
+  } else if (reference) {
+    lose(entry);
+  } else {
+    ++emptyCount_;
+    return;
+  }
+  updatePoster(entry, "Episode", episode.posterReference(), title,
+               platform::pathWithoutExtension(platform::lastPathComponent(*reference)));
+}
+
+void QELKeptShow::lose(Entry& entry) {
+  entry.file = Entry::File::kLost;
+  lostTitles_.push_back(quoted(platform::textForKey(entry.dictionary, "EpisodeName"),
+                               platform::textForKey(entry.dictionary, "EpisodeReference")));
+}
+
+/// Has a poster fetched that the bundle does not have. One of unknown origin, as other programs put
+/// it there, is taken for the source's.
+void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
+                               const QELMediaReference& poster, const std::string& title,
+                               std::string_view baseName) {
+  if (!poster.location || poster.location->empty()) return;
+  const std::string key = prefix + "PosterReference";
+  const std::string originKey = prefix + "PosterOrigin";
+  const std::string origin = poster.location->string();
+  const OptionalText oldOrigin = platform::textForKey(entry.dictionary, originKey);
+  const bool isThere = sizeOf(platform::textForKey(entry.dictionary, key)).has_value();
+  if (isThere && (!oldOrigin || *oldOrigin == origin)) {
+    entry.dictionary.insert_or_assign(originKey, origin);
+  } else if (const auto found = posters_.find(origin); found != posters_.end()) {
+    setFile(entry.dictionary, key, found->second);
+    entry.dictionary.insert_or_assign(originKey, origin);
+  } else {
+    std::shared_ptr<QELFetch>& fetch = newPosters_[origin];
+    if (!fetch) {
+      const std::string extension(platform::pathExtension(QELFileName(poster).value_or("")));
+      const std::string name = posterNames_.reserve(baseName, extension);
+      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), false);
+    }
+    entry.poster = fetch;
+  }
+}
+
+std::shared_ptr<QELFetch> QELKeptShow::makeFetch(std::string title,
+                                                 const QELMediaReference& reference,
+                                                 const std::optional<platform::FilePlace>& place,
+                                                 bool hasPart) {
+  const bool isLocal = !reference.isRemote || (reference.url && reference.url->scheme() == "file");
+  std::unique_ptr<QELPart> part;
+  if (hasPart && !isLocal && reference.url) {
+    part = std::make_unique<QELPart>(directory_.directory(), path_, reference.url->encodedText());
+    if (!partNames_.insert(part->name()).second) part.reset();
+  }
+  auto fetch = std::make_shared<QELFetch>(std::move(title), reference,
+                                          place.value_or(platform::FilePlace("")), std::move(part));
+  if (isLocal && !allowsLocalFiles_) {
+    fetch->refuse("A feed of the network names a local file, see --allow-local");
+  } else if (reference.isRemote && !reference.url) {
+    fetch->refuse("It is no valid URL");
+  } else if (!place) {
+    fetch->refuse("The bundle cannot have it");
+  }
+  return fetch;
+}
+
+void QELKeptShow::collectFetches() {
+  std::set<const QELFetch*> collected;
+  const auto collect = [&](const std::shared_ptr<QELFetch>& fetch) {
+    if (fetch && collected.insert(fetch.get()).second) fetches_.push_back(fetch);
+  };
+  collect(podcast_.poster);
+  for (const Entry& entry : entries_) {
+    collect(entry.media);
+    collect(entry.poster);
+  }
+}
+
+Dictionary QELKeptShow::dictionary() const {
+  const auto current = [](const Entry& entry, const std::string& prefix) {
+    Dictionary dictionary = entry.dictionary;
+    if (isDone(entry.poster)) {
+      setFile(dictionary, prefix + "PosterReference",
+              platform::joinedPath(QELBundleDirectory::kPostersName, entry.poster->name()));
+      dictionary.insert_or_assign(prefix + "PosterOrigin", *entry.poster->reference().location);
+    }
+    return dictionary;
+  };
+  Dictionary whole = current(podcast_, "Podcast");
+  PropertyListValue::Array episodes;
+  for (const Entry& entry : entries_) {
+    if (entry.file == Entry::File::kNone && !isDone(entry.media)) continue;
+    Dictionary dictionary = current(entry, "Episode");
+    if (isDone(entry.media)) {
+      setFile(dictionary, "EpisodeReference", entry.media->name());
+      dictionary.insert_or_assign("EpisodeFileSize", entry.media->size());
+    }
+    episodes.emplace_back(std::move(dictionary));
+  }
+  if (!episodes.empty()) whole.insert_or_assign("Episodes", std::move(episodes));
+  return whole;
+}
+
+std::size_t QELKeptShow::newCount() const {
+  return static_cast<std::size_t>(
+      std::ranges::count_if(entries_, [](const Entry& entry) { return isDone(entry.media); }));
+}

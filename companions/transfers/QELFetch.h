@@ -1,0 +1,68 @@
+#pragma once
+
+#include <chrono>
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "companions/common/QELTransferDisplay.h"
+#include "companions/transfers/QELPart.h"
+#include "companions/transfers/QELRetrySchedule.h"
+#include "model/QELMediaReference.h"
+#include "platform/net/Download.h"
+
+/// One file that a run fetches: a URL is downloaded, in several tries where that helps, a path is
+/// copied. Nothing is ever replaced by it.
+class QELFetch : private platform::DownloadReceiver {
+ public:
+  using Clock = std::chrono::steady_clock;
+  enum class State { kWaiting, kRunning, kDone, kFailed };
+
+  /// `title` says what it is, for people. With a part, a download goes on from it and leaves it
+  /// behind when it fails. What the place refers to must outlive this.
+  QELFetch(std::string title, QELMediaReference reference, platform::FilePlace place,
+           std::unique_ptr<QELPart> part);
+
+  /// Fails it without a try.
+  void refuse(const std::string& cause);
+  /// Begins the next try; `stallLimit` is the number of seconds without a byte after which it
+  /// fails. A copy has ended when this returns.
+  void start(int stallLimit);
+  /// Ends the running try; its part stays.
+  void cancel();
+
+  State state() const { return state_; }
+  /// While it waits, when the next try is due.
+  Clock::time_point dueTime() const { return dueTime_; }
+  /// How far the running try is.
+  const QELTransferState& progress() const { return progress_; }
+
+  const std::string& title() const { return progress_.title; }
+  const QELMediaReference& reference() const { return reference_; }
+  /// The file's name in its directory.
+  const std::string& name() const { return place_.name; }
+  /// Its size in bytes, once it is done.
+  std::uint64_t size() const { return progress_.received; }
+  /// Why it failed.
+  const std::string& cause() const { return cause_; }
+
+ private:
+  void didReceiveResponse(platform::Download& download, std::int64_t expectedLength) override;
+  void didReceiveDataOfLength(platform::Download& download, std::uint64_t length) override;
+  void downloadDidFinish(platform::Download& download) override;
+  void didFailWithError(platform::Download& download, const platform::ErrorRecord& error) override;
+
+  void finish();
+
+  QELMediaReference reference_;
+  platform::FilePlace place_;
+  std::unique_ptr<QELPart> part_;
+  std::string validator_;  // of the part, as the next try finds it
+  QELRetrySchedule schedule_;
+  QELTransferState progress_;
+  State state_ = State::kWaiting;
+  Clock::time_point dueTime_;
+  std::string cause_;
+  std::unique_ptr<platform::Download> download_;
+};

@@ -1,0 +1,100 @@
+#include "model/QELEpisodeMatching.h"
+
+#include <array>
+#include <map>
+#include <string>
+
+namespace {
+
+using Identity = QELEpisodeIdentity;
+using Sign = std::optional<std::string>;
+
+std::optional<std::chrono::seconds> wholeSeconds(std::optional<platform::PointInTime> date) {
+  if (!date) return std::nullopt;
+  return std::chrono::floor<std::chrono::seconds>(date->time_since_epoch());
+}
+
+/// Unlike for different values, an absent one included, also when others are appended.
+std::string written(const platform::OptionalText& text) {
+  return text ? std::to_string(text->size()).append(":").append(text->view()) : "-";
+}
+std::string written(const std::optional<std::chrono::seconds>& date) {
+  return date ? std::to_string(date->count()).append(";") : "-";
+}
+
+Sign uuidSign(const Identity& episode) {
+  return episode.uuid ? Sign(episode.uuid->string()) : std::nullopt;
+}
+Sign originTitleDateSign(const Identity& episode) {
+  if (!episode.origin) return std::nullopt;
+  return written(episode.origin) + written(episode.title) + written(episode.date);
+}
+Sign originTitleSign(const Identity& episode) {
+  if (!episode.origin) return std::nullopt;
+  return written(episode.origin) + written(episode.title);
+}
+Sign originDateSign(const Identity& episode) {
+  if (!episode.origin) return std::nullopt;
+  return written(episode.origin) + written(episode.date);
+}
+Sign titleDateSign(const Identity& episode) {
+  if (!episode.title || !episode.date) return std::nullopt;
+  return written(episode.title) + written(episode.date);
+}
+
+/// The surest first.
+constexpr std::array kSigns = {&uuidSign, &originTitleDateSign, &originTitleSign, &originDateSign,
+                               &titleDateSign};
+
+/// The kept episodes with one sign that are still to be had, those without and those with a uuid:
+/// whoever may not take the one kind need not look through it for the other.
+struct Candidates {
+  struct Queue {
+    std::vector<std::size_t> numbers;
+    std::size_t next = 0;
+  };
+  std::array<Queue, 2> queues;
+
+  std::optional<std::size_t> take(bool mayHaveUUID) {
+    for (std::size_t kind = 0; kind <= (mayHaveUUID ? 1U : 0U); ++kind) {
+      Queue& queue = queues.at(kind);
+      if (queue.next < queue.numbers.size()) return queue.numbers[queue.next++];
+    }
+    return std::nullopt;
+  }
+};
+
+}  // namespace
+
+QELEpisodeIdentity QELIdentityOf(const QELEpisode& episode) {
+  return {episode.uuid(), episode.location(), episode.title(), wholeSeconds(episode.date())};
+}
+
+QELEpisodeIdentity QELIdentityOf(const platform::Dictionary& entry) {
+  const platform::PropertyListValue* date = platform::valueForKey(entry, "EpisodeDate");
+  return {platform::textForKey(entry, "EpisodeUUID"), platform::textForKey(entry, "EpisodeOrigin"),
+          platform::textForKey(entry, "EpisodeName"),
+          wholeSeconds(date ? date->asDate() : std::nullopt)};
+}
+
+std::vector<std::optional<std::size_t>> QELMatchedEpisodes(std::span<const Identity> source,
+                                                           std::span<const Identity> kept) {
+  std::vector<std::optional<std::size_t>> matches(source.size());
+  std::vector<bool> isTaken(kept.size());
+  for (const auto& sign : kSigns) {
+    std::map<std::string, Candidates> candidates;
+    for (std::size_t number = 0; number < kept.size(); ++number) {
+      const Sign has = isTaken[number] ? std::nullopt : sign(kept[number]);
+      if (!has) continue;
+      candidates[*has].queues.at(kept[number].uuid ? 1 : 0).numbers.push_back(number);
+    }
+    for (std::size_t index = 0; index < source.size(); ++index) {
+      const Sign has = matches[index] ? std::nullopt : sign(source[index]);
+      const auto found = has ? candidates.find(*has) : candidates.end();
+      if (found == candidates.end()) continue;
+      matches[index] = found->second.take(!source[index].uuid || sign == &uuidSign);
+      if (matches[index]) isTaken[*matches[index]] = true;
+    }
+  }
+  return matches;
+}
