@@ -58,7 +58,7 @@ class QELBundleDirectoryTest : public testing::Test {
     media_ = *bundle_.mediaPlace("any");
     return isSaved(bundle_.posterPlace(name), content, alias);
   }
-  bool isWritten() { return bundle_.writeReferenceFile({{"PodcastName", "Show"}}); }
+  bool isWritten() { return bundle_.writeReferenceFile({{"PodcastName", "Show"}}, error_); }
   unsigned modeOf(const std::string& name) const {
     struct stat status {};
     return ::stat(path(name).c_str(), &status) == 0 ? status.st_mode & 07777U : 0;
