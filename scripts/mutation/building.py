@@ -7,7 +7,9 @@ import re
 import shutil
 import subprocess
 from collections import defaultdict
+from concurrent.futures import ProcessPoolExecutor
 from dataclasses import asdict
+from itertools import chain, repeat
 from pathlib import Path
 
 from schemata import SWITCH, with_faults
@@ -112,9 +114,11 @@ def _build(jobs, sites_by_path, numbers):
         print(f"{len(left_out)} faults do not compile so far", flush=True)
 
 
-def _all_sites():
+def _all_sites(jobs):
+    names = [name for name in _files() if _is_product(name)]
     arguments = ["-std=c++20", f"-I{ROOT}", '-DQEL_VERSION="0"', *_output("pkg-config", "--cflags", "libcurl").split()]
-    everything = [site for name in _files() if _is_product(name) for site in sites_of(ROOT, name, arguments)]
+    with ProcessPoolExecutor(jobs) as pool:
+        everything = [*chain(*pool.map(sites_of, repeat(ROOT), names, repeat(arguments)))]
     functions = {(site.path, site.function) for site in everything}
     print(f"{len(everything)} faults in {len(functions)} functions", flush=True)
     return dict(enumerate(everything, start=1))
@@ -128,7 +132,7 @@ def built_sites(jobs):
     if known.get("product") == product:
         sites = {int(number): Site(**site) for number, site in known["sites"].items()}
     else:
-        sites = _all_sites()
+        sites = _all_sites(jobs)
     sites_by_path = defaultdict(list)
     for site in sites.values():
         sites_by_path[site.path].append(site)

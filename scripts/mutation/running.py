@@ -9,12 +9,13 @@ import subprocess
 import tempfile
 import threading
 import time
+from collections import defaultdict
 from pathlib import Path
 
 from building import BUILD, WORK
 
 MEMORY = 6 << 30    # for a fault that takes all
-FILE_SIZE = 2 << 30
+FILE_SIZE = 8 << 30  # some tests make sparse files beyond 2 GiB
 LEAST_TIMEOUT = 20  # seconds
 
 
@@ -24,7 +25,7 @@ class Test:
         self.command = command
         self.environment = environment
         self.directory = directory
-        self.seconds = 0.0  # without a fault
+        self.seconds = None  # without a fault; None as well where it fails then
         self.noticed = 0
 
     def run(self, number, timeout, temporary):
@@ -53,75 +54,81 @@ class Test:
 
 
 def _known_tests():
-    """The unit tests as one test, and the others that run the product; the scripts' own tests stay out."""
+    """The unit tests, a list for each suite, and the other tests that run the product; those of scripts stay out."""
     listed = json.loads(subprocess.run(["ctest", "--show-only=json-v1"], cwd=BUILD, capture_output=True, check=True,
                                        text=True).stdout)
-    unit = None
+    units = defaultdict(list)
     others = []
     for entry in listed["tests"]:
         properties = {value["name"]: value["value"] for value in entry["properties"]}
         environment = dict(pair.split("=", 1) for pair in properties.get("ENVIRONMENT", []))
-        directory = properties.get("WORKING_DIRECTORY", BUILD)
-        if Path(entry["command"][0]).name == "qel_unit_tests":
-            unit = Test("unit tests", [entry["command"][0], "--gtest_brief=1"], environment, directory)
-        elif entry["name"] == "e2e.test_documentation" or \
-                entry["name"] != "layers" and "project" not in properties.get("LABELS", []):
-            command = entry["command"] + (["-f"] if entry["name"].startswith("e2e.") else [])
-            others.append(Test(entry["name"], command, environment, directory))
-    return unit, others
+        test = Test(entry["name"], entry["command"], environment, properties.get("WORKING_DIRECTORY", BUILD))
+        if Path(test.command[0]).name == "qel_unit_tests":
+            units[test.name.rpartition(".")[0]].append(test)
+        elif test.name == "e2e.test_documentation" or \
+                test.name != "layers" and "project" not in properties.get("LABELS", []):
+            if test.name.startswith("e2e."):
+                test.command.append("-f")
+            others.append(test)
+    return units, others
 
 
 class Tests:
+    """All tests that pass without a fault, which is tried first unless that was done for this state of the sources."""
+
     def __init__(self, state):
-        """Tries every test without a fault first, unless that was done for this state of the sources."""
-        self.unit, self.others = _known_tests()
         self.lock = threading.Lock()
-        known = WORK / "tests.json"
-        seconds = json.loads(known.read_text()) if known.is_file() else {}
-        if seconds.get("state") != state:
-            seconds = {"state": state}
-            for test in (self.unit, *self.others):
-                began = time.monotonic()
-                passes = self.with_temporary(lambda temporary, test=test: test.run(0, 600, temporary))
-                seconds[test.name] = time.monotonic() - began if passes else None
-            known.write_text(json.dumps(seconds))
-        for test in (self.unit, *self.others):
-            if seconds[test.name] is None:
+        self.tests = []
+        file = WORK / "tests.json"
+        known = json.loads(file.read_text()) if file.is_file() else {}
+        self.seconds = known["seconds"] if known.get("state") == state else {}
+        units, others = _known_tests()
+        for suite, tests in units.items():
+            # One process for all its tests is much faster than one for each, which some need.
+            first = tests[0]
+            whole = Test(suite, [first.command[0], f"--gtest_filter={suite}.*"], first.environment, first.directory)
+            if not self.take(whole):
+                others += tests
+        for test in others:
+            if not self.take(test):
                 print(f"{test.name} fails without any fault, and is left out", flush=True)
-            test.seconds = seconds[test.name]
-        if self.unit.seconds is None:
-            raise RuntimeError("the unit tests fail without any fault")
-        self.others = [test for test in self.others if test.seconds is not None]
+        file.write_text(json.dumps({"state": state, "seconds": self.seconds}))
+
+    def take(self, test):
+        """Whether it passes without a fault; then it belongs to the tests."""
+        if test.name not in self.seconds:
+            began = time.monotonic()
+            passes = self.run(test, 0, 600)
+            self.seconds[test.name] = time.monotonic() - began if passes else None
+        test.seconds = self.seconds[test.name]
+        if test.seconds is not None:
+            self.tests.append(test)
+        return test.seconds is not None
 
     @staticmethod
-    def with_temporary(action):
+    def run(test, number, timeout):
         temporary = tempfile.mkdtemp(prefix="qm-")
+        os.chmod(temporary, 0o755)  # some tests run the tool as another user
         try:
-            return action(temporary)
+            return test.run(number, timeout, temporary)
         finally:
             shutil.rmtree(temporary, ignore_errors=True)
 
     def sequence(self, path):
         """The tests in the order in which one of them will soonest notice a fault in the file."""
-        suite = Path(path).stem
-        related = Test(f"{suite}Test", [*self.unit.command, f"--gtest_filter={suite}Test.*"], self.unit.environment,
-                       self.unit.directory)
-        related.seconds = self.unit.seconds
-        yield related
-        yield self.unit
-        remaining = list(self.others)
+        suite = f"{Path(path).stem}Test"
+        remaining = list(self.tests)
         while remaining:
             with self.lock:
-                test = max(remaining, key=lambda one: (one.noticed + 0.2) / (one.seconds + 0.2))
+                test = max(remaining, key=lambda one: (one.name.split(".")[0] == suite,
+                                                       (one.noticed + 0.2) / (one.seconds + 0.2)))
             remaining.remove(test)
             yield test
 
     def first_to_notice(self, number, path):
         """The name of the first test that fails with the fault, or None."""
         for test in self.sequence(path):
-            timeout = LEAST_TIMEOUT + 5 * test.seconds
-            if not self.with_temporary(lambda temporary, test=test, timeout=timeout:
-                                       test.run(number, timeout, temporary)):
+            if not self.run(test, number, LEAST_TIMEOUT + 5 * test.seconds):
                 with self.lock:
                     test.noticed += 1
                 return test.name

@@ -79,6 +79,12 @@ class _Source:
                 found.append(token)
         return found
 
+    def is_negated(self, start):
+        """Whether a sign stands before the number there, and not a minus between two operands."""
+        index = bisect.bisect_left(self.starts, start)
+        before = [spelling for _, _, spelling in self.tokens[max(index - 2, 0):index]]
+        return before[-1:] == ["-"] and (before[0] == "return" or not before[0][-1].isalnum() and before[0] not in ")]")
+
     def text(self, start, end):
         """On one line, without comments."""
         return " ".join(spelling for _, _, spelling in self.between(start, end))
@@ -233,7 +239,8 @@ class _Finder:
         if kind == Kind.CXX_BOOL_LITERAL_EXPR and text in ("true", "false"):
             self.add(span, context, "truth", text, "false" if text == "true" else "true")
         elif kind == Kind.INTEGER_LITERAL and text[:1].isdigit():
-            self.add(span, context, "constant", text, f"{text} + 1")
+            # Of -1 and -2 one is as negative as the other, so often nobody could tell them apart.
+            self.add(span, context, "constant", text, f"{text} {'-' if self.source.is_negated(span[0]) else '+'} 1")
         elif kind == Kind.CHARACTER_LITERAL and text.startswith("'"):
             self.add(span, context, "constant", text, f"static_cast<decltype({text})>({text} + 1)")
         elif kind == Kind.DECL_REF_EXPR and cursor.referenced and cursor.referenced.kind == Kind.VAR_DECL:

@@ -157,6 +157,18 @@ TEST(QELFeedPodcastGeneratorTest, DatesAreWrittenInTheProcessesLocaleAndZone) {
               testing::HasSubstr(item("<pubDate>Di., 05 Juni 2007 14:30:00 GMT-07:00</pubDate>")));
 }
 
+TEST(QELFeedPodcastGeneratorTest, StampedEpisodeHasTheCurrentTimeAsItsDate) {
+  const std::shared_ptr<QELEpisode> episode = unorderedEpisode();
+  episode->setDate(PointInTime(0ms));
+  std::string bytes;
+  platform::XMLWriter document(bytes, {});
+  QELPopulateRSSElementFromItem(document.appendRoot("item"), *episode, true, QELFeedStyle());
+  document.finish();
+  EXPECT_TRUE(std::regex_search(bytes, std::regex("<pubDate>[^<]* 20\\d\\d [^<]*</pubDate>")))
+      << bytes;
+  EXPECT_EQ(bytes.find("1970"), std::string::npos);
+}
+
 TEST(QELFeedPodcastGeneratorTest, ItemsFollowTheChannelsOwnChildren) {
   QELPodcastSource source;
   source.setLocation("l");

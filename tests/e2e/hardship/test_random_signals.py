@@ -131,9 +131,10 @@ class RandomMomentTest(InterruptionTestCase):
     def test_filling_a_bundle_with_downloads(self):
         web = self.server()
         files = self.media_files()
-        self.assertBundleIsFilled({"Episodes": [{"EpisodeReference": web.serve(f"/{name}", content)}
-                                                for name, content in files.items()]}, files,
-                                  earlier={"0.mp3": b"another 0" * 50_000, "7.mp3": b"another 7"})
+        self.assertBundleIsFilled({"Episodes": [
+            {"EpisodeReference": web.dripping(f"/{name}", content, pause=0.003, piece=40_000)}
+            for name, content in files.items()]}, files,
+            earlier={name: f"another {name}".encode() * 20_000 for name in list(files)[:8]})
 
     def test_filling_a_bundle_with_copies(self):
         files = self.media_files()

@@ -93,6 +93,12 @@ class MutateTest(ToolTestCase):
                                          check=True, capture_output=True, text=True).stdout
                 self.assertEqual(printed, expected)
 
+    def test_a_negative_number_comes_nearer_to_zero(self):
+        self.write("source.cpp", "int f(int a) { int b = -1; b = a ? -2 : a -3; return (-4) + (a) -5 + a[&b] -6; }")
+        sites = sites_of(self.directory, "source.cpp", [])
+        self.assertEqual([site.after for site in sites if site.kind == "constant"],
+                         ["1 - 1", "2 - 1", "3 + 1", "4 - 1", "5 + 1", "6 + 1"])
+
 
 if __name__ == "__main__":
     unittest.main()
