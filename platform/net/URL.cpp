@@ -134,8 +134,8 @@ bool isWellFormed(const Authority& authority) {
 /// ICU takes it as the UTF-8 that it is.
 std::optional<std::string> hostInASCII(std::string_view host) {
   if (isASCII(host)) return std::string(host);
-  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond that
-  // ICU, whose time to put combining marks in order grows with their square, is not asked.
+  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond
+  // that ICU, whose time to put combining marks in order grows with their square, is not asked.
   constexpr std::size_t kLongestHost = 1024;
   if (host.size() > kLongestHost) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
