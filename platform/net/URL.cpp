@@ -136,8 +136,8 @@ bool isWellFormed(const Authority& authority) {
 std::optional<std::string> hostInASCII(std::string_view writtenHost) {
   const std::string host = percentDecoded(writtenHost);
   if (isASCII(host)) return std::string(writtenHost);
-  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond that
-  // ICU, whose time to put combining marks in order grows with their square, is not asked.
+  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond
+  // that ICU, whose time to put combining marks in order grows with their square, is not asked.
   constexpr std::size_t kLongestHost = 1024;
   if (host.size() > kLongestHost || !hasAcceptableCharacters(host)) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
