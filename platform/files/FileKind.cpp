@@ -65,7 +65,7 @@ std::optional<std::string_view> kindOfBytes(std::string_view head) {
 }
 
 bool isExtensionOfKind(std::string_view extension, std::string_view kind) {
-  const std::string wanted = " " + lowercased(extension) + " ";
+  const std::string wanted = lowercased(extension).insert(0, 1, ' ').append(1, ' ');
   const auto has = [&](const Kind& k) { return k.extensions.find(wanted) != std::string::npos; };
   const bool isOfKind = std::any_of(kKinds.begin(), kKinds.end(),
                                     [&](const Kind& k) { return k.name == kind && has(k); });
