@@ -26,8 +26,6 @@ install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} USE_SOURCE_P
   PATTERN "*.1" EXCLUDE
   PATTERN "__pycache__" EXCLUDE
   PATTERN ".*" EXCLUDE)
-# For people who write reference files by hand; the documents name it by this path.
-install(PROGRAMS scripts/check-reference-file DESTINATION ${CMAKE_INSTALL_DOCDIR}/scripts OPTIONAL)
 
 set(CPACK_GENERATOR TGZ)
 set(CPACK_PACKAGE_DIRECTORY ${PROJECT_BINARY_DIR}/packages)

@@ -3,10 +3,10 @@
 #include <string_view>
 #include <utility>
 
-#include "cli/common/QELError.h"
 #include "generators/QELBundleNames.h"
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
+#include "platform/files/RegularFile.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListWriter.h"
@@ -22,7 +22,7 @@ bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error, Directo
   if (!opened) return false;
   bundle_ = std::move(*opened);
   if (bundle_.lock(wait) == Directory::Lock::kHeldByAnother) {
-    error = QELError(2, "Another run is filling it");
+    error = platform::ErrorRecord{"QELDomain", 2, "Another run is filling it"};
     return false;
   }
   platform::removeStaleTemporaryFiles(bundle_);
@@ -46,8 +46,17 @@ std::optional<platform::Dictionary> QELBundleDirectory::readReferenceFile(const 
   std::optional<platform::PropertyListFault> fault;
   const auto value = platform::readPropertyList(std::move(*bytes), fault);
   if (value && value->asDictionary()) return *value->asDictionary();
-  error = QELError(1, fault ? fault->description : "no dictionary at its root");
+  const std::string cause = fault ? fault->description : "no dictionary at its root";
+  error = platform::ErrorRecord{"QELDomain", 1, "Info.plist: " + cause};
   return std::nullopt;
+}
+
+std::optional<std::uint64_t> QELBundleDirectory::sizeOfFile(
+    const std::string& path, const platform::OptionalText& reference) {
+  if (!reference || reference->empty()) return std::nullopt;
+  ErrorSlot ignored;
+  const auto file = platform::RegularFile::open(platform::joinedPath(path, *reference), ignored);
+  return file && file->size() > 0 ? std::optional(file->size()) : std::nullopt;
 }
 
 std::optional<FilePlace> QELBundleDirectory::mediaPlace(const std::string& name) const {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <functional>
 #include <map>
 #include <optional>
@@ -9,6 +10,7 @@
 #include "platform/files/Directory.h"
 #include "platform/plist/PropertyListValue.h"
 #include "platform/text/ErrorRecord.h"
+#include "platform/text/Text.h"
 
 /// The directory that becomes a bundle, with its "Posters", both opened once: whatever happens to
 /// their paths meanwhile, files come into these two directories and nowhere else.
@@ -34,11 +36,16 @@ class QELBundleDirectory {
             platform::Directory::Wait wait = platform::Directory::Wait::kForever);
 
   const platform::Directory& directory() const { return bundle_; }
+  const platform::Directory& posters() const { return posters_; }
 
   /// The reference dictionary of the bundle at the path, empty where there is none yet. Absent, and
   /// the slot filled, when it cannot be read.
   static std::optional<platform::Dictionary> readReferenceFile(const std::string& path,
                                                                platform::ErrorSlot& error);
+  /// The size of the file to which a reference in that dictionary leads, in bytes. Absent when it
+  /// is not there, or is no regular file; an empty one is as good as none.
+  static std::optional<std::uint64_t> sizeOfFile(const std::string& path,
+                                                 const platform::OptionalText& reference);
 
   /// Absent for a name that no file can have, and for the one that the reference file has.
   std::optional<platform::FilePlace> mediaPlace(const std::string& name) const;

@@ -77,6 +77,13 @@ QELEpisodeIdentity QELIdentityOf(const platform::Dictionary& entry) {
           wholeSeconds(date ? date->asDate() : std::nullopt)};
 }
 
+std::vector<QELEpisodeIdentity> QELIdentitiesOf(const QELEpisodeList& episodes) {
+  std::vector<QELEpisodeIdentity> identities;
+  identities.reserve(episodes.size());
+  for (const auto& episode : episodes) identities.push_back(QELIdentityOf(*episode));
+  return identities;
+}
+
 std::vector<std::optional<std::size_t>> QELMatchedEpisodes(std::span<const Identity> source,
                                                            std::span<const Identity> kept) {
   std::vector<std::optional<std::size_t>> matches(source.size());

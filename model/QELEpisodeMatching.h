@@ -22,6 +22,7 @@ struct QELEpisodeIdentity {
 /// bundle's reference file, which has its origin under a key of its own.
 QELEpisodeIdentity QELIdentityOf(const QELEpisode& episode);
 QELEpisodeIdentity QELIdentityOf(const platform::Dictionary& entry);
+std::vector<QELEpisodeIdentity> QELIdentitiesOf(const QELEpisodeList& episodes);
 
 /// For each episode of the source the number of the kept one that it is; absent for a new one.
 ///

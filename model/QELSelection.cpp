@@ -37,7 +37,9 @@ std::optional<std::chrono::minutes> offsetOf(std::string_view zone) {
 
 }  // namespace
 
-std::vector<bool> QELSelection::of(const QELEpisodeList& episodes) const {
+std::vector<bool> QELSelection::of(const QELPodcastSource& source) const {
+  if (!source.episodes()) return {};
+  const QELEpisodeList& episodes = *source.episodes();
   std::vector<bool> isWanted(episodes.size());
   std::vector<std::size_t> order(episodes.size());
   std::iota(order.begin(), order.end(), 0);

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "model/QELEpisode.h"
+#include "model/QELPodcastSource.h"
 #include "platform/time/PointInTime.h"
 
 /// Which episodes of a source are wanted, by their dates.
@@ -15,8 +15,9 @@ struct QELSelection {
   /// Those of this date or later; one without a date is none of them.
   std::optional<platform::PointInTime> since;
 
-  /// For each episode whether it is wanted. Of those of one date the source's first are.
-  std::vector<bool> of(const QELEpisodeList& episodes) const;
+  /// For each episode of the source whether it is wanted. Of those of one date the source's first
+  /// are.
+  std::vector<bool> of(const QELPodcastSource& source) const;
 };
 
 /// The point in time that a user writes as "2026-05-31" (midnight in the local time zone) or as RFC

@@ -59,9 +59,8 @@ std::unique_ptr<FeedParser> FeedParser::parserWithFeedData(
 }
 
 bool FeedParser::parseWithError(platform::ErrorSlot& error) {
-  std::optional<platform::XMLFault> fault;
-  if (!feedParser_.parse(fault)) {
-    error = fault->record();
+  if (!feedParser_.parse(fault_)) {
+    error = fault_->record();
     return false;
   }
   if (feedType_ == "rss" || feedType_ == "atom") return true;
@@ -89,14 +88,14 @@ void FeedParser::didStartElement(const platform::XMLName& name,
     if (isOfDirectory(name)) {
       if (const auto href = attributes.value("href")) {
         countField(*href);
-        target().insert_or_assign("poster"_text, Text(*href));
+        take(target(), "poster"_text, Text(*href));
       }
     }
   } else if (name.local == "category" && isOfDirectory(name)) {
     // The first category wins: later ones and nested subcategories find the key taken.
     if (const auto text = attributes.value("text")) {
       countField(*text);
-      target().emplace("category"_text, Text(*text));
+      takeFirst("category"_text, *text);
     }
   }
 
@@ -129,7 +128,7 @@ void FeedParser::didEndElement(const platform::XMLName& name) {
   } else if (local == "url") {
     if (parsingImage_) {
       countField(cdataBuffer_);
-      target().emplace("poster"_text, Text(std::string_view(cdataBuffer_)));
+      takeFirst("poster"_text, cdataBuffer_);
     }
     emptyBuffer();
   } else if (local == "link") {
@@ -160,18 +159,18 @@ void FeedParser::readEnclosure(const platform::XMLAttributes& attributes) {
   if (!currentEpisode_) return;
   if (const auto url = attributes.value("url")) {
     countField(*url);
-    currentEpisode_->insert_or_assign("url"_text, Text(*url));
+    take(*currentEpisode_, "url"_text, Text(*url));
   }
   if (const auto length = attributes.value("length")) {
     const std::int64_t number = platform::leadingInteger(*length);
     if (number > 0) {
       countField();
-      currentEpisode_->insert_or_assign("contentLength"_text, number);
+      take(*currentEpisode_, "contentLength"_text, number);
     }
   }
   if (const auto type = attributes.value("type")) {
     countField(*type);
-    currentEpisode_->insert_or_assign("contentType"_text, Text(*type));
+    take(*currentEpisode_, "contentType"_text, Text(*type));
   }
 }
 
@@ -179,9 +178,9 @@ void FeedParser::readAdvisoryLabel() {
   countField();
   const std::string label = platform::lowercased(cdataBuffer_);
   if (label == "yes") {
-    target().insert_or_assign("advisoryLabel"_text, "Explicit"_text);
+    take(target(), "advisoryLabel"_text, "Explicit"_text);
   } else if (label == "clean") {
-    target().insert_or_assign("advisoryLabel"_text, "Clean"_text);
+    take(target(), "advisoryLabel"_text, "Clean"_text);
   }
   emptyBuffer();
 }
@@ -189,7 +188,7 @@ void FeedParser::readAdvisoryLabel() {
 void FeedParser::readDate() {
   if (const auto date = dateWithRFC822String(cdataBuffer_)) {
     countField();
-    target().insert_or_assign("date"_text, *date);
+    take(target(), "date"_text, *date);
   }
   emptyBuffer();
 }
@@ -199,10 +198,19 @@ void FeedParser::readDate() {
 void FeedParser::readLink() {
   if (const auto uuid = leadingUuid(documentMarker_.textBehindMarker(cdataBuffer_))) {
     countField(*uuid);
-    if (currentEpisode_) currentEpisode_->insert_or_assign("QELUUID"_text, Text(*uuid));
+    if (currentEpisode_) take(*currentEpisode_, "QELUUID"_text, Text(*uuid));
   } else if (const auto feedUuid = leadingUuid(collectionMarker_.textBehindMarker(cdataBuffer_))) {
-    feedAttributes_.insert_or_assign("QELUUID"_text, Text(*feedUuid));
+    take(feedAttributes_, "QELUUID"_text, Text(*feedUuid));
   }
+}
+
+void FeedParser::take(Dictionary& target, const Text& key, platform::PropertyListValue value) {
+  target.insert_or_assign(key, std::move(value));
+}
+
+void FeedParser::takeFirst(const Text& key, std::string_view value) {
+  const Dictionary& taken = target();
+  if (taken.find(key) == taken.end()) take(target(), key, Text(value));
 }
 
 void FeedParser::countField(std::string_view text) {
@@ -213,7 +221,7 @@ void FeedParser::countField(std::string_view text) {
 
 void FeedParser::takeText(const Text& key) {
   countField(cdataBuffer_);
-  target().insert_or_assign(key, Text(std::string_view(cdataBuffer_)));
+  take(target(), key, Text(std::string_view(cdataBuffer_)));
   emptyBuffer();
 }
 

@@ -38,6 +38,8 @@
 ///     if (!parser->parseWithError(error)) return false;
 ///     platform::textForKey(parser->feedAttributes(), "title");  // of the channel
 ///     for (const platform::Dictionary& item : parser->episodes()) ...
+///
+/// Whoever wants to know what it takes, and from where, derives from it.
 class FeedParser : private platform::XMLParserEvents {
  public:
   /// A parser of the bytes, which it gives up as it reads them; null for absent data.
@@ -67,6 +69,27 @@ class FeedParser : private platform::XMLParserEvents {
   /// In document order; none when a receiver got them.
   const std::vector<platform::Dictionary>& episodes() const { return episodes_; }
 
+ protected:
+  explicit FeedParser(platform::ByteSource data) : feedParser_(std::move(data), *this) {}
+
+  // A derived class that overrides these calls them, too.
+  void didStartElement(const platform::XMLName& name,
+                       const platform::XMLAttributes& attributes) override;
+  void didEndElement(const platform::XMLName& name) override;
+  void foundCharacters(std::string_view text) override { cdataBuffer_.append(text); }
+  /// Gives a key of the open item, or of the channel between items, its value.
+  virtual void take(platform::Dictionary& target, const platform::Text& key,
+                    platform::PropertyListValue value);
+
+  bool isInItem() const { return currentEpisode_ != nullptr; }
+  bool isOfDirectory(const platform::XMLName& name) const;
+  /// The text collected so far.
+  std::string_view buffer() const { return cdataBuffer_; }
+  /// Where the event stands that is being delivered.
+  platform::TextPosition position() const { return feedParser_.position(); }
+  /// What was wrong with the XML.
+  const std::optional<platform::XMLFault>& fault() const { return fault_; }
+
  private:
   /// The first place of a marker in a text that only grows at its end; nothing is searched twice,
   /// so that asking again and again costs no more than asking once.
@@ -82,24 +105,18 @@ class FeedParser : private platform::XMLParserEvents {
     std::size_t start_ = 0;  // of the marker, or of where it may still begin
   };
 
-  explicit FeedParser(platform::ByteSource data) : feedParser_(std::move(data), *this) {}
-
-  void didStartElement(const platform::XMLName& name,
-                       const platform::XMLAttributes& attributes) override;
-  void didEndElement(const platform::XMLName& name) override;
-  void foundCharacters(std::string_view text) override { cdataBuffer_.append(text); }
-
   void endItem();
   void readEnclosure(const platform::XMLAttributes& attributes);
   void readAdvisoryLabel();
   void readDate();
   void readLink();
 
-  bool isOfDirectory(const platform::XMLName& name) const;
   bool readsRSS() const { return feedType_ == "rss"; }
   /// The open item, or the channel between items.
   platform::Dictionary& target() { return currentEpisode_ ? *currentEpisode_ : feedAttributes_; }
   void takeText(const platform::Text& key);
+  /// Takes the value unless the key has one already.
+  void takeFirst(const platform::Text& key, std::string_view value);
   /// Counts a value that is kept, and the characters of a text.
   void countField(std::string_view text = {});
   void emptyBuffer();
@@ -114,5 +131,6 @@ class FeedParser : private platform::XMLParserEvents {
   MarkerSearch collectionMarker_{"collection/uuid/"};
   MarkerSearch documentMarker_{"document/uuid/"};
   platform::XMLParser feedParser_;
+  std::optional<platform::XMLFault> fault_;
   std::optional<std::string> feedType_;
 };

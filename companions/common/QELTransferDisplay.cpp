@@ -47,9 +47,9 @@ std::string lineOf(const QELTransferState& transfer, std::size_t columns, Clock:
     const double share = std::min(
         1.0, static_cast<double>(transfer.received) / static_cast<double>(*transfer.total));
     const double left = static_cast<double>(*transfer.total) * (1 - share);
-    numbers = " " + barText(share) +
-              padded(std::to_string(static_cast<int>(share * 100)) + "%", 6) +
-              padded(speedText, 13) + padded(speed > 0 ? timeText(left / speed) : "--:--", 10);
+    numbers.append(1, ' ').append(barText(share));
+    numbers += padded(std::to_string(static_cast<int>(share * 100)) + "%", 6) +
+               padded(speedText, 13) + padded(speed > 0 ? timeText(left / speed) : "--:--", 10);
   } else {
     const std::size_t width = kBarWidth + 2 + kNumbersWidth + 1;
     numbers = padded(QELSizeText(transfer.received) + padded(speedText, 13) + std::string(10, ' '),

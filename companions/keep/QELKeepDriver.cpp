@@ -1,17 +1,15 @@
 #include "companions/keep/QELKeepDriver.h"
 
-#include <algorithm>
 #include <cstdint>
 #include <filesystem>
-#include <limits>
 #include <memory>
 #include <optional>
 #include <string>
 #include <system_error>
 #include <utility>
 
-#include "cli/QELSourceResolution.h"
 #include "companions/common/QELCommandLine.h"
+#include "companions/common/QELSourceLoading.h"
 #include "companions/keep/QELKeepRun.h"
 #include "companions/keep/QELKeptShow.h"
 #include "companions/transfers/QELTransfers.h"
@@ -36,40 +34,6 @@ struct Options {
   QELDirectory directory;
 };
 
-bool isOnNetwork(const std::string& source) {
-  return source.starts_with("http") || source.starts_with("pcast");
-}
-
-/// The source as it is remembered: where it lies, from wherever the next run is started.
-std::string lastingSource(const std::string& source) {
-  std::error_code ignored;
-  const bool isURL = isOnNetwork(source) || source.starts_with("file:");
-  return isURL ? source : std::filesystem::absolute(source, ignored).lexically_normal().string();
-}
-
-/// The source, loaded. Null, and the slot filled, when it cannot be.
-std::unique_ptr<QELPodcastSource> loadedSource(const std::string& name, const Options& options,
-                                               ErrorSlot& error) {
-  std::unique_ptr<QELPodcastSource> source;
-  if (QELValidateSource(name, false)) {
-    source = initWithSourceString(name, {options.directory.prefix});
-  }
-  if (!source) {
-    error = {"", 0, "it is no feed, and no reference file or bundle that can be read"};
-    return nullptr;
-  }
-  if (!source->loadSourceWithError(error)) return nullptr;
-  if (platform::lowercased(platform::pathExtension(name)) != "podcast") return source;
-  // A bundle source leaves these as they stand in the bundle.
-  static const QELEpisodeList none;
-  for (const auto& episode : source->episodes() ? *source->episodes() : none) {
-    const QELMediaReference poster = episode->posterReference();
-    if (!poster.location || poster.location->empty() || poster.isRemote) continue;
-    episode->setPosterLocation(platform::joinedPath(name, *poster.location));
-  }
-  return source;
-}
-
 int keep(const QELCommandLine& arguments, const Options& options) {
   const std::string& path = arguments.operands().back();
   const auto fail = [&](const std::string& what, const ErrorSlot& error) {
@@ -80,13 +44,15 @@ int keep(const QELCommandLine& arguments, const Options& options) {
   // there is not made before its source is known.
   ErrorSlot error;
   QELBundleDirectory directory;
+  std::optional<Dictionary> kept = Dictionary();
   const auto open = [&] {
-    return options.isRehearsal || directory.open(path, error, platform::Directory::Wait::kNot);
+    const bool isOpen =
+        options.isRehearsal || directory.open(path, error, platform::Directory::Wait::kNot);
+    if (isOpen) kept = QELBundleDirectory::readReferenceFile(path, error);
+    return isOpen && kept;
   };
   const bool wasThere = platform::fileExists(path);
   if (wasThere && !open()) return fail(path, error);
-  std::optional<Dictionary> kept = QELBundleDirectory::readReferenceFile(path, error);
-  if (!kept) return fail(platform::joinedPath(path, QELBundleDirectory::kReferenceFileName), error);
 
   std::string name = arguments.operands().front();
   if (arguments.operands().size() == 1) {
@@ -100,26 +66,16 @@ int keep(const QELCommandLine& arguments, const Options& options) {
   if (std::filesystem::equivalent(name, path, ignored)) {
     return arguments.wrongUse("SOURCE and BUNDLE are the same");
   }
-  const std::unique_ptr<QELPodcastSource> source = loadedSource(name, options, error);
+  const std::unique_ptr<QELPodcastSource> source = QELLoadedSource(name, options.directory, error);
   if (!source) return fail(name, error);
-  if (!wasThere) {
-    if (!open()) return fail(path, error);
-    kept = QELBundleDirectory::readReferenceFile(path,
-                                                 error);  // another run may have made it meanwhile
-    if (!kept) return fail(path, error);
-  }
+  if (!wasThere && !open()) return fail(path, error);
 
   QELKeptShow show(*kept, directory, path);
-  static const QELEpisodeList none;
-  show.update(*source, lastingSource(name),
-              options.selection.of(source->episodes() ? *source->episodes() : none),
-              options.allowsLocalFiles || !isOnNetwork(name));
+  show.update(*source, QELLastingSource(name), options.selection.of(*source),
+              options.allowsLocalFiles || !QELIsOnNetwork(name));
   QELKeepRun run(arguments, show, std::move(*kept), options.isQuiet);
   if (options.isRehearsal) return run.rehearse();
-  constexpr std::int64_t kLongest = std::numeric_limits<int>::max();
-  return run.fetch(directory, path,
-                   QELTransfers(static_cast<std::size_t>(options.jobs),
-                                static_cast<int>(std::min(options.stallLimit, kLongest))));
+  return run.fetch(directory, QELTransfers(options.jobs, options.stallLimit));
 }
 
 }  // namespace
@@ -142,7 +98,7 @@ int QELRunKeep(std::span<const char* const> commandLine) {
         QELTakeNumber(options.stallLimit, 1)},
        {"allow-local", '\0', "", "let a feed of the network name local files",
         QELTakeFlag(options.allowsLocalFiles)},
-       {"directory", '\0', "NAME=URI", "the prefix of podcast-directory elements (orvane)",
+       {"directory", 'd', "NAME=URI", "the prefix of podcast-directory elements (orvane)",
         QELTakeDirectory(options.directory)},
        {"dry-run", 'n', "", "tell what would be fetched, and make nothing",
         QELTakeFlag(options.isRehearsal)},

@@ -4,10 +4,10 @@
 #include <utility>
 #include <vector>
 
-#include "companions/transfers/QELPart.h"
 #include "platform/files/EndingSignals.h"
 #include "platform/files/StandardStreams.h"
 #include "platform/files/Terminal.h"
+#include "platform/text/FormattedText.h"
 
 namespace {
 
@@ -48,21 +48,18 @@ int QELKeepRun::rehearse() {
   return kAllWell;
 }
 
-int QELKeepRun::fetch(QELBundleDirectory& directory, const std::string& path,
-                      QELTransfers transfers) {
+int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   platform::EndingSignals signals;
   for (const auto& fetch : show_.fetches()) transfers.add(fetch);
-  std::size_t endedCount = 0;
   Clock::time_point lastWriting = Clock::now();
   bool isWritten = true;
   while (isWritten && !transfers.hasEnded() && !platform::EndingSignals::hasCome()) {
     for (const auto& ended : transfers.run()) {
-      ++endedCount;
       if (ended->state() != QELFetch::State::kDone) continue;
       say("fetched " + ended->title() + ": " + ended->name() + " (" + QELSizeText(ended->size()) +
           ")");
     }
-    draw(transfers, endedCount);
+    transfers.draw(display_);
     if (Clock::now() - lastWriting < kWritingPause) continue;
     isWritten = write(directory);
     lastWriting = Clock::now();
@@ -70,11 +67,10 @@ int QELKeepRun::fetch(QELBundleDirectory& directory, const std::string& path,
   transfers.cancel();
   display_.clear();
   isWritten = isWritten && write(directory);
-  const bool wasInterrupted = platform::EndingSignals::hasCome();
-  if (wasInterrupted) commandLine_.report("interrupted; the next run goes on");
+  if (platform::EndingSignals::hasCome()) commandLine_.report("interrupted; the next run goes on");
   const int status = conclude(isWritten);
-  if (status == kAllWell && !wasInterrupted) QELPart::removeAll(directory.directory(), path);
   signals.passOn();
+  if (status == kAllWell) show_.removeParts();
   return status;
 }
 
@@ -88,40 +84,28 @@ bool QELKeepRun::write(QELBundleDirectory& directory) {
     return false;
   }
   written_ = std::move(dictionary);
+  for (const auto& fetch : show_.fetches()) {
+    if (fetch->state() == QELFetch::State::kDone) fetch->forgetPart();
+  }
   return true;
 }
 
-void QELKeepRun::draw(const QELTransfers& transfers, std::size_t endedCount) {
-  const Clock::time_point now = Clock::now();
-  if (!display_.wantsDrawing(now)) return;
-  std::vector<QELTransferState> states;
-  for (const auto& fetch : transfers.running()) states.push_back(fetch->progress());
-  display_.draw(
-      states,
-      std::to_string(endedCount) + " of " + std::to_string(show_.fetches().size()) + " files", now);
-}
-
 int QELKeepRun::conclude(bool isWritten) {
-  std::size_t failedCount = 0;
-  for (const auto& fetch : show_.fetches()) {
-    if (fetch->state() == QELFetch::State::kFailed) ++failedCount;
-  }
-  std::string summary = std::to_string(show_.newCount()) + " new, " +
-                        std::to_string(show_.knownCount()) + " known, " +
-                        std::to_string(failedCount) + " failed";
-  if (show_.emptyCount() > 0) {
-    summary += ", " + std::to_string(show_.emptyCount()) + " without media";
-  }
-  say(summary);
+  std::vector<std::string> failures;
   for (const auto& fetch : show_.fetches()) {
     if (fetch->state() != QELFetch::State::kFailed) continue;
-    commandLine_.report(platform::harmlessText(
-        fetch->title() + ": " + fetch->reference().location->string() + ": " + fetch->cause()));
+    failures.push_back(fetch->title() + ": " + fetch->reference().location->string() + ": " +
+                       fetch->cause());
   }
+  std::string summary = platform::formattedText(
+      "%lu new, %lu known, %lu failed", {show_.newCount(), show_.knownCount(), failures.size()});
+  if (const std::size_t count = show_.emptyCount()) {
+    summary += ", " + std::to_string(count) + " without media";
+  }
+  say(summary);
   for (const std::string& title : show_.lostTitles()) {
-    commandLine_.report(platform::harmlessText(title) +
-                        ": its file is gone, and the source does not have it any more");
+    failures.push_back(title + ": its file is gone, and the source does not have it any more");
   }
-  const bool isAllWell = isWritten && failedCount == 0 && show_.lostTitles().empty();
-  return isAllWell ? kAllWell : kSomethingToLookAt;
+  for (const std::string& failure : failures) commandLine_.report(platform::harmlessText(failure));
+  return isWritten && failures.empty() ? kAllWell : kSomethingToLookAt;
 }

@@ -20,12 +20,11 @@ class QELKeepRun {
   /// Tells what would be fetched.
   int rehearse();
   /// The exit status. SIGINT, SIGTERM and SIGHUP end the run early, and then the process.
-  int fetch(QELBundleDirectory& directory, const std::string& path, QELTransfers transfers);
+  int fetch(QELBundleDirectory& directory, QELTransfers transfers);
 
  private:
   void say(const std::string& line);
   bool write(QELBundleDirectory& directory);
-  void draw(const QELTransfers& transfers, std::size_t endedCount);
   int conclude(bool isWritten);
 
   const QELCommandLine& commandLine_;

@@ -2,13 +2,13 @@
 
 #include <algorithm>
 #include <array>
+#include <set>
 #include <utility>
 
 #include "generators/QELBundleNames.h"
 #include "model/QELEpisodeMatching.h"
 #include "model/QELPodcastKeys.h"
 #include "platform/files/Paths.h"
-#include "platform/files/RegularFile.h"
 #include "platform/text/FormattedText.h"
 
 namespace {
@@ -41,7 +41,9 @@ bool isDone(const std::shared_ptr<QELFetch>& fetch) {
 
 QELKeptShow::QELKeptShow(const Dictionary& kept, const QELBundleDirectory& directory,
                          const std::string& path)
-    : directory_(directory), path_(path) {
+    : directory_(directory),
+      path_(path),
+      postersPath_(platform::joinedPath(path, QELBundleDirectory::kPostersName)) {
   podcast_.dictionary = kept;
   podcast_.dictionary.erase("Episodes");
   const PropertyListValue* episodes = platform::valueForKey(kept, "Episodes");
@@ -51,33 +53,22 @@ QELKeptShow::QELKeptShow(const Dictionary& kept, const QELBundleDirectory& direc
   }
 }
 
-/// Absent for a file that is not there; an empty one is as good as none.
-std::optional<std::uint64_t> QELKeptShow::sizeOf(const OptionalText& reference) const {
-  if (!reference || reference->empty()) return std::nullopt;
-  platform::ErrorSlot ignored;
-  const auto file = platform::RegularFile::open(platform::joinedPath(path_, *reference), ignored);
-  return file && file->size() > 0 ? std::optional(file->size()) : std::nullopt;
-}
-
 void QELKeptShow::update(const QELPodcastSource& source, const std::string& origin,
                          const std::vector<bool>& isWanted, bool allowsLocalFiles) {
   allowsLocalFiles_ = allowsLocalFiles;
   static const QELEpisodeList none;
   const QELEpisodeList& episodes = source.episodes() ? *source.episodes() : none;
-  std::vector<QELEpisodeIdentity> identities;
-  for (const auto& episode : episodes) identities.push_back(QELIdentityOf(*episode));
-  std::vector<QELEpisodeIdentity> keptIdentities;
-  for (const Entry& entry : entries_) keptIdentities.push_back(QELIdentityOf(entry.dictionary));
-  const auto matches = QELMatchedEpisodes(identities, keptIdentities);
+  std::vector<QELEpisodeIdentity> kept;
+  for (const Entry& entry : entries_) kept.push_back(QELIdentityOf(entry.dictionary));
+  const auto matches = QELMatchedEpisodes(QELIdentitiesOf(episodes), kept);
   std::vector<bool> isCurrent(entries_.size());
   for (const auto& match : matches) {
     if (match) isCurrent[*match] = true;
   }
 
   mediaNames_.take(QELBundleDirectory::kReferenceFileName);
-  mediaNames_.take(QELBundleDirectory::kPostersName);
   mediaNames_.takeAllOf(path_);
-  posterNames_.takeAllOf(platform::joinedPath(path_, QELBundleDirectory::kPostersName));
+  posterNames_.takeAllOf(postersPath_);
   notePoster(podcast_, "Podcast");
   for (std::size_t index = 0; index < entries_.size(); ++index) {
     noteFiles(entries_[index], isCurrent[index]);
@@ -102,14 +93,23 @@ void QELKeptShow::update(const QELPodcastSource& source, const std::string& orig
     updated.push_back(std::move(entries_[index]));
   }
   entries_ = std::move(updated);
-  collectFetches();
+
+  std::set<const QELFetch*> collected;  // posters may be shared
+  const auto collect = [&](const std::shared_ptr<QELFetch>& fetch) {
+    if (fetch && collected.insert(fetch.get()).second) fetches_.push_back(fetch);
+  };
+  collect(podcast_.poster);
+  for (const Entry& entry : entries_) {
+    collect(entry.media);
+    collect(entry.poster);
+  }
 }
 
 /// Notes what is there of an entry, and which names that leaves. One that is gone is to have its
 /// name again, where the source has it.
 void QELKeptShow::noteFiles(Entry& entry, bool isCurrent) {
   const OptionalText reference = platform::textForKey(entry.dictionary, "EpisodeReference");
-  const std::optional<std::uint64_t> size = sizeOf(reference);
+  const auto size = QELBundleDirectory::sizeOfFile(path_, reference);
   if (size) {
     entry.file = Entry::File::kThere;
     entry.dictionary.insert_or_assign("EpisodeFileSize", *size);
@@ -123,7 +123,8 @@ void QELKeptShow::notePoster(const Entry& entry, const std::string& prefix) {
   if (!reference) return;
   posterNames_.take(platform::lastPathComponent(*reference));
   const OptionalText origin = platform::textForKey(entry.dictionary, prefix + "PosterOrigin");
-  if (origin && sizeOf(reference)) posters_.emplace(origin->view(), reference->view());
+  if (!origin || !QELBundleDirectory::sizeOfFile(path_, reference)) return;
+  posters_.emplace(origin->view(), reference->view());
 }
 
 /// Takes over what the source says; what it does not say stays.
@@ -143,7 +144,7 @@ void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
     const std::string old = reference ? reference->string() : QELFileName(media).value_or("");
     const std::string base = QELBaseName(platform::lastPathComponent(old));
     const std::string name = mediaNames_.reserve(base, platform::pathExtension(old));
-    entry.media = makeFetch(title, media, directory_.mediaPlace(name), true);
+    entry.media = makeFetch(title, media, directory_.mediaPlace(name), path_);
     reference = name;
   } else if (reference) {
     lose(entry);
@@ -171,7 +172,8 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
   const std::string originKey = prefix + "PosterOrigin";
   const std::string origin = poster.location->string();
   const OptionalText oldOrigin = platform::textForKey(entry.dictionary, originKey);
-  const bool isThere = sizeOf(platform::textForKey(entry.dictionary, key)).has_value();
+  const OptionalText old = platform::textForKey(entry.dictionary, key);
+  const bool isThere = QELBundleDirectory::sizeOfFile(path_, old).has_value();
   if (isThere && (!oldOrigin || *oldOrigin == origin)) {
     entry.dictionary.insert_or_assign(originKey, origin);
   } else if (const auto found = posters_.find(origin); found != posters_.end()) {
@@ -182,44 +184,22 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
     if (!fetch) {
       const std::string extension(platform::pathExtension(QELFileName(poster).value_or("")));
       const std::string name = posterNames_.reserve(baseName, extension);
-      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), false);
+      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), postersPath_);
     }
     entry.poster = fetch;
   }
 }
 
-std::shared_ptr<QELFetch> QELKeptShow::makeFetch(std::string title,
+std::shared_ptr<QELFetch> QELKeptShow::makeFetch(const std::string& title,
                                                  const QELMediaReference& reference,
                                                  const std::optional<platform::FilePlace>& place,
-                                                 bool hasPart) {
+                                                 const std::string& folder) const {
+  auto fetch = std::make_shared<QELFetch>(title, reference, place, folder);
   const bool isLocal = !reference.isRemote || (reference.url && reference.url->scheme() == "file");
-  std::unique_ptr<QELPart> part;
-  if (hasPart && !isLocal && reference.url) {
-    part = std::make_unique<QELPart>(directory_.directory(), path_, reference.url->encodedText());
-    if (!partNames_.insert(part->name()).second) part.reset();
-  }
-  auto fetch = std::make_shared<QELFetch>(std::move(title), reference,
-                                          place.value_or(platform::FilePlace("")), std::move(part));
   if (isLocal && !allowsLocalFiles_) {
     fetch->refuse("A feed of the network names a local file, see --allow-local");
-  } else if (reference.isRemote && !reference.url) {
-    fetch->refuse("It is no valid URL");
-  } else if (!place) {
-    fetch->refuse("The bundle cannot have it");
   }
   return fetch;
-}
-
-void QELKeptShow::collectFetches() {
-  std::set<const QELFetch*> collected;
-  const auto collect = [&](const std::shared_ptr<QELFetch>& fetch) {
-    if (fetch && collected.insert(fetch.get()).second) fetches_.push_back(fetch);
-  };
-  collect(podcast_.poster);
-  for (const Entry& entry : entries_) {
-    collect(entry.media);
-    collect(entry.poster);
-  }
 }
 
 Dictionary QELKeptShow::dictionary() const {
@@ -245,6 +225,11 @@ Dictionary QELKeptShow::dictionary() const {
   }
   if (!episodes.empty()) whole.insert_or_assign("Episodes", std::move(episodes));
   return whole;
+}
+
+void QELKeptShow::removeParts() const {
+  QELPart::removeAll(directory_.directory(), path_);
+  QELPart::removeAll(directory_.posters(), postersPath_);
 }
 
 std::size_t QELKeptShow::newCount() const {

@@ -1,11 +1,9 @@
 #pragma once
 
 #include <cstddef>
-#include <cstdint>
 #include <map>
 #include <memory>
 #include <optional>
-#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -46,6 +44,9 @@ class QELKeptShow {
   /// The titles of the kept episodes whose file is gone and cannot be had again.
   const std::vector<std::string>& lostTitles() const { return lostTitles_; }
 
+  /// Removes the parts that earlier runs left, whosever they are.
+  void removeParts() const;
+
   /// The reference dictionary of this moment. It lists what is whole, and what was lost: nothing
   /// else would tell of that.
   platform::Dictionary dictionary() const;
@@ -59,24 +60,22 @@ class QELKeptShow {
     std::shared_ptr<QELFetch> poster;  // likewise; may be that of several entries
   };
 
-  std::optional<std::uint64_t> sizeOf(const platform::OptionalText& reference) const;
   void noteFiles(Entry& entry, bool isCurrent);
   void notePoster(const Entry& entry, const std::string& prefix);
   void updateEntry(Entry& entry, const QELEpisode& episode);
   void updatePoster(Entry& entry, const std::string& prefix, const QELMediaReference& poster,
                     const std::string& title, std::string_view baseName);
   void lose(Entry& entry);
-  std::shared_ptr<QELFetch> makeFetch(std::string title, const QELMediaReference& reference,
+  std::shared_ptr<QELFetch> makeFetch(const std::string& title, const QELMediaReference& reference,
                                       const std::optional<platform::FilePlace>& place,
-                                      bool hasPart);
-  void collectFetches();
+                                      const std::string& folder) const;
 
   const QELBundleDirectory& directory_;
   const std::string& path_;
+  std::string postersPath_;
   bool allowsLocalFiles_ = false;
   QELFreeNames mediaNames_;
   QELFreeNames posterNames_;
-  std::set<std::string> partNames_;             // each is given to one fetch
   std::map<std::string, std::string> posters_;  // references of those that are there, by origins
   std::map<std::string, std::shared_ptr<QELFetch>> newPosters_;  // by origins
   Entry podcast_;

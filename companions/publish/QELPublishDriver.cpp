@@ -96,23 +96,26 @@ std::unique_ptr<QELPodcastSource> sourceOf(const std::string& text, const QELDir
   return QELValidateSource(std::nullopt, true) ? initWithStandardInput() : nullptr;
 }
 
-/// The directory in which the files of the loaded source lie; absent for a feed of the network.
-OptionalString rootOf(const std::string& text, const QELPodcastSource& source) {
-  if (dynamic_cast<const QELBundlePodcastSource*>(&source) != nullptr) {
-    return source.location()->string();
-  }
+/// Finds the directory in which the files of the loaded source lie; absent for a feed of the
+/// network.
+bool findRoot(const std::string& text, const QELPodcastSource& source, OptionalString& root,
+              platform::ErrorSlot& error) {
   std::string path = text;
-  if (dynamic_cast<const QELFeedPodcastSource*>(&source) != nullptr) {
+  if (dynamic_cast<const QELBundlePodcastSource*>(&source) != nullptr) {
+    path = source.location()->string() + "/";
+  } else if (dynamic_cast<const QELFeedPodcastSource*>(&source) != nullptr) {
     const auto url = platform::URL::parse(text);
-    if (!url || url->scheme() != "file") return std::nullopt;
+    if (!url || url->scheme() != "file") return true;
     path = url->path();
   }
   path.erase(path.rfind('/') + 1);
-  if (platform::isAbsolutePath(path)) return platform::standardisedPath(path);
-  platform::ErrorSlot ignored;
-  const OptionalString directory = platform::currentDirectory(ignored);
-  if (!directory) return std::nullopt;
-  return platform::standardisedPath(platform::joinedPath(*directory, path));
+  if (!platform::isAbsolutePath(path)) {
+    const OptionalString directory = platform::currentDirectory(error);
+    if (!directory) return false;
+    path = platform::joinedPath(*directory, path);
+  }
+  root = platform::standardisedPath(path);
+  return true;
 }
 
 /// Whether the feed would take the place of what it is made from.
@@ -141,12 +144,13 @@ int publish(const QELCommandLine& commandLine, const Options& options,
     return kNothingDone;
   }
   platform::ErrorSlot error;
-  if (!source->loadSourceWithError(error)) {
+  OptionalString root;
+  if (!source->loadSourceWithError(error) || !findRoot(sourceText, *source, root, error)) {
     commandLine.report("cannot load '" + sourceText + "': " + error->description);
     return kNothingDone;
   }
 
-  QELPublication publication(rootOf(sourceText, *source), options.base);
+  QELPublication publication(std::move(root), options.base);
   publication.setLink(options.link);
   publication.prepare(*source);
   QELPublishedFeedGenerator generator(options.directory, stamp);

@@ -7,10 +7,17 @@
 using platform::Download;
 using platform::ErrorSlot;
 
-QELFetch::QELFetch(std::string title, QELMediaReference reference, platform::FilePlace place,
-                   std::unique_ptr<QELPart> part)
-    : reference_(std::move(reference)), place_(std::move(place)), part_(std::move(part)) {
+QELFetch::QELFetch(std::string title, QELMediaReference reference,
+                   const std::optional<platform::FilePlace>& place, const std::string& folder)
+    : reference_(std::move(reference)), place_(place.value_or(platform::FilePlace(""))) {
   progress_.title = std::move(title);
+  if (!place) {
+    refuse("There is no place for it");
+  } else if (reference_.isRemote && !reference_.url) {
+    refuse("It is no valid URL");
+  } else if (reference_.isRemote && reference_.url->scheme() != "file") {
+    part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText());
+  }
 }
 
 void QELFetch::refuse(const std::string& cause) {
@@ -27,6 +34,10 @@ void QELFetch::start(int stallLimit) {
     if (platform::copyFile(reference_.location->string(), place_, error)) return finish();
     return refuse(error->description);
   }
+  if (const auto name = part_ ? part_->finishedName() : std::nullopt) {
+    place_.name = *name;
+    return finish();
+  }
   state_ = State::kRunning;
   platform::DownloadOptions options;
   options.replaces = false;
@@ -34,7 +45,7 @@ void QELFetch::start(int stallLimit) {
   if (part_) {
     options.partName = part_->name();
     options.partValidator = validator_ = part_->validator();
-    part_->note("");
+    part_->removeNote();
   }
   platform::DownloadReceiver& receiver = *this;
   download_ = std::make_unique<Download>(*reference_.url, place_, receiver, std::move(options));
@@ -42,8 +53,19 @@ void QELFetch::start(int stallLimit) {
 
 void QELFetch::cancel() {
   download_.reset();
-  if (part_ && state_ == State::kRunning) part_->note(validator_);
+  if (state_ == State::kRunning) keepPart();
   state_ = State::kWaiting;
+}
+
+void QELFetch::forgetPart() {
+  if (part_) part_->remove();
+  part_.reset();
+}
+
+/// A part that nothing vouches for is of no use.
+void QELFetch::keepPart() const {
+  if (part_ && validator_.empty()) part_->remove();
+  if (part_ && !validator_.empty()) part_->note(validator_, place_.name, progress_.total);
 }
 
 void QELFetch::didReceiveResponse(Download& download, std::int64_t expectedLength) {
@@ -53,7 +75,7 @@ void QELFetch::didReceiveResponse(Download& download, std::int64_t expectedLengt
   // The rest of a file need not be announced with what the whole was.
   const std::string& validator = download.answer().validator;
   if (progress_.resumed == 0 || !validator.empty()) validator_ = validator;
-  part_->note(validator_);
+  part_->note(validator_, place_.name, progress_.total);
 }
 
 void QELFetch::didReceiveDataOfLength(Download& /*download*/, std::uint64_t length) {
@@ -61,16 +83,13 @@ void QELFetch::didReceiveDataOfLength(Download& /*download*/, std::uint64_t leng
 }
 
 void QELFetch::downloadDidFinish(Download& /*download*/) {
-  if (part_) part_->remove();
   finish();
 }
 
 void QELFetch::didFailWithError(Download& download, const platform::ErrorRecord& error) {
   const auto now = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
   const auto wait = schedule_.waitAfter(error, download.answer().retryAfter, now);
-  // A part that nothing vouches for is of no use.
-  if (part_ && !validator_.empty()) part_->note(validator_);
-  if (part_ && validator_.empty()) part_->remove();
+  keepPart();
   if (!wait) return refuse(error.description);
   state_ = State::kWaiting;
   dueTime_ = Clock::now() + *wait;
@@ -84,5 +103,6 @@ void QELFetch::finish() {
   }
   ErrorSlot ignored;
   place_.directory->remove(place_.name, ignored);
+  forgetPart();
   refuse("The file is empty");
 }

@@ -19,10 +19,19 @@ class QELFetch : private platform::DownloadReceiver {
   using Clock = std::chrono::steady_clock;
   enum class State { kWaiting, kRunning, kDone, kFailed };
 
-  /// `title` says what it is, for people. With a part, a download goes on from it and leaves it
-  /// behind when it fails. What the place refers to must outlive this.
-  QELFetch(std::string title, QELMediaReference reference, platform::FilePlace place,
-           std::unique_ptr<QELPart> part);
+  /// `title` says what it is, for people; the folder is the path of the place's directory. It fails
+  /// at once without a place, and where the reference is no URL and should be one. What the place
+  /// refers to must outlive this.
+  ///
+  /// A download goes on from the part that an earlier try left, and leaves one behind when it
+  /// fails; a file that an earlier run had no time to list is taken as it is.
+  QELFetch(std::string title, QELMediaReference reference,
+           const std::optional<platform::FilePlace>& place, const std::string& folder);
+
+  /// The name of its part; empty for one that has none.
+  std::string partName() const { return part_ ? part_->name() : ""; }
+  /// Has it do without a part.
+  void forgoPart() { part_.reset(); }
 
   /// Fails it without a try.
   void refuse(const std::string& cause);
@@ -31,6 +40,8 @@ class QELFetch : private platform::DownloadReceiver {
   void start(int stallLimit);
   /// Ends the running try; its part stays.
   void cancel();
+  /// Says that the file, which is done, has been listed.
+  void forgetPart();
 
   State state() const { return state_; }
   /// While it waits, when the next try is due.
@@ -53,6 +64,7 @@ class QELFetch : private platform::DownloadReceiver {
   void downloadDidFinish(platform::Download& download) override;
   void didFailWithError(platform::Download& download, const platform::ErrorRecord& error) override;
 
+  void keepPart() const;
   void finish();
 
   QELMediaReference reference_;

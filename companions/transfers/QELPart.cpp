@@ -1,20 +1,22 @@
 #include "companions/transfers/QELPart.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdint>
 #include <filesystem>
-#include <optional>
-#include <string_view>
 #include <system_error>
+#include <utility>
 
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/text/ASCII.h"
+#include "platform/text/Splitting.h"
 
 namespace {
 
 constexpr std::string_view kPrefix = ".qel-keep-";
+constexpr std::size_t kNotedLines = 3;
 
 /// FNV-1a. URLs with the same digest share a name; the note tells them apart.
 std::string digest(std::string_view text) {
@@ -34,46 +36,67 @@ std::string contentOf(const std::string& path) {
 
 }  // namespace
 
-QELPart::QELPart(const platform::Directory& directory, const std::string& path,
-                 const std::string& url)
+QELPart::QELPart(const platform::Directory& directory, std::string path, std::string url)
     : directory_(directory),
-      path_(path),
-      url_(url),
-      name_(std::string(kPrefix) + digest(url) + ".part"),
-      noteName_(std::string(kPrefix) + digest(url) + ".note") {}
+      path_(std::move(path)),
+      url_(std::move(url)),
+      name_(std::string(kPrefix) + digest(url_) + ".part"),
+      noteName_(std::string(kPrefix) + digest(url_) + ".note") {}
 
 /// Which start of the system this is, as Linux names it, and the URL.
 std::string QELPart::noteBeginning() const {
   return contentOf("/proc/sys/kernel/random/boot_id") + url_ + "\n";
 }
 
-std::string QELPart::validator() const {
+/// Validator, name and size as they were noted; empty when nothing of use was.
+std::vector<std::string> QELPart::noted() const {
   const std::string note = contentOf(platform::joinedPath(path_, noteName_));
   const std::string beginning = noteBeginning();
-  if (!note.starts_with(beginning) || !directory_.fileSize(name_).value_or(0)) return "";
-  std::string validator = note.substr(beginning.size());
-  // It becomes a line of a request.
-  const bool isOneLine =
-      std::all_of(validator.begin(), validator.end(), [](char c) { return c >= ' ' && c <= '~'; });
-  return isOneLine ? validator : "";
+  if (!note.starts_with(beginning)) return {};
+  std::vector<std::string> lines;
+  for (const std::string_view line :
+       platform::splitAt(std::string_view(note).substr(beginning.size()), '\n')) {
+    lines.emplace_back(line);
+  }
+  return lines.size() == kNotedLines ? lines : std::vector<std::string>();
 }
 
-void QELPart::note(const std::string& validator) const {
+std::string QELPart::validator() const {
+  const std::vector<std::string> lines = noted();
+  if (lines.empty() || directory_.fileSize(name_).value_or(0) == 0) return "";
+  // It becomes a line of a request.
+  const bool isOneLine =
+      std::all_of(lines[0].begin(), lines[0].end(), [](char c) { return c >= ' ' && c <= '~'; });
+  return isOneLine ? lines[0] : "";
+}
+
+std::optional<std::string> QELPart::finishedName() const {
+  const std::vector<std::string> lines = noted();
+  if (lines.empty() || directory_.contains(name_)) return std::nullopt;
+  const std::uint64_t size = directory_.fileSize(lines[1]).value_or(0);
+  const bool isWhole = size > 0 && (lines[2].empty() || lines[2] == std::to_string(size));
+  return isWhole ? std::optional(lines[1]) : std::nullopt;
+}
+
+void QELPart::note(const std::string& validator, const std::string& fileName,
+                   std::optional<std::uint64_t> size) const {
   platform::ErrorSlot ignored;  // without a note the next try begins anew
-  if (validator.empty()) {
-    directory_.remove(noteName_, ignored);
-    return;
-  }
   platform::TemporaryFile file;
+  const std::string sizeText = size ? std::to_string(*size) : "";
   if (file.create({directory_, noteName_}, ignored) &&
-      file.write(noteBeginning() + validator, ignored)) {
+      file.write(noteBeginning() + validator + "\n" + fileName + "\n" + sizeText, ignored)) {
     file.commitReplacing(ignored);
   }
 }
 
-void QELPart::remove() const {
+void QELPart::removeNote() const {
   platform::ErrorSlot ignored;
   directory_.remove(noteName_, ignored);
+}
+
+void QELPart::remove() const {
+  removeNote();
+  platform::ErrorSlot ignored;
   directory_.remove(name_, ignored);
 }
 

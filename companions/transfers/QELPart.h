@@ -1,17 +1,22 @@
 #pragma once
 
+#include <cstdint>
+#include <optional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "platform/files/Directory.h"
 
-/// The part of a file that a try left in the bundle's directory, and a note beside it of what
-/// proves that a server still has the same file, so that another try can go on behind the part.
+/// The part of a file that a try left in its directory, and a note beside it. The note says what
+/// proves that a server still has the same file, so that another try can go on behind the part; and
+/// which name the whole file gets, so that one that a run had no time to list is not lost.
 ///
 /// The names are ".qel-keep-", a digest of the URL, and ".part" or ".note".
 class QELPart {
  public:
-  /// `path` is that of the directory. Both must outlive this.
-  QELPart(const platform::Directory& directory, const std::string& path, const std::string& url);
+  /// `path` is that of the directory, which must outlive this.
+  QELPart(const platform::Directory& directory, std::string path, std::string url);
 
   const std::string& name() const { return name_; }
 
@@ -19,11 +24,15 @@ class QELPart {
   /// from: one of another URL, say, or from before the system was started anew, when a power cut
   /// may have lost some of its middle.
   std::string validator() const;
+  /// The name of the whole file, when it has it already. Absent under the same conditions.
+  std::optional<std::string> finishedName() const;
 
-  /// Notes the validator, empty for none. While the part may change there is to be no note: the
-  /// process can end at any moment.
-  void note(const std::string& validator) const;
-
+  /// Notes the validator, empty for none, the whole file's name and its size, where that is known.
+  void note(const std::string& validator, const std::string& fileName,
+            std::optional<std::uint64_t> size) const;
+  /// Removes the note. There is to be none while a part may become another file's: the process can
+  /// end at any moment.
+  void removeNote() const;
   /// Removes part and note.
   void remove() const;
 
@@ -32,9 +41,10 @@ class QELPart {
 
  private:
   std::string noteBeginning() const;
+  std::vector<std::string> noted() const;
 
   const platform::Directory& directory_;
-  const std::string& path_;
+  std::string path_;
   std::string url_;
   std::string name_;
   std::string noteName_;

@@ -2,16 +2,30 @@
 
 #include <algorithm>
 #include <chrono>
+#include <limits>
 #include <thread>
 #include <utility>
 
 #include "platform/net/EventLoop.h"
+#include "platform/text/FormattedText.h"
 
 namespace {
 
 constexpr auto kLongestWait = std::chrono::milliseconds(200);
 
 }  // namespace
+
+QELTransfers::QELTransfers(std::int64_t jobs, std::int64_t stallLimit)
+    : jobs_(static_cast<std::size_t>(jobs)),
+      stallLimit_(
+          static_cast<int>(std::min<std::int64_t>(stallLimit, std::numeric_limits<int>::max()))) {}
+
+void QELTransfers::add(std::shared_ptr<QELFetch> fetch) {
+  // Two of one URL may run at once.
+  if (!partNames_.insert(fetch->partName()).second) fetch->forgoPart();
+  queue_.push_back(std::move(fetch));
+  ++count_;
+}
 
 /// Null when nothing is due.
 std::shared_ptr<QELFetch> QELTransfers::takeNext() {
@@ -50,7 +64,16 @@ QELTransfers::Fetches QELTransfers::run() {
     (fetch->state() == QELFetch::State::kWaiting ? later_ : ended).push_back(fetch);
     return true;
   });
+  endedCount_ += ended.size();
   return ended;
+}
+
+void QELTransfers::draw(QELTransferDisplay& display) const {
+  const auto now = QELFetch::Clock::now();
+  if (!display.wantsDrawing(now)) return;
+  std::vector<QELTransferState> states;
+  for (const auto& fetch : running_) states.push_back(fetch->progress());
+  display.draw(states, platform::formattedText("%lu of %lu files", {endedCount_, count_}), now);
 }
 
 void QELTransfers::cancel() {

@@ -1,8 +1,11 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <deque>
 #include <memory>
+#include <set>
+#include <string>
 #include <vector>
 
 #include "companions/transfers/QELFetch.h"
@@ -13,16 +16,18 @@ class QELTransfers {
  public:
   using Fetches = std::vector<std::shared_ptr<QELFetch>>;
 
-  /// At most `jobs` at once. For the limit see QELFetch.
-  QELTransfers(std::size_t jobs, int stallLimit) : jobs_(jobs), stallLimit_(stallLimit) {}
+  /// At most `jobs` at once. For the limit see QELFetch. Both are at least 1.
+  QELTransfers(std::int64_t jobs, std::int64_t stallLimit);
 
-  void add(std::shared_ptr<QELFetch> fetch) { queue_.push_back(std::move(fetch)); }
-  bool hasEnded() const { return queue_.empty() && later_.empty() && running_.empty(); }
-  const Fetches& running() const { return running_; }
+  void add(std::shared_ptr<QELFetch> fetch);
+  bool hasEnded() const { return endedCount_ == count_; }
 
   /// Starts what is due, and waits until something happens, but no longer than a fifth of a second.
   /// Gives those that are done or failed now.
   Fetches run();
+
+  /// Shows how far the running ones are, when the display wants it.
+  void draw(QELTransferDisplay& display) const;
 
   /// Ends all that are running.
   void cancel();
@@ -35,4 +40,7 @@ class QELTransfers {
   std::deque<std::shared_ptr<QELFetch>> queue_;
   Fetches later_;  // for another try
   Fetches running_;
+  std::set<std::string> partNames_;
+  std::size_t count_ = 0;
+  std::size_t endedCount_ = 0;
 };

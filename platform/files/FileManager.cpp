@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstddef>
@@ -85,6 +86,34 @@ std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& erro
     }
     return count;
   });
+}
+
+std::optional<std::vector<std::string>> filesBelow(const std::string& directory, ErrorSlot& error) {
+  namespace fs = std::filesystem;
+  std::vector<std::string> names;
+  std::error_code failure;
+  fs::recursive_directory_iterator entry(directory, failure);
+  for (; !failure && entry != fs::recursive_directory_iterator(); entry.increment(failure)) {
+    std::error_code ignored;
+    const bool isDirectory = entry->is_directory(ignored) && !entry->is_symlink(ignored);
+    const bool isHidden = entry->path().filename().native().starts_with('.');
+    if (isHidden) entry.disable_recursion_pending();
+    if (isHidden || !isDirectory) names.push_back(entry->path().lexically_relative(directory));
+  }
+  if (failure) {
+    error = posixError(failure.value());
+    return std::nullopt;
+  }
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+bool liesBelow(const std::string& path, const std::string& directory) {
+  std::error_code failure;
+  const std::string found = std::filesystem::canonical(path, failure);
+  if (failure) return true;
+  const std::string above = std::filesystem::canonical(directory, failure);
+  return failure || found == above || found.starts_with(above == "/" ? above : above + "/");
 }
 
 bool createDirectories(const std::string& path, ErrorSlot& error) {

@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "platform/files/Directory.h"
 #include "platform/text/ByteSource.h"
@@ -20,6 +21,15 @@ bool fileExists(const std::string& path);
 /// FIFO, socket) and a file over kWholeReadLimit give no value and fill the slot; a file that grows
 /// beyond the limit meanwhile fails like one that cannot be read any further.
 std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& error);
+
+/// The paths of all that lies below the directory, relative to it and sorted, but for the
+/// directories themselves. A hidden directory is named and not looked into, and no link is
+/// followed. No value, and the slot filled, on failure.
+std::optional<std::vector<std::string>> filesBelow(const std::string& directory, ErrorSlot& error);
+
+/// Whether what is at the path lies in the directory or below it, links followed; true as well when
+/// one of them cannot be looked at.
+bool liesBelow(const std::string& path, const std::string& directory);
 
 /// Creates the directory and all missing parents; an existing directory is accepted.
 bool createDirectories(const std::string& path, ErrorSlot& error);

@@ -36,6 +36,9 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
   /// an error when that failed.
   virtual bool advance(ErrorSlot& error) = 0;
 
+  /// What the file takes over from one that it is the copy of.
+  virtual std::optional<FileAttributes> attributes() const { return std::nullopt; }
+
   bool begin(std::int64_t expectedLength, const std::vector<std::string>& contentCodings,
              ErrorSlot& error) override {
     if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kRefused, error)) {
@@ -43,7 +46,7 @@ class Download::Transfer : public EventSource, protected NetworkTransfer::Sink {
     }
     const bool isCreated =
         options_.partName.empty()
-            ? file_.create(place_, error)
+            ? file_.create(place_, error, attributes())
             : file_.createPart(place_, options_.partName, download_.resumedLength_, error);
     if (!isCreated) return false;
     response_ = decoder_.isCoded() ? -1 : expectedLength;
@@ -159,6 +162,8 @@ class Download::FileDownload final : public Transfer {
   bool hasEvent() const override { return true; }
 
  private:
+  std::optional<FileAttributes> attributes() const override { return source_->attributes(); }
+
   bool advance(ErrorSlot& error) override {
     if (source_) return copyChunk(error);
     source_ = RegularFile::open(url_.path(), error);

@@ -30,11 +30,11 @@ struct DownloadOptions {
   /// The name, in the destination's directory, of the file that holds the bytes until they are all
   /// there. It is left there when the download fails or the process ends, so that another can go on
   /// from it. Empty: a hidden name that no failure leaves behind.
-  std::string partName;
+  std::string partName = {};
   /// The validator of the answer that the part there came from. With it, only the rest is asked
   /// for; the download goes on behind the part where the server proves the file to be the same, and
   /// from the start otherwise. Empty, and where the place is a path: from the start.
-  std::string partValidator;
+  std::string partValidator = {};
   /// The seconds without a byte after which the download fails (domain "transfer", code 28), from
   /// the connecting on; 0 for no limit.
   int stallLimit = 0;
@@ -65,7 +65,8 @@ class DownloadReceiver {
 /// once they are all there. http and https: a final status of 200 is success and nothing else is;
 /// at most 20 redirects, to http and https only; the body is asked for as it is (no compression),
 /// and one that comes by gzip all the same is decompressed, with an expected length of -1.
-/// file: regular files only. No retry and no time-out. Destroying a running download cancels it.
+/// file: regular files only, whose permissions and time are kept. No retry and no time-out.
+/// Destroying a running download cancels it.
 ///
 ///     const Download download(*URL::parse("https://example.org/one.mp3"), "one.mp3", receiver);
 ///     while (!receiver.hasEnded() && runEventLoopOnce()) continue;  // which tells the receiver

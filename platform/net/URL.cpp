@@ -24,13 +24,14 @@ bool isPercentTriplet(std::string_view text, std::size_t at) {
 }
 
 /// The text with all bytes percent-encoded but those that the predicate keeps, behind a beginning.
+/// The predicate is asked more than once, each time with a reference into the text.
 template <typename Predicate>
 std::string percentEncoded(std::string_view text, Predicate isKept, std::string_view start = {}) {
   const auto keptCount = std::count_if(text.begin(), text.end(), isKept);
   std::string encoded;
   encoded.reserve(start.size() + 3 * text.size() - 2 * static_cast<std::size_t>(keptCount));
   encoded = start;
-  for (const char c : text) {
+  for (const char& c : text) {
     if (isKept(c)) {
       encoded += c;
       continue;
@@ -135,7 +136,10 @@ bool isWellFormed(const Authority& authority) {
 std::optional<std::string> hostInASCII(std::string_view writtenHost) {
   const std::string host = percentDecoded(writtenHost);
   if (isASCII(host)) return std::string(writtenHost);
-  if (!hasAcceptableCharacters(host)) return std::nullopt;
+  // A name has 253 characters at most. Decomposed ones take several times as many bytes; beyond
+  // that ICU, whose time to put combining marks in order grows with their square, is not asked.
+  constexpr std::size_t kLongestHost = 1024;
+  if (host.size() > kLongestHost || !hasAcceptableCharacters(host)) return std::nullopt;
   UErrorCode status = U_ZERO_ERROR;
   const std::unique_ptr<UIDNA, decltype(&uidna_close)> converter(
       uidna_openUTS46(UIDNA_CHECK_BIDI | UIDNA_CHECK_CONTEXTJ | UIDNA_NONTRANSITIONAL_TO_ASCII,
@@ -233,12 +237,13 @@ std::optional<URL> URL::resolved(std::string_view reference) const {
   const std::optional<Components> target = componentsOf(text);
   if (!target) return std::nullopt;
   const std::size_t pathStart = static_cast<std::size_t>(target->path.data() - text.data());
-  const std::string_view tail = std::string_view(text).substr(pathStart);
-  std::size_t position = 0;
-  return parse(text.substr(0, pathStart) + percentEncoded(tail, [&](char c) {
+  std::string tail;
+  for (std::size_t i = pathStart; i < text.size(); ++i) {
+    tail += text[i];
+    if (text[i] == '%' && !isPercentTriplet(text, i)) tail += "25";
+  }
+  return parse(text.substr(0, pathStart) + percentEncoded(tail, [](char c) {
                  constexpr std::string_view kNotAllowed = " <>\"{}|\\^`[]";
-                 const std::size_t at = position++;
-                 if (c == '%') return isPercentTriplet(tail, at);
                  return isASCII(c) && kNotAllowed.find(c) == std::string_view::npos;
                }));
 }

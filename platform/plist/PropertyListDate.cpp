@@ -12,6 +12,8 @@
 namespace platform {
 namespace {
 
+using namespace std::chrono_literals;
+
 constexpr std::int64_t kSecondsOfDay = 86400;
 
 std::int64_t daysOfMonth(std::int64_t year, std::int64_t month) {
@@ -40,6 +42,21 @@ bool takeCharacter(std::string_view& text, char character) {
   if (!text.starts_with(character)) return false;
   text.remove_prefix(1);
   return true;
+}
+
+/// Takes a fraction of a second at the start of the text away; absent for a point without digits.
+std::optional<std::chrono::milliseconds> takeFraction(std::string_view& text) {
+  if (!takeCharacter(text, '.') && !takeCharacter(text, ',')) return 0ms;
+  const std::size_t count = std::min(text.find_first_not_of("0123456789"), text.size());
+  if (count == 0) return std::nullopt;
+  std::chrono::milliseconds fraction{};
+  auto unit = 100ms;
+  for (const char digit : text.substr(0, count)) {
+    fraction += (digit - '0') * unit;
+    unit /= 10;  // nothing behind the third digit
+  }
+  text.remove_prefix(count);
+  return fraction;
 }
 
 }  // namespace
@@ -80,15 +97,17 @@ std::optional<PointInTime> dateFromPropertyListText(std::string_view text) {
     std::int64_t last;
   };
   static constexpr std::array<Field, 5> kFields = {
-      {{'-', 1, 12}, {'-', 1, 31}, {'T', 0, 23}, {':', 0, 59}, {':', 0, 59}}};
+      {{'-', 1, 12}, {'-', 1, 31}, {'T', 0, 23}, {':', 0, 59}, {':', 0, 60}}};
   std::array<std::int64_t, kFields.size()> values = {1, 1, 0, 0, 0};
-  for (std::size_t i = 0; i < kFields.size() && text != "Z"; ++i) {
+  std::size_t i = 0;
+  for (; i < kFields.size() && text != "Z"; ++i) {
     if (!takeCharacter(text, kFields[i].separator)) return std::nullopt;
     const auto value = takeDigits(text, 2, 2);
     if (!value || *value < kFields[i].first || *value > kFields[i].last) return std::nullopt;
     values[i] = *value;
   }
-  if (text != "Z") return std::nullopt;
+  const auto fraction = i == kFields.size() ? takeFraction(text) : 0ms;
+  if (!fraction || text != "Z") return std::nullopt;
 
   const auto [month, day, hour, minute, second] = values;
   const CivilDay civil{beforeYearZero ? -*year : *year, month, day};
@@ -101,7 +120,9 @@ std::optional<PointInTime> dateFromPropertyListText(std::string_view text) {
   if (seconds < kFirst || seconds > kLast) return std::nullopt;
   // The first second is held in part only: its beginning lies before every PointInTime.
   if (seconds == kFirst) return PointInTime::min();
-  return PointInTime(seconds);
+  // And the last one in part.
+  const auto room = seconds == kLast ? PointInTime::max() - PointInTime(kLast) : 999ms;
+  return PointInTime(seconds) + std::min(*fraction, room);
 }
 
 }  // namespace platform

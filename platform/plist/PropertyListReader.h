@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "platform/plist/PropertyListValue.h"
 #include "platform/text/ByteSource.h"
@@ -25,6 +26,18 @@ struct PropertyListFault {
   std::optional<std::uint64_t> object = std::nullopt;
 };
 
+/// Where a value of a property list stands in its XML form, and its key where it has one.
+struct PropertyListPlace {
+  Text key = {};                  // empty in an array
+  TextPosition keyPosition = {};  // that of the value, in an array
+  TextPosition position = {};     // of the value
+  std::size_t end = 0;            // the index behind the last of the values inside of this one
+};
+
+/// The places of all values in document order, a container's own before those of its values. A
+/// value that is not in the list, since its key stands there again, has its place all the same.
+using PropertyListPlaces = std::vector<PropertyListPlace>;
+
 /// Reads a property list in its XML form (the DTD "PropertyList 1.0", any encoding) or its binary
 /// form ("bplist00"):
 ///
@@ -37,7 +50,11 @@ struct PropertyListFault {
 /// are no Unicode (lone surrogates, bytes over 127 in ASCII) become U+FFFD. Where a dictionary has
 /// a key twice, the last one counts. The binary form's null, fill and UID objects have no place in
 /// a property list and are refused; a set is read as an array.
+///
+/// With `places`, which is empty, those of the XML form are recorded, and a fault of a value stands
+/// at that value and not at its end; what a binary list has stands nowhere.
 std::optional<PropertyListValue> readPropertyList(ByteSource bytes,
-                                                  std::optional<PropertyListFault>& fault);
+                                                  std::optional<PropertyListFault>& fault,
+                                                  PropertyListPlaces* places = nullptr);
 
 }  // namespace platform

@@ -7,6 +7,7 @@
 #include <string_view>
 #include <system_error>
 #include <utility>
+#include <vector>
 
 #include "platform/plist/PropertyListBuilder.h"
 #include "platform/plist/PropertyListDate.h"
@@ -94,13 +95,14 @@ constexpr auto kElements = std::to_array<Element>({
 /// Reads one list.
 class Reader final : private XMLParserEvents {
  public:
-  explicit Reader(ByteSource bytes) : parser_(std::move(bytes), *this) {}
+  Reader(ByteSource bytes, PropertyListPlaces* places)
+      : parser_(std::move(bytes), *this), places_(places) {}
 
   Value read(std::optional<PropertyListFault>& fault) {
     std::optional<XMLFault> found;
     if (parser_.parse(found)) return builder_.takeRoot();
     fault = PropertyListFault{.description = std::move(found->description)};
-    if (!found->reading) fault->position = found->position;
+    if (!found->reading) fault->position = faultyValue_.value_or(found->position);
     return std::nullopt;
   }
 
@@ -133,6 +135,7 @@ class Reader final : private XMLParserEvents {
       parser_.abort(kKeyWithoutValue);
     } else if (builder_.depth() > 0) {
       builder_.end();
+      if (places_ != nullptr) endPlace();
     } else if (!builder_.hasRoot()) {
       parser_.abort("a property list without a value");
     }
@@ -152,6 +155,7 @@ class Reader final : private XMLParserEvents {
     } else if (builder_.hasPendingKey()) {
       parser_.abort(kKeyWithoutValue);
     } else {
+      if (places_ != nullptr) keyPosition_ = parser_.position();
       startText(element);
     }
   }
@@ -165,7 +169,14 @@ class Reader final : private XMLParserEvents {
       parser_.abort("a second value in a property list");
     } else if (builder_.isInDictionary() && !builder_.hasPendingKey()) {
       parser_.abort("a value without a key in a dictionary");
-    } else if (!isArray && element.kind != Kind::kDictionary) {
+    } else {
+      if (places_ != nullptr) beginPlace();
+      startSoundValue(element, isArray);
+    }
+  }
+
+  void startSoundValue(const Element& element, bool isArray) {
+    if (!isArray && element.kind != Kind::kDictionary) {
       startText(element);
     } else if (builder_.depth() == kPropertyListDepthLimit) {
       parser_.abort(kPropertyListTooDeep);
@@ -183,13 +194,29 @@ class Reader final : private XMLParserEvents {
 
   void endText(const Element& element) {
     if (element.kind == Kind::kKey) {
-      builder_.setKey(text_);
+      Text key(text_);
+      if (places_ != nullptr) key_ = key;
+      builder_.setKey(std::move(key));
     } else if (Value value = element.value(text_)) {
       parser_.count([this](MemoryBudget& budget) { return budget.takeWritten(text_); });
       builder_.add(std::move(*value));
+      if (places_ != nullptr) endPlace();
     } else {
+      if (places_ != nullptr) faultyValue_ = places_->back().position;
       parser_.abort(element.fault);
     }
+  }
+
+  void beginPlace() {
+    const TextPosition position = parser_.position();
+    openPlaces_.push_back(places_->size());
+    const bool hasKey = builder_.isInDictionary();
+    places_->push_back({hasKey ? key_ : Text(), hasKey ? keyPosition_ : position, position});
+  }
+
+  void endPlace() {
+    (*places_)[openPlaces_.back()].end = places_->size();
+    openPlaces_.pop_back();
   }
 
   static constexpr const char* kKeyWithoutValue = "a key without a value in a dictionary";
@@ -199,13 +226,20 @@ class Reader final : private XMLParserEvents {
   bool isInsideList_ = false;
   const Element* open_ = nullptr;  // the open element that holds text, not elements
   std::string text_;               // what it holds so far
+
+  PropertyListPlaces* places_;           // null when nobody asks for them
+  std::vector<std::size_t> openPlaces_;  // the indices of those whose values have not ended
+  Text key_;                             // the last one, and where it stands
+  TextPosition keyPosition_;
+  std::optional<TextPosition> faultyValue_;
 };
 
 }  // namespace
 
 std::optional<PropertyListValue> readXMLPropertyList(ByteSource bytes,
-                                                     std::optional<PropertyListFault>& fault) {
-  return Reader(std::move(bytes)).read(fault);
+                                                     std::optional<PropertyListFault>& fault,
+                                                     PropertyListPlaces* places) {
+  return Reader(std::move(bytes), places).read(fault);
 }
 
 }  // namespace platform

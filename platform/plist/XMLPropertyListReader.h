@@ -8,6 +8,7 @@ namespace platform {
 
 /// Reads the XML form of a property list, for readPropertyList; without a value, with the fault.
 std::optional<PropertyListValue> readXMLPropertyList(ByteSource bytes,
-                                                     std::optional<PropertyListFault>& fault);
+                                                     std::optional<PropertyListFault>& fault,
+                                                     PropertyListPlaces* places = nullptr);
 
 }  // namespace platform

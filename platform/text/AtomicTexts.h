@@ -61,6 +61,7 @@ class AtomicTexts {
         if (all[index]) mask_ = static_cast<Mask>(mask_ | bit(index));
       }
       if (mask_ == 0) return;
+      // NOLINTNEXTLINE(modernize-avoid-c-arrays)
       texts_ = std::make_unique<Text[]>(static_cast<std::size_t>(std::popcount(mask_)));
       Text* next = texts_.get();
       for (OptionalText& text : all) {

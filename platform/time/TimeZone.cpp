@@ -47,6 +47,8 @@ std::int64_t libraryOffset(Duration time, bool isLocalTime) {
 
 /// The zone of the database; null when there is none.
 std::unique_ptr<const icu::TimeZone> databaseZone(std::string_view name) {
+  constexpr std::size_t kLongestName = 255;  // those of the database have a few dozen characters
+  if (name.size() > kLongestName) return nullptr;
   if (name.find('\0') != std::string_view::npos) return nullptr;  // where ICU would stop reading
   // ICU makes a zone of any name: of "GMT+5" an offset, of an unknown one the zone Etc/Unknown.
   const icu::UnicodeString id = icu::UnicodeString::fromUTF8(icu::StringPiece(name));

@@ -29,6 +29,11 @@ constexpr std::string_view kUTF8Mark = "\xEF\xBB\xBF";
 /// is scanned anew with each further piece.
 constexpr std::size_t kPieceSize = std::size_t{64} << 20;
 
+/// The longest that may wait, so that a document which is all one tag is told from a lack of
+/// memory.
+constexpr std::uint64_t kLongestTag = 2 * kPieceSize;
+constexpr const char* kTooLong = "a tag or text too long for the parser";
+
 /// At least so many bytes are read first, so that marks and white space to skip lie in the first
 /// piece also where a document is larger than expected.
 constexpr std::uint64_t kSmallestSize = std::uint64_t{64} << 10;
@@ -112,6 +117,7 @@ struct XMLParser::Run {
   bool feed() {
     // A mark in front keeps the library from guessing at UTF-16.
     XML_Parse(handle.get(), kUTF8Mark.data(), static_cast<int>(kUTF8Mark.size()), XML_FALSE);
+    std::uint64_t fed = kUTF8Mark.size();
     const std::uint64_t expected = std::max(owner.document_.expectedSize(), kSmallestSize);
     // The byte beyond what is expected lets the end be seen.
     std::size_t size = expected < owner.largestWholeSize_ ? expected + 1 : kPieceSize;
@@ -131,6 +137,12 @@ struct XMLParser::Run {
       const XML_Status status = XML_ParseBuffer(handle.get(), static_cast<int>(*count - skipped),
                                                 static_cast<int>(isLast));
       if (status != XML_STATUS_OK || isLast) return status == XML_STATUS_OK;
+      fed += *count - skipped;
+      const auto parsed = static_cast<std::uint64_t>(XML_GetCurrentByteIndex(handle.get()));
+      if (fed > parsed && fed - parsed > kLongestTag) {
+        fail(XML_ERROR_NO_MEMORY, kTooLong);
+        return false;
+      }
       size = kPieceSize;
     }
   }
@@ -148,13 +160,16 @@ struct XMLParser::Run {
   /// The fault at the library's place, unless there is one already.
   void fail(XML_Error code, std::string description) {
     if (fault) return;
+    const TextPosition where = position();
+    fault = XMLFault{code, std::move(description), where};
+  }
+
+  TextPosition position() const {
     const std::size_t line = XML_GetCurrentLineNumber(handle.get());
     const std::size_t column = XML_GetCurrentColumnNumber(handle.get());  // from 0
     // On its first line the library counts the mark, and nothing of what was skipped before it.
-    const TextPosition position =
-        line <= 1 ? TextPosition{origin.line, origin.column + std::max<std::size_t>(column, 1) - 1}
-                  : TextPosition{origin.line + line - 1, column + 1};
-    fault = XMLFault{code, std::move(description), position};
+    if (line > 1) return {origin.line + line - 1, column + 1};
+    return {origin.line, origin.column + std::max<std::size_t>(column, 1) - 1};
   }
 
   /// Ends the run with a fault that the library does not see.
@@ -241,8 +256,7 @@ bool XMLParser::parse(std::optional<XMLFault>& fault) {
     return true;
   }
   if (const XML_Error code = XML_GetErrorCode(run.handle.get()); !run.fault) {
-    run.fail(code, code == XML_ERROR_NO_MEMORY ? "a tag or text too long for the parser"
-                                               : XML_ErrorString(code));
+    run.fail(code, code == XML_ERROR_NO_MEMORY ? kTooLong : XML_ErrorString(code));
   }
   fault = std::move(run.fault);
   return false;
@@ -258,6 +272,10 @@ void XMLParser::refuseExpansion() {
 
 void XMLParser::abort(std::string description) {
   run_->refuse(XML_ERROR_ABORTED, std::move(description));
+}
+
+TextPosition XMLParser::position() const {
+  return run_->position();
 }
 
 }  // namespace platform

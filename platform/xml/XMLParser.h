@@ -102,6 +102,10 @@ class XMLParser {
   /// this fault, at the place of the event.
   void abort(std::string description);
 
+  /// Where the event stands that is being delivered: a tag where its "<" does. To be asked from
+  /// inside of an event only; each answer counts the lines since the one before.
+  TextPosition position() const;
+
   /// Counts, inside an event, what the receiver makes of the document by this function of a
   /// MemoryBudget, which gives false when there is too little left: that ends the parse as `abort`
   /// does. Documents that cannot grow are not counted, and the function is not called.

@@ -80,6 +80,38 @@ TEST_F(QELBundleDirectoryTest, NamesSavedTwiceAreReplaced) {
   EXPECT_EQ(contentOf(path("Posters/a.mp3")), "poster");
 }
 
+TEST_F(QELBundleDirectoryTest, ASecondRunNeedNotWait) {
+  open();
+  QELBundleDirectory second;
+  EXPECT_FALSE(second.open(path(), error_, Directory::Wait::kNot));
+  EXPECT_EQ(error_->description, "Another run is filling it");
+}
+
+TEST_F(QELBundleDirectoryTest, AReferenceFileIsRead) {
+  EXPECT_EQ(QELBundleDirectory::readReferenceFile(path(), error_), platform::Dictionary());
+  open();
+  EXPECT_EQ(QELBundleDirectory::readReferenceFile(path(), error_), platform::Dictionary());
+  EXPECT_TRUE(isWritten());
+  EXPECT_EQ(QELBundleDirectory::readReferenceFile(path(), error_),
+            (platform::Dictionary{{"PodcastName", "Show"}}));
+  EXPECT_EQ(error_, std::nullopt);
+  root_.addFile("bundle/Info.plist", "<plist><array/></plist>");
+  EXPECT_EQ(QELBundleDirectory::readReferenceFile(path(), error_), std::nullopt);
+  EXPECT_EQ(error_->description, "Info.plist: no dictionary at its root");
+}
+
+TEST_F(QELBundleDirectoryTest, FilesOfReferencesHaveSizes) {
+  open();
+  root_.addFile("bundle/one.mp3", "one");
+  root_.addFile("bundle/empty.mp3", "");
+  EXPECT_EQ(QELBundleDirectory::sizeOfFile(path(), "one.mp3"), 3U);
+  for (const platform::OptionalText& none :
+       {platform::OptionalText(), platform::OptionalText(""), platform::OptionalText("empty.mp3"),
+        platform::OptionalText("Posters"), platform::OptionalText("missing")}) {
+    EXPECT_EQ(QELBundleDirectory::sizeOfFile(path(), none), std::nullopt);
+  }
+}
+
 TEST_F(QELBundleDirectoryTest, WhatWasSavedIsNotReplacedUnderAnotherName) {
   open();
   EXPECT_TRUE(isMediaSaved("show.mp3", "first", "Show.mp3"));

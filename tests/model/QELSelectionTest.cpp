@@ -3,44 +3,48 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <memory>
 
 namespace {
 
 using std::chrono::seconds;
 
-QELEpisodeList episodesOf(const std::vector<std::optional<int>>& dates) {
-  QELEpisodeList episodes;
+std::unique_ptr<QELPodcastSource> sourceOf(const std::vector<std::optional<int>>& dates) {
+  auto episodes = std::make_shared<QELEpisodeList>();
   for (const auto& date : dates) {
-    episodes.push_back(QELEpisode::episode());
-    if (date) episodes.back()->setDate(platform::PointInTime(seconds(*date)));
+    episodes->push_back(QELEpisode::episode());
+    if (date) episodes->back()->setDate(platform::PointInTime(seconds(*date)));
   }
-  return episodes;
+  auto source = std::make_unique<QELPodcastSource>();
+  source->setEpisodes(std::move(episodes));
+  return source;
 }
 
 using Wanted = std::vector<bool>;
 
 TEST(QELSelectionTest, AllAreWantedAtFirst) {
-  EXPECT_EQ(QELSelection().of(episodesOf({3, std::nullopt, 1})), (Wanted{true, true, true}));
+  EXPECT_EQ(QELSelection().of(*sourceOf({3, std::nullopt, 1})), (Wanted{true, true, true}));
+  EXPECT_EQ(QELSelection().of(QELPodcastSource()), Wanted());
 }
 
 TEST(QELSelectionTest, TheLatestGoByDate) {
-  const QELEpisodeList episodes = episodesOf({1, std::nullopt, 3, 2, 2});
-  EXPECT_EQ((QELSelection{.latest = 1, .since = std::nullopt}).of(episodes),
+  const auto source = sourceOf({1, std::nullopt, 3, 2, 2});
+  EXPECT_EQ((QELSelection{.latest = 1, .since = std::nullopt}).of(*source),
             (Wanted{false, false, true, false, false}));
-  EXPECT_EQ((QELSelection{.latest = 2, .since = std::nullopt}).of(episodes),
+  EXPECT_EQ((QELSelection{.latest = 2, .since = std::nullopt}).of(*source),
             (Wanted{false, false, true, true, false}));
-  EXPECT_EQ((QELSelection{.latest = 4, .since = std::nullopt}).of(episodes),
+  EXPECT_EQ((QELSelection{.latest = 4, .since = std::nullopt}).of(*source),
             (Wanted{true, false, true, true, true}));
-  EXPECT_EQ((QELSelection{.latest = 9, .since = std::nullopt}).of(episodes),
+  EXPECT_EQ((QELSelection{.latest = 9, .since = std::nullopt}).of(*source),
             (Wanted{true, true, true, true, true}));
 }
 
 TEST(QELSelectionTest, SinceIsADateOrLater) {
-  const QELEpisodeList episodes = episodesOf({1, std::nullopt, 3, 2});
+  const auto source = sourceOf({1, std::nullopt, 3, 2});
   const platform::PointInTime date(seconds(2));
-  EXPECT_EQ((QELSelection{.latest = std::nullopt, .since = date}).of(episodes),
+  EXPECT_EQ((QELSelection{.latest = std::nullopt, .since = date}).of(*source),
             (Wanted{false, false, true, true}));
-  EXPECT_EQ((QELSelection{.latest = 1, .since = date}).of(episodes),
+  EXPECT_EQ((QELSelection{.latest = 1, .since = date}).of(*source),
             (Wanted{false, false, true, false}));
 }
 

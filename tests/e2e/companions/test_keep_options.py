@@ -48,7 +48,7 @@ class OptionsTest(KeepTestCase):
         (self.bundle / "Info.plist").write_bytes(b"<plist>")
         result = self.keep()
         self.assertEqual((result.status, result.stdout), (2, b""))
-        self.assertTrue(result.stderr.startswith(f"qel-keep: {self.bundle}/Info.plist: ".encode()), result.stderr)
+        self.assertTrue(result.stderr.startswith(f"qel-keep: {self.bundle}: Info.plist: ".encode()), result.stderr)
         self.assertEqual((self.bundle / "Info.plist").read_bytes(), b"<plist>")
 
     def test_a_file_is_no_bundle(self):

@@ -4,9 +4,12 @@ That time grows as the size does is for scripts/cost-table --check to say, since
 """
 
 import unittest
+import unittest.mock
 
-from cost import ALLOWANCE, FAMILIES, cost_of
-from support import ToolTestCase, is_sanitized, rss
+import cost
+from cost import ALLOWANCE, Family, Growth, faults, start_cost
+from cost_families import FAMILIES
+from support import ToolTestCase, is_sanitized
 
 MEGABYTE = 1_000_000
 
@@ -18,12 +21,42 @@ class CostTest(ToolTestCase):
             self.skipTest("a sanitizer takes memory and time of its own")
 
     def test_memory_stays_within_a_multiple_of_the_document(self):
-        least = cost_of("parsefeed", self.feed(rss())).memory
+        least = {is_served: start_cost(is_served).memory for is_served in (False, True)}
         for family in FAMILIES:
             with self.subTest(family.name):
                 size, (cost,) = family.costs(MEGABYTE)
                 self.assertRegex(cost.message, rf"\A(?s:{family.message})\Z")
-                self.assertLessEqual(cost.memory, least + ALLOWANCE + family.memory * size)
+                self.assertLessEqual(cost.memory, least[family.is_served] + ALLOWANCE + family.memory * size)
+
+
+class BoundsTest(unittest.TestCase):
+    """The bounds of scripts/cost-table, with costs made up."""
+    FAMILY = Family("some", lambda size: b"", memory=32)
+
+    def faults_of(self, exponent, memory=0, **changes):
+        growth = Growth(100, [2 ** (exponent * doubling) for doubling in range(4)], memory)
+        return list(faults(self.FAMILY._replace(**changes), growth, self.notes))
+
+    def setUp(self):
+        self.notes = []
+
+    def test_growth_of_the_power_of_one_and_a_quarter_is_a_fault(self):
+        self.assertEqual(self.faults_of(1), [])
+        self.assertEqual(self.faults_of(1.2), [])
+        self.assertEqual(self.faults_of(1.25), ["some: 13.5 times the time for 8 times the size"])
+
+    def test_instructions_tell_apart_what_outgrows_caches(self):
+        for work, found in ((8.2, 0), (10.1, 1), (None, 0)):
+            with self.subTest(work), unittest.mock.patch.object(cost, "work_of", lambda family, work=work: work):
+                self.notes.clear()
+                self.assertEqual(len(self.faults_of(1.5, outgrows_caches=True)), found)
+                note = (f"some: {work} times the instructions for 8 times the size" if work else
+                        'Skipped, since nothing counts instructions here: why "some" are so slow.')
+                self.assertEqual(self.notes, [note])
+
+    def test_memory_beyond_the_multiple_is_a_fault(self):
+        self.assertEqual(self.faults_of(1, ALLOWANCE + 3200), [])
+        self.assertEqual(self.faults_of(1, ALLOWANCE + 3201), ["some: 160032.0 bytes for each byte, of 32"])
 
 
 if __name__ == "__main__":

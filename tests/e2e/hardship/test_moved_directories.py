@@ -108,14 +108,16 @@ class AttributesTest(BundleTestCase):
     def test_permissions_and_times_are_kept(self):
         for mode in (0o600, 0o640, 0o444, 0o755):
             with self.subTest(oct(mode)):
-                shutil.rmtree(self.bundle, ignore_errors=True)
                 original = self.path("media") / "a.mp3"
                 self.media("a.mp3")
                 original.chmod(mode)
                 os.utime(original, ns=(1, 1234567890123456789))
-                self.assertWarns(self.create_episodes(str(original)))
-                status = (self.bundle / "a.mp3").stat()
-                self.assertEqual((stat.S_IMODE(status.st_mode), status.st_mtime_ns), (mode, 1234567890123456789))
+                for location in (str(original), original.as_uri()):
+                    shutil.rmtree(self.bundle, ignore_errors=True)
+                    self.assertWarns(self.create({"Episodes": [
+                        {"EpisodeReference": location, "EpisodeReferenceType": "remote" if ":" in location else "local"}]}))
+                    status = (self.bundle / "a.mp3").stat()
+                    self.assertEqual((stat.S_IMODE(status.st_mode), status.st_mtime_ns), (mode, 1234567890123456789))
                 original.unlink()
 
     def test_a_rewritten_reference_file_keeps_its_permissions(self):

@@ -43,8 +43,6 @@ def expected_files():
             expected[f"{DOCUMENTATION}docs/{file}"] = f"docs/{file}"
     for file in files_below(ROOT / "examples"):
         expected[f"{DOCUMENTATION}examples/{file}"] = f"examples/{file}"
-    if (ROOT / "scripts/check-reference-file").exists():
-        expected[f"{DOCUMENTATION}scripts/check-reference-file"] = "scripts/check-reference-file"
     return expected
 
 

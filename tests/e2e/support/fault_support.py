@@ -74,16 +74,16 @@ def require_faults(allocations=False):
 
 
 class FaultServer:
-    """Runs the tool with the same arguments in the same directory, again and again."""
+    """Runs the tool, or a companion, with the same arguments in the same directory, again and again."""
 
-    def __init__(self, arguments, directory, env=None):
+    def __init__(self, arguments, directory, env=None, program="qel"):
         self._scratch = Path(tempfile.mkdtemp(prefix="qel-faults-"))
         request_end, self._requests = os.pipe()
         self._answers, answer_end = os.pipe()
         # The sanitizer's search for leaks traces the run, which the trap for its calls would end.
         sanitizer = f"exitcode={SANITIZER_STATUS}:verify_asan_link_order=0:detect_leaks=0"
         self._process = subprocess.Popen(
-            [tool(), *arguments], cwd=directory, pass_fds=(request_end, answer_end),
+            [tool(program), *arguments], cwd=directory, pass_fds=(request_end, answer_end),
             env=environment({"LD_PRELOAD": os.environ["QEL_FAULTS"],
                              "QEL_FAULT_SERVER": f"{request_end},{answer_end}",
                              "ASAN_OPTIONS": sanitizer, **counting_from_start(), **(env or {})}))
@@ -219,9 +219,9 @@ class FaultTestCase(BundleTestCase):
         self.bundle = self.root / "sub" / "show.podcast"
         self.before = {}
 
-    def serve_runs(self, *arguments, env=None):
+    def serve_runs(self, *arguments, env=None, program="qel"):
         """A server of runs; what is in the root directory now is what each run finds."""
-        server = FaultServer(arguments, self.root, env)
+        server = FaultServer(arguments, self.root, env, program)
         self.addCleanup(server.stop)
         self.before = contents(self.root)
         return server

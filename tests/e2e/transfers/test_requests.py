@@ -7,6 +7,7 @@ several requests of a whole run.
 import gzip
 import os
 import unittest
+from base64 import b64encode
 
 from bundle_support import BundleTestCase
 from support import rss
@@ -97,6 +98,21 @@ class FeedTest(RequestTestCase):
         packed = gzip.compress(FEED)
         chunks = [packed[start:start + 5] for start in range(0, len(packed), 5)]
         self.assertFetches(self.web.chunked("/packed", chunks, headers=[("Content-Encoding", "gzip")]))
+
+
+    def test_a_password_in_the_url_is_sent_to_its_host_alone(self):
+        other = self.server()
+        moved = other.serve("/feed.xml", FEED)
+
+        def answer(exchange):
+            if exchange.request.headers.get("authorization") != "Basic " + b64encode(b"mara:p@ss").decode():
+                exchange.reply(401, b"", [("WWW-Authenticate", "Basic realm=x")])
+            else:
+                exchange.reply(302, b"", [("Location", moved)])
+        private = self.web.route("/private.xml", answer)
+        self.assertFetches(private.replace("http://", "http://mara:p%40ss@"))
+        self.assertNotIn("authorization", other.requests[-1].headers)
+        self.assertLoadFails(self.run_tool("parsefeed", private, env=self.env), "HTTP status 401")
 
 
 class MediaTest(RequestTestCase):

@@ -271,7 +271,8 @@ TEST_F(TemporaryFileTest, EndingSignalsRemoveTheFilesAndTellThemselves) {
   for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
     SCOPED_TRACE(signal);
     const int status = statusOfChild([&] {
-      ::signal(signal, SIG_DFL);
+      if (const auto before = ::signal(signal, SIG_DFL); before != SIG_IGN)
+        ::signal(signal, before);
       TemporaryFile second;
       TemporaryFile committed;
       return createWith("x", directory_ / "a") && second.create(directory_ / "b", error_) &&

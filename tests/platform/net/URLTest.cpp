@@ -270,6 +270,21 @@ TEST(URLTest, FileURLTextReadsBackAsThePath) {
   EXPECT_EQ(url->path(), everyByte);
 }
 
+TEST(URLTest, LongHostsOfOtherScriptsAreRefusedUnseen) {
+  // What ICU puts in order at the cost of its square; each would take minutes.
+  for (const char* part : {"\u0301\u0316", "\u1100\u1161\u11A8", "\u00AD", "\u00E9.", "\u00E9"}) {
+    std::string host = "a";
+    while (host.size() < 1'000'000) host += part;
+    EXPECT_FALSE(URL::parse("http://" + host + ".example/a.mp3")) << part;
+    EXPECT_FALSE(URL::parse("file://" + host + "/a.mp3")) << part;
+  }
+  // A long one that is short in the end.
+  std::string syllables;
+  for (int syllable = 0; syllable < 15; ++syllable) syllables += "\u1100\u1161\u11A8";
+  EXPECT_EQ(URL::parse("http://" + syllables + "." + syllables + ".example/")->encodedText(),
+            "http://xn--p39aaaaaaaaaaaaaaa.xn--p39aaaaaaaaaaaaaaa.example/");
+}
+
 }  // namespace
 TEST(URLTest, PathsArePercentEncoded) {
   EXPECT_EQ(percentEncodedPath("a b/c?d#e%20[f]"), "a%20b/c%3Fd%23e%2520%5Bf%5D");

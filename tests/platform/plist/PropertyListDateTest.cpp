@@ -64,6 +64,22 @@ TEST(PropertyListDateTest, SmallerUnitsMayBeMissing) {
   EXPECT_EQ(dateFromPropertyListText("2005Z"), at(1104537600));
 }
 
+TEST(PropertyListDateTest, LeapSecondsBelongToTheNextMinute) {
+  EXPECT_EQ(dateFromPropertyListText("2016-12-31T23:59:60Z"), at(1483228800));
+  EXPECT_EQ(dateFromPropertyListText("2005-05-16T12:30:60Z"), at(1116246660));
+  EXPECT_EQ(dateFromPropertyListText("2016-12-31T23:59:60.25Z"), at(1483228800) + 250ms);
+}
+
+TEST(PropertyListDateTest, FractionsAreReadToTheMillisecond) {
+  EXPECT_EQ(dateFromPropertyListText("1970-01-01T00:00:01.5Z"), at(1) + 500ms);
+  EXPECT_EQ(dateFromPropertyListText("1970-01-01T00:00:01,25Z"), at(1) + 250ms);
+  EXPECT_EQ(dateFromPropertyListText("1970-01-01T00:00:01.123Z"), at(1) + 123ms);
+  EXPECT_EQ(dateFromPropertyListText("1970-01-01T00:00:01.9999999999999999999999Z"), at(1) + 999ms);
+  EXPECT_EQ(dateFromPropertyListText("1969-12-31T23:59:59.75Z"), at(0) - 250ms);
+  EXPECT_EQ(dateFromPropertyListText("292278994-08-17T07:12:55.9Z"), PointInTime::max());
+  EXPECT_EQ(dateFromPropertyListText("-292275055-05-16T16:47:04.9Z"), PointInTime::min());
+}
+
 TEST(PropertyListDateTest, RefusesWhatIsNoDate) {
   for (const char* text : {"",
                            "Z",
@@ -75,11 +91,18 @@ TEST(PropertyListDateTest, RefusesWhatIsNoDate) {
                            "2005-01-00T00:00:00Z",
                            "2005-01-01T24:00:00Z",
                            "2005-01-01T00:60:00Z",
-                           "2005-01-01T00:00:60Z",
+                           "2005-01-01T00:00:61Z",
+                           "2005-01-01T00:60:60Z",
                            "2005-01-01T00:00:00",
                            "2005-01-01T00:00:00z",
                            "2005-01-01 00:00:00Z",
-                           "2005-01-01T00:00:00.5Z",
+                           "2005-01-01T00:00:00.Z",
+                           "2005-01-01T00:00:00.5",
+                           "2005-01-01T00:00:00.-5Z",
+                           "2005-01-01T00:00:00.5.5Z",
+                           "2005-01-01T00:00.5Z",
+                           "2005-01-01T00.5Z",
+                           "2005.5Z",
                            "2005-01-01T00:00:00+00:00",
                            "2005-01-01T00:00:00ZZ",
                            "2005-1-1T0:0:0Z",

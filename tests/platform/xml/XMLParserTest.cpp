@@ -3,11 +3,13 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstddef>
 #include <filesystem>
 #include <fstream>
 #include <functional>
 #include <optional>
+#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -325,18 +327,31 @@ TEST(XMLParserTest, ADocumentThatCannotBeReadIsAFaultWithThatCause) {
     std::optional<XMLFault> fault;
     EXPECT_FALSE(XMLParser(sourceOf(std::string(document), 100, true), recorder).parse(fault));
     EXPECT_EQ(fault->record(), (ErrorRecord{"test", 1, "no more"})) << document;
-    EXPECT_FALSE(fault->description.empty()) << document;
+    EXPECT_EQ(fault->description, "no more") << document;
   }
 }
 
+constexpr const char* kTooLong = "a tag or text too long for the parser at line ";
 TEST(XMLParserTest, WhatTheLibraryCannotHoldIsAFault) {
-  // More than its buffer takes; it need not come.
-  constexpr std::size_t kTooMuch = 2'147'000'000;
-  XMLEventRecorder recorder;
+  constexpr std::size_t kTooMuch = 2'147'000'000;  // for its buffer; it need not come
   std::optional<XMLFault> fault;
+  XMLEventRecorder recorder;
   EXPECT_FALSE(XMLParser(sourceOf("<r/>", kTooMuch, false), recorder, kTooMuch + 1).parse(fault));
-  EXPECT_EQ(fault->record().description,
-            "a tag or text too long for the parser at line 1, column 1");
+  EXPECT_EQ(fault->record().description, kTooLong + std::string("1, column 1"));
+}
+
+TEST(XMLParserTest, ATagThatNeverEndsIsNotReadOn) {
+  std::size_t size = 0;
+  const auto read = [&size](std::span<char> room, ErrorSlot&) {
+    std::fill(room.begin(), room.end(), 'x');
+    if (size == 0) std::string_view("<r>\n<a b='").copy(room.data(), room.size());
+    return size += room.size(), std::optional(room.size());
+  };
+  std::optional<XMLFault> fault;
+  XMLEventRecorder recorder;
+  XMLParser(ByteSource(1000, read), recorder, 100).parse(fault);
+  EXPECT_EQ(fault->record().description, kTooLong + std::string("2, column 1"));
+  EXPECT_LE(size, std::size_t{200} << 20U);
 }
 
 TEST(XMLParserTest, AbortEndsTheParseAtThePlaceOfTheEvent) {

@@ -1,0 +1,21 @@
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "cli/common/QELDirectory.h"
+#include "model/QELPodcastSource.h"
+#include "platform/text/ErrorRecord.h"
+
+/// Whether a source, as a user names it, lies on the network, and so was written by strangers.
+bool QELIsOnNetwork(const std::string& source);
+
+/// The name of a source by which it is found from any working directory.
+std::string QELLastingSource(const std::string& source);
+
+/// The source that the name stands for, loaded, with the elements of the podcast directory read
+/// under that one's prefix. Unlike those of a bundle source as such, posters of a bundle's episodes
+/// have paths that lead to them. Null, and the slot filled, when it cannot be loaded.
+std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
+                                                  const QELDirectory& directory,
+                                                  platform::ErrorSlot& error);

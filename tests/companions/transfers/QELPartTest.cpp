@@ -1,0 +1,98 @@
+#include "companions/transfers/QELPart.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <optional>
+#include <string>
+
+#include "tests/support/TemporaryDirectory.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+class QELPartTest : public testing::Test {
+ protected:
+  void SetUp() override {
+    platform::ErrorSlot error;
+    directory_ = *platform::Directory::open(path_, error);
+  }
+  QELPart part(const std::string& url) const { return {directory_, path_, url}; }
+  void write(const std::string& name, const std::string& content) { root_.addFile(name, content); }
+
+  TemporaryDirectory root_;
+  std::string path_ = root_.path();
+  platform::Directory directory_;
+};
+
+TEST_F(QELPartTest, ANoteVouchesForAPart) {
+  const QELPart one = part("https://a.example/1.mp3");
+  EXPECT_EQ(one.name(), ".qel-keep-c928878f7227f43d.part");
+  one.note("\"tag\"", "1.mp3", std::nullopt);
+  EXPECT_EQ(one.validator(), "");  // no part
+  write(one.name(), "");
+  EXPECT_EQ(one.validator(), "");
+  write(one.name(), "half");
+  EXPECT_EQ(one.validator(), "\"tag\"");
+  one.removeNote();
+  EXPECT_EQ(one.validator(), "");
+  EXPECT_TRUE(fs::exists(root_ / one.name()));
+}
+
+TEST_F(QELPartTest, ANoteOfAnotherURLOrAnotherStartVouchesForNothing) {
+  const QELPart one = part("https://a.example/1.mp3");
+  write(one.name(), "half");
+  one.note("\"tag\"", "1.mp3", 5);
+  const std::string note = ".qel-keep-c928878f7227f43d.note";
+  std::string content = contentOf(root_ / note);
+  write(note, std::string("x").append(content));
+  EXPECT_EQ(one.validator(), "");
+  write(note, content);
+  EXPECT_EQ(one.validator(), "\"tag\"");
+  write(note, content + "\nHost: b.example");
+  EXPECT_EQ(one.validator(), "");
+  std::string steering = content;
+  write(note, steering.insert(steering.find("\"tag"), "\r"));
+  EXPECT_EQ(one.validator(), "");
+  content.replace(content.find("/1.mp3"), 6, "/2.mp3");
+  write(note, content);
+  EXPECT_EQ(one.validator(), "");
+}
+
+TEST_F(QELPartTest, AWholeFileIsFoundAgain) {
+  const QELPart one = part("https://a.example/1.mp3");
+  one.note("", "1.mp3", 5);
+  EXPECT_EQ(one.finishedName(), std::nullopt);
+  write("1.mp3", "whole");
+  EXPECT_EQ(one.finishedName(), "1.mp3");
+  EXPECT_EQ(one.validator(), "");
+  write("1.mp3", "another");
+  EXPECT_EQ(one.finishedName(), std::nullopt);
+  one.note("", "1.mp3", std::nullopt);
+  EXPECT_EQ(one.finishedName(), "1.mp3");
+  write(one.name(), "");
+  EXPECT_EQ(one.finishedName(), std::nullopt);  // it is not the part's file
+  one.remove();
+  EXPECT_EQ(one.finishedName(), std::nullopt);
+}
+
+TEST_F(QELPartTest, PartsAreRemovedWithTheirNotes) {
+  const QELPart one = part("https://a.example/1.mp3");
+  const QELPart two = part("https://a.example/2.mp3");
+  for (const QELPart& each : {one, two}) {
+    write(each.name(), "half");
+    each.note("\"tag\"", "1.mp3", 5);
+  }
+  write(".qel-0123456789abcdef.part", "not ours");
+  write("one.mp3", "whole");
+  one.remove();
+  EXPECT_EQ(one.validator(), "");
+  EXPECT_EQ(two.validator(), "\"tag\"");
+  QELPart::removeAll(directory_, path_);
+  std::size_t count = 0;
+  for (const auto& entry : fs::directory_iterator(path_)) count += entry.is_regular_file() ? 1 : 0;
+  EXPECT_EQ(count, 2U);
+}
+
+}  // namespace

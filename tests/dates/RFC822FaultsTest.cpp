@@ -1,0 +1,43 @@
+#include "dates/RFC822Faults.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+TEST(RFC822FaultsTest, ADateInEnglishWithAKnownZoneHasNone) {
+  for (const std::string_view text :
+       {"Sat, 04 Apr 2026 04:30:00 GMT", "4 Apr 26 04:30 +0200", "31 DECEMBER 2026 23:59:60 -05:30",
+        "1 Jan 0 0:0 z", "Foo, 04 may 2026 04:30 pdt"}) {
+    EXPECT_EQ(RFC822Fault(text), "") << text;
+  }
+}
+
+TEST(RFC822FaultsTest, TellsTheFirstFault) {
+  struct Row {
+    std::string_view text;
+    std::string_view fault;
+  };
+  for (const Row& row : {
+           Row{"", "it has not all of its parts"},
+           Row{"Sat, 04 Apr 2026 04:30:00", "the day is none"},
+           Row{"a Sat, 04 Apr 2026 04:30:00 GMT", "it has not all of its parts"},
+           Row{"0 Apr 2026 04:30 GMT", "the day is none"},
+           Row{"32 Apr 2026 04:30 GMT", "the day is none"},
+           Row{"+4 Apr 2026 04:30 GMT", "the day is none"},
+           Row{"4 Avr 2026 04:30 GMT", "the month is not known"},
+           Row{"4 Ja 2026 04:30 GMT", "the month is not known"},
+           Row{"4 anf 2026 04:30 GMT", "the month is not known"},
+           Row{"4 Apr 2026a 04:30 GMT", "the year is none"},
+           Row{"4 Apr 2026 24:30 GMT", "the time is none"},
+           Row{"4 Apr 2026 04:60 GMT", "the time is none"},
+           Row{"4 Apr 2026 04:30:61 GMT", "the time is none"},
+           Row{"4 Apr 2026 0430 GMT", "the time is none"},
+           Row{"4 Apr 2026 04:30 UTC", "the time zone is not known"},
+           Row{"4 Apr 2026 04:30 +020", "the time zone is not known"},
+           Row{"4 Apr 2026 04:30 j", "the time zone is not known"},
+       }) {
+    EXPECT_EQ(RFC822Fault(row.text), row.fault) << row.text;
+  }
+}
+
+}  // namespace
