@@ -51,7 +51,7 @@ class Site:
 
     @property
     def name(self):
-        return f"{self.path}:{self.line}:{self.start}:{self.kind}"
+        return f"{self.path}:{self.start}:{self.end}:{self.kind}"
 
 
 class _Source:
@@ -184,7 +184,7 @@ class _Finder:
         else:
             return
         start, end, _ = between[0]
-        after = f"{self.source.text(span[0], start)} {changed} {self.source.text(end, span[1])}"
+        after = f"({self.source.text(span[0], start)}) {changed} ({self.source.text(end, span[1])})"
         self.add(span, context, name, self.source.text(*span), after)
 
     def look_at_statement(self, cursor, span, context):
@@ -256,7 +256,8 @@ def sites_of(root, path, arguments):
     finder = _Finder(root, path, arguments)
     for cursor in finder.source.cursor.get_children():
         finder.walk(cursor, ("", False))
+    # To turn == into != is to negate it.
     negated = {span for (span, kind), site in finder.found.items() if kind == "comparison" and
-               site.after.replace("!=", "==") == site.before.replace("!=", "==")}
+               (") == (" in site.after or ") != (" in site.after)}
     return sorted((site for (span, kind), site in finder.found.items() if kind != "condition" or span not in negated),
                   key=lambda site: (site.start, -site.end, site.kind))

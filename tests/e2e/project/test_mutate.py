@@ -93,6 +93,17 @@ class MutateTest(ToolTestCase):
                                          check=True, capture_output=True, text=True).stdout
                 self.assertEqual(printed, expected)
 
+    def test_operators_in_a_row_are_told_apart(self):
+        self.write("source.cpp", "bool f(bool a, bool b, bool c) { return a || b || c; }")
+        sites = sites_of(self.directory, "source.cpp", [])
+        self.assertEqual([site.after for site in sites], ["(a || b) && (c)", "(a) && (b)"])
+        self.assertEqual(len({site.name for site in sites}), 2)
+
+    def test_an_equality_is_not_negated_twice(self):
+        self.write("source.cpp", "bool f(int a) { if (a == 1) return !a; return false; }")
+        sites = sites_of(self.directory, "source.cpp", [])
+        self.assertEqual([site.after for site in sites], ["(a) != (1)", "1 + 1", "true"])
+
     def test_a_negative_number_comes_nearer_to_zero(self):
         self.write("source.cpp", "int f(int a) { int b = -1; b = a ? -2 : a -3; return (-4) + (a) -5 + a[&b] -6; }")
         sites = sites_of(self.directory, "source.cpp", [])
