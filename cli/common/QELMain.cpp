@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <cstddef>
 
-#include "platform/files/Process.h"
 #include "platform/files/StandardStreams.h"
+#include "platform/process/Process.h"
 
 int QELMain(int argumentCount, char** arguments, int (*run)(std::span<const char* const>)) {
   platform::prepareProcess();

@@ -6,9 +6,9 @@
 #include <system_error>
 #include <utility>
 
-#include "platform/files/CommandOptions.h"
 #include "platform/files/StandardStreams.h"
 #include "platform/net/URL.h"
+#include "platform/process/CommandOptions.h"
 #include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"

@@ -4,7 +4,7 @@
 #include <array>
 #include <utility>
 
-#include "platform/files/Terminal.h"
+#include "platform/process/Terminal.h"
 #include "platform/text/FormattedText.h"
 
 namespace {

@@ -4,9 +4,9 @@
 #include <utility>
 #include <vector>
 
-#include "platform/files/EndingSignals.h"
 #include "platform/files/StandardStreams.h"
-#include "platform/files/Terminal.h"
+#include "platform/process/EndingSignals.h"
+#include "platform/process/Terminal.h"
 #include "platform/text/FormattedText.h"
 
 namespace {

@@ -238,7 +238,7 @@ class ManualPageTest(unittest.TestCase):
     def messages(self):
         """The messages of the sources, as patterns; what others say may stand before one."""
         found = set()
-        for folder in ("cli", "model", "sources", "generators", "platform/files"):
+        for folder in ("cli", "model", "sources", "generators", "platform/files", "platform/process"):
             for source in (ROOT / folder).glob("*.[ch]*"):
                 for maker in self.MAKER.findall(source.read_text(encoding="utf-8")):
                     found |= set(self.MESSAGE.findall(maker))

@@ -1,4 +1,4 @@
-#include "platform/files/Process.h"
+#include "platform/process/Process.h"
 
 #include <fcntl.h>
 #include <malloc.h>

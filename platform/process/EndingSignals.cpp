@@ -1,4 +1,4 @@
-#include "platform/files/EndingSignals.h"
+#include "platform/process/EndingSignals.h"
 
 #include <array>
 #include <csignal>

@@ -1,4 +1,4 @@
-#include "platform/files/CommandOptions.h"
+#include "platform/process/CommandOptions.h"
 
 #include <gtest/gtest.h>
 

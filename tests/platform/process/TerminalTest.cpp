@@ -1,4 +1,4 @@
-#include "platform/files/Terminal.h"
+#include "platform/process/Terminal.h"
 
 #include <gtest/gtest.h>
 
