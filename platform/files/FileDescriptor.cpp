@@ -10,7 +10,7 @@
 namespace platform {
 namespace {
 
-constexpr std::uint64_t kChunkSize = std::uint64_t{64} << 10U;
+constexpr std::size_t kChunkSize = std::size_t{64} << 10U;
 
 /// Whether a call that failed can be made again: it was interrupted, or has to wait, which is done
 /// here. A standard stream is non-blocking where another process that shares it made it so.
@@ -75,16 +75,15 @@ std::ptrdiff_t readSome(int descriptor, char* buffer, std::size_t capacity) {
   return count;
 }
 
-bool readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit,
-               std::string& bytes) {
+bool readToEnd(int descriptor, std::size_t expectedSize, std::size_t limit, std::string& bytes) {
   // The byte beyond the expected size lets the end be seen without growing; the one beyond the
   // limit tells a longer input from one that just fits.
   bytes.resize(std::min(std::max(expectedSize, kChunkSize - 1), limit) + 1);
-  std::uint64_t length = 0;
+  std::size_t length = 0;
   std::ptrdiff_t count = 0;
   while (length <= limit &&
          (count = readSome(descriptor, bytes.data() + length, bytes.size() - length)) > 0) {
-    length += static_cast<std::uint64_t>(count);
+    length += static_cast<std::size_t>(count);
     if (length == bytes.size()) bytes.resize(std::min(length * 2, limit + 1));
   }
   if (length > limit) {

@@ -56,6 +56,6 @@ std::ptrdiff_t readSome(int descriptor, char* buffer, std::size_t capacity);
 
 /// Reads all that is left of the input, of which `expectedSize` is a guess. More than `limit` bytes
 /// are a failure (EFBIG). After a failure `bytes` holds what was read before it, at most `limit`.
-bool readToEnd(int descriptor, std::uint64_t expectedSize, std::uint64_t limit, std::string& bytes);
+bool readToEnd(int descriptor, std::size_t expectedSize, std::size_t limit, std::string& bytes);
 
 }  // namespace platform

@@ -76,16 +76,17 @@ std::optional<ByteSource> openWholeFile(const std::string& path, ErrorSlot& erro
   }
   // The whole is read once and then kept by us: it need not stay in the system's cache as well.
   ::posix_fadvise(file->descriptor(), 0, 0, POSIX_FADV_NOREUSE);
-  return ByteSource(file->size(), [file, tooLarge, size = std::uint64_t{0}](
-                                      std::span<char> room, ErrorSlot& failure) mutable {
-    std::optional<std::size_t> count = file->read(room, failure);
-    size += count.value_or(0);
-    if (size > kWholeReadLimit) {
-      failure = tooLarge();
-      count.reset();
-    }
-    return count;
-  });
+  return ByteSource(
+      static_cast<std::size_t>(file->size()),
+      [file, tooLarge, size = std::uint64_t{0}](std::span<char> room, ErrorSlot& failure) mutable {
+        std::optional<std::size_t> count = file->read(room, failure);
+        size += count.value_or(0);
+        if (size > kWholeReadLimit) {
+          failure = tooLarge();
+          count.reset();
+        }
+        return count;
+      });
 }
 
 std::optional<std::vector<std::string>> filesBelow(const std::string& directory, ErrorSlot& error) {

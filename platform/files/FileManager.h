@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -12,7 +13,7 @@
 namespace platform {
 
 /// The largest document that is read into memory: 2 GiB.
-inline constexpr std::uint64_t kWholeReadLimit = std::uint64_t{2} << 30U;
+inline constexpr std::size_t kWholeReadLimit = std::size_t{2} << 30U;
 
 /// Whether anything (file, directory, ...) exists at the path, symbolic links followed.
 bool fileExists(const std::string& path);

@@ -1,10 +1,12 @@
 #include "platform/plist/BinaryPropertyListReader.h"
 
+#include <algorithm>
 #include <bit>
 #include <chrono>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <limits>
 #include <string>
 #include <utility>
 #include <vector>
@@ -49,13 +51,13 @@ enum class Kind : unsigned {
 
 struct Object {
   Kind kind;
-  std::uint64_t size;   // the low half of the marker, or the count that stands behind it
+  std::size_t size;     // the low half of the marker, or the count that stands behind it
   std::size_t content;  // the offset of the first byte behind marker and count
 };
 
 /// An array or dictionary whose parts are being read.
 struct Level {
-  std::uint64_t number;
+  std::size_t number;
   bool isDictionary;
   std::size_t references;  // the offset of the first reference
   std::size_t count;       // of elements or entries
@@ -82,11 +84,11 @@ class Reader {
     if (bytes_.size() < kHeader.size() + kTrailerSize) return fail("a cut binary property list");
 
     const std::size_t tableEnd = bytes_.size() - kTrailerSize;
-    offsetWidth_ = unsignedAt(tableEnd + 6, 1);
-    referenceWidth_ = unsignedAt(tableEnd + 7, 1);
-    objectCount_ = unsignedAt(tableEnd + 8, 8);
-    const std::uint64_t root = unsignedAt(tableEnd + 16, 8);
-    const std::uint64_t tableOffset = unsignedAt(tableEnd + 24, 8);
+    offsetWidth_ = sizeAt(tableEnd + 6, 1);
+    referenceWidth_ = sizeAt(tableEnd + 7, 1);
+    objectCount_ = sizeAt(tableEnd + 8, 8);
+    const std::size_t root = sizeAt(tableEnd + 16, 8);
+    const std::size_t tableOffset = sizeAt(tableEnd + 24, 8);
 
     const auto isWidth = [](std::size_t width) { return width >= 1 && width <= kWidestInteger; };
     if (!isWidth(offsetWidth_) || !isWidth(referenceWidth_) || tableOffset < kHeader.size() ||
@@ -113,14 +115,14 @@ class Reader {
     }
     std::size_t reference = level.references + level.next * referenceWidth_;
     if (level.isDictionary) {
-      if (!readKey(unsignedAt(reference, referenceWidth_))) return false;
+      if (!readKey(sizeAt(reference, referenceWidth_))) return false;
       reference += level.count * referenceWidth_;  // the values stand behind all the keys
     }
     ++level.next;
-    return readObject(unsignedAt(reference, referenceWidth_));
+    return readObject(sizeAt(reference, referenceWidth_));
   }
 
-  bool readKey(std::uint64_t number) {
+  bool readKey(std::size_t number) {
     const auto object = objectAt(number);
     if (!object) return false;
     const auto key = text(number, *object);
@@ -131,7 +133,7 @@ class Reader {
     return true;
   }
 
-  bool readObject(std::uint64_t number) {
+  bool readObject(std::size_t number) {
     const auto object = objectAt(number);
     if (!object) return false;
     switch (object->kind) {
@@ -149,7 +151,7 @@ class Reader {
     return true;
   }
 
-  bool openContainer(std::uint64_t number, const Object& object) {
+  bool openContainer(std::size_t number, const Object& object) {
     const bool isDictionary = object.kind == Kind::kDictionary;
     if (isOpen_[number]) return fail("an array or dictionary that contains itself", number);
     if (levels_.size() >= kPropertyListDepthLimit) return fail(kPropertyListTooDeep, number);
@@ -173,38 +175,38 @@ class Reader {
     return true;
   }
 
-  std::optional<Object> objectAt(std::uint64_t number) {
+  std::optional<Object> objectAt(std::size_t number) {
     if (number >= objectCount_) {
       fail("an object that does not exist", number);
       return std::nullopt;
     }
-    const std::uint64_t offset = unsignedAt(tableOffset_ + number * offsetWidth_, offsetWidth_);
+    const std::size_t offset = sizeAt(tableOffset_ + number * offsetWidth_, offsetWidth_);
     if (offset < kHeader.size() || offset >= tableOffset_) {
       fail("an object that lies outside of the objects", number);
       return std::nullopt;
     }
-    const std::uint64_t marker = unsignedAt(offset, 1);
+    const std::size_t marker = sizeAt(offset, 1);
     Object object{
         .kind = static_cast<Kind>(marker >> 4), .size = marker & 0xF, .content = offset + 1};
 
     const bool isCounted = object.kind >= Kind::kData;
     if (isCounted && object.size == 0xF) {
       const Object count{.kind = Kind::kInteger, .size = 0, .content = object.content + 1};
-      const std::uint64_t countMarker = holds(object, 1, 1) ? unsignedAt(object.content, 1) : 0;
+      const std::size_t countMarker = holds(object, 1, 1) ? sizeAt(object.content, 1) : 0;
       const std::size_t width = std::size_t{1} << (countMarker & 0x3);
       // Counts of 1, 2, 4 and 8 bytes: markers 0x10 to 0x13.
       if (countMarker >> 2 != 0x10 >> 2 || !holds(count, 1, width)) {
         fail("an object with a malformed count", number);
         return std::nullopt;
       }
-      object.size = unsignedAt(count.content, width);
+      object.size = sizeAt(count.content, width);
       object.content = count.content + width;
     }
     return object;
   }
 
   /// Absent for an object that is cut or not of a kind that a property list has.
-  std::optional<PropertyListValue> scalar(std::uint64_t number, const Object& object) {
+  std::optional<PropertyListValue> scalar(std::size_t number, const Object& object) {
     switch (object.kind) {
       case Kind::kSimple:
         if (object.size == 0x8) return PropertyListValue(false);
@@ -270,7 +272,7 @@ class Reader {
         PropertyListValue::Data{std::string(bytes_.substr(object.content, object.size))});
   }
 
-  std::optional<Text> text(std::uint64_t number, const Object& object) {
+  std::optional<Text> text(std::size_t number, const Object& object) {
     const bool isUTF16 = object.kind == Kind::kTextUTF16;
     if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8) {
       return std::nullopt;
@@ -301,9 +303,16 @@ class Reader {
   }
 
   /// Whether that many items of that width lie between the object's content and the objects' end.
-  bool holds(const Object& object, std::uint64_t count, std::size_t width) const {
+  bool holds(const Object& object, std::size_t count, std::size_t width) const {
     // The content never begins beyond the end of the objects, so the difference cannot wrap.
     return count <= (tableOffset_ - object.content) / width;
+  }
+
+  /// A count or an offset. One that no memory could hold is the largest there is, which lies beyond
+  /// every bound.
+  std::size_t sizeAt(std::size_t offset, std::size_t width) const {
+    return static_cast<std::size_t>(std::min<std::uint64_t>(
+        unsignedAt(offset, width), std::numeric_limits<std::size_t>::max()));
   }
 
   std::uint64_t unsignedAt(std::size_t offset, std::size_t width) const {
@@ -330,7 +339,7 @@ class Reader {
   std::size_t tableOffset_ = 0;  // where the objects end
   std::size_t offsetWidth_ = 0;
   std::size_t referenceWidth_ = 0;
-  std::uint64_t objectCount_ = 0;
+  std::size_t objectCount_ = 0;
 
   PropertyListBuilder builder_;
   std::vector<Level> levels_;

@@ -25,10 +25,10 @@ class ByteSource {
   ByteSource(std::string bytes, std::optional<std::uint64_t> compressedSize = std::nullopt)
       : expectedSize_(bytes.size()), compressedSize_(compressedSize), held_(std::move(bytes)) {}
   /// The size is what may be expected, and need not be true.
-  ByteSource(std::uint64_t expectedSize, Read read)
+  ByteSource(std::size_t expectedSize, Read read)
       : expectedSize_(expectedSize), read_(std::move(read)) {}
 
-  std::uint64_t expectedSize() const { return expectedSize_; }
+  std::size_t expectedSize() const { return expectedSize_; }
   /// Absent for bytes that were not compressed.
   std::optional<std::uint64_t> compressedSize() const { return compressedSize_; }
 
@@ -50,7 +50,7 @@ class ByteSource {
   std::optional<std::string> readAll(ErrorSlot& error);
 
  private:
-  std::uint64_t expectedSize_;
+  std::size_t expectedSize_;
   std::string encodingHint_;
   std::optional<std::uint64_t> compressedSize_;
   std::string held_;      // of the bytes to be read, the first ones

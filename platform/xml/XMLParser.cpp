@@ -36,7 +36,7 @@ constexpr const char* kTooLong = "a tag or text too long for the parser";
 
 /// At least so many bytes are read first, so that marks and white space to skip lie in the first
 /// piece also where a document is larger than expected.
-constexpr std::uint64_t kSmallestSize = std::uint64_t{64} << 10;
+constexpr std::size_t kSmallestSize = std::size_t{64} << 10;
 
 /// The library's own limit, for one attribute made of many references: it is counted only when it
 /// is there, and stands in memory four times by then.
@@ -118,7 +118,7 @@ struct XMLParser::Run {
     // A mark in front keeps the library from guessing at UTF-16.
     XML_Parse(handle.get(), kUTF8Mark.data(), static_cast<int>(kUTF8Mark.size()), XML_FALSE);
     std::uint64_t fed = kUTF8Mark.size();
-    const std::uint64_t expected = std::max(owner.document_.expectedSize(), kSmallestSize);
+    const std::size_t expected = std::max(owner.document_.expectedSize(), kSmallestSize);
     // The byte beyond what is expected lets the end be seen.
     std::size_t size = expected < owner.largestWholeSize_ ? expected + 1 : kPieceSize;
     for (bool isFirst = true;; isFirst = false) {
@@ -246,10 +246,10 @@ struct XMLParser::Run {
 };
 
 bool XMLParser::parse(std::optional<XMLFault>& fault) {
-  const std::uint64_t receivedSize = document_.expectedSize();
+  const std::size_t receivedSize = document_.expectedSize();
   if (!makeUTF8(document_, fault)) return false;
   Run run(*this);
-  const std::uint64_t size = document_.expectedSize();
+  const std::size_t size = document_.expectedSize();
   if (!run.budget.takeConversion(size - std::min(size, receivedSize))) {
     run.refuseExpansion();
   } else if (run.feed()) {

@@ -53,7 +53,7 @@ TEST_F(QELPartTest, ANoteOfAnotherURLOrAnotherStartVouchesForNothing) {
   write(note, content + "\nHost: b.example");
   EXPECT_EQ(one.validator(), "");
   std::string steering = content;
-  write(note, steering.insert(steering.find("\"tag"), "\r"));
+  write(note, steering.insert(steering.find("\"tag"), 1, '\r'));
   EXPECT_EQ(one.validator(), "");
   content.replace(content.find("/1.mp3"), 6, "/2.mp3");
   write(note, content);

@@ -164,8 +164,8 @@ TEST(FileDescriptorTest, ReadingStopsAtTheLimitWhateverSizeWasExpected) {
   }
   const std::string path = directory.addFile("file", content);
   struct Row {
-    std::uint64_t expectedSize;
-    std::uint64_t limit;
+    std::size_t expectedSize;
+    std::size_t limit;
     bool isRead;
   };
   for (const auto& [expectedSize, limit, isRead] : std::array<Row, 8>{{
