@@ -24,9 +24,9 @@ std::string portableText(std::string_view text) {
     const std::size_t begin = position;
     const std::int32_t character = platform::nextCharacter(text, position);
     const std::string_view bytes = text.substr(begin, position - begin);
-    const bool isReserved =
-        character < ' ' || character == 0x7F || !platform::isXMLText(bytes) ||
-        (bytes.size() == 1 && std::string_view("<>:\"/\\|?*").find(bytes) != bytes.npos);
+    const bool isReserved = character < ' ' || character == 0x7F || !platform::isXMLText(bytes) ||
+                            (bytes.size() == 1 &&
+                             std::string_view("<>:\"/\\|?*").find(bytes) != std::string_view::npos);
     portable.append(isReserved ? "_" : bytes);
   }
   portable.erase(0, std::min(portable.find_first_not_of(". "), portable.size()));

@@ -25,9 +25,10 @@ void QELCheckLocation(const QELReferenceRecord& record, std::string_view key,
   const std::string_view text = location->text();
   const std::string shown = QELQuoted(text);
   const bool looksLikeURL = platform::looksLikeURL(text);
-  const bool isDerived = !type && key.starts_with("Episode");
-  const bool isRemote = type ? type->text() == kReferenceTypeRemote
-                             : isDerived && QELReferenceType(text) == kReferenceTypeRemote;
+  const bool isDerived = type == nullptr && key.starts_with("Episode");
+  const bool isRemote = type != nullptr
+                            ? type->text() == kReferenceTypeRemote
+                            : isDerived && QELReferenceType(text) == kReferenceTypeRemote;
   std::string_view message;  // of the location and, where it needs it, of its type's key
   if (text.empty()) {
     return warn(*location, "\"%@\" is empty: write a path or a URL, or leave it out", {key});

@@ -33,7 +33,7 @@ class Check {
     fileTypes(record.value("AllowedEpisodeTypes"));
     for (const std::string_view key : {"EpisodeOrder", "EpisodeFileSize"}) {
       const platform::PropertyListPart* const number = record.value(key);
-      if (number && *number->value->asSignedInteger() < 0) {
+      if (number != nullptr && *number->value->asSignedInteger() < 0) {
         warn(QELPlaceOf(*number),
              "a negative \"%@\" counts as missing: write 0 or more, or leave it out", {key});
       }

@@ -80,6 +80,7 @@ std::string QELQuoted(std::string_view text) {
 
 std::string QELListed(const std::map<std::string, std::size_t>& counts) {
   std::vector<std::pair<std::size_t, std::string>> byCount;
+  byCount.reserve(counts.size());
   for (const auto& [name, count] : counts) byCount.emplace_back(count, name);
   std::stable_sort(byCount.begin(), byCount.end(),
                    [](const auto& left, const auto& right) { return left.first > right.first; });

@@ -39,7 +39,7 @@ std::string barText(double share) {
 
 std::string lineOf(const QELTransferState& transfer, std::size_t columns, Clock::time_point now) {
   const double elapsed = std::chrono::duration<double>(now - transfer.start).count();
-  const double received = static_cast<double>(transfer.received - transfer.resumed);
+  const auto received = static_cast<double>(transfer.received - transfer.resumed);
   const double speed = elapsed > 0 ? received / elapsed : 0;
   const std::string speedText = QELSizeText(static_cast<std::uint64_t>(speed)) + "/s";
   std::string numbers;

@@ -16,6 +16,7 @@ namespace platform {
 struct FileIdentity {
   std::uint64_t device;
   std::uint64_t number;
+  // NOLINTNEXTLINE(modernize-use-nullptr): about what the compiler makes of it
   friend auto operator<=>(const FileIdentity&, const FileIdentity&) = default;
 };
 

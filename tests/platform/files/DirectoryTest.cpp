@@ -282,7 +282,7 @@ TEST_F(DirectoryTest, SyncingFailsWithTheCauseAndGoesOnWhereThereIsNothingToTell
                                           {EOPNOTSUPP, ""}}) {
     SCOPED_TRACE(refusal);
     for (const long call : {SYS_fsync, SYS_syncfs}) {
-      EXPECT_TRUE(holdsInChild([&] {
+      EXPECT_TRUE(holdsInChild([&, refusal = refusal, expected = expected] {
         const Directory directory = opened(root_.path());
         if (!refuseSystemCall(call, refusal)) return false;
         const bool isSynced =
