@@ -224,7 +224,7 @@ void NetworkTransfer::send(bool onNewConnection) {
   ignoredSize_ = 0;
   CURLcode result = library().easySetopt(handle_.get(), CURLOPT_URL, url_.encodedText().c_str());
   if (result == CURLE_OK) {
-    result = library().easySetopt(handle_.get(), CURLOPT_FRESH_CONNECT, long{onNewConnection});
+    result = library().easySetopt(handle_.get(), CURLOPT_FRESH_CONNECT, onNewConnection ? 1L : 0L);
   }
   if (result == CURLE_OK) result = setFields();
   if (result == CURLE_OK) result = Connections::ofThisThread().add(*this);

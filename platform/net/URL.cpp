@@ -236,7 +236,7 @@ std::optional<URL> URL::resolved(std::string_view reference) const {
 
   const std::optional<Components> target = componentsOf(text);
   if (!target) return std::nullopt;
-  const std::size_t pathStart = static_cast<std::size_t>(target->path.data() - text.data());
+  const auto pathStart = static_cast<std::size_t>(target->path.data() - text.data());
   std::string tail;
   for (std::size_t i = pathStart; i < text.size(); ++i) {
     tail += text[i];

@@ -34,20 +34,19 @@ std::string authorityFault(std::string_view authority) {
 
 }  // namespace
 
-bool hasFetchedScheme(std::string_view location) {
-  const std::string start = lowercased(firstCharacters(location, 6));
+bool hasFetchedScheme(std::string_view text) {
+  const std::string start = lowercased(firstCharacters(text, 6));
   return start.starts_with("http:") || start == "https:" || start.starts_with("file:");
 }
 
-bool looksLikeURL(std::string_view location) {
-  const std::size_t colon = location.find("://");
+bool looksLikeURL(std::string_view text) {
+  const std::size_t colon = text.find("://");
   const auto isOfScheme = [](char c) {
     return isASCIILetter(c) || isASCIIDigit(c) || c == '+' || c == '.' || c == '-';
   };
-  if (hasFetchedScheme(location)) return true;
-  return colon != std::string_view::npos && isASCIILetter(location.front()) &&
-         std::all_of(location.begin(), location.begin() + static_cast<std::ptrdiff_t>(colon),
-                     isOfScheme);
+  if (hasFetchedScheme(text)) return true;
+  return colon != std::string_view::npos && isASCIILetter(text.front()) &&
+         std::all_of(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(colon), isOfScheme);
 }
 
 std::string urlFault(std::string_view text) {
