@@ -47,6 +47,12 @@ void MessageFraming::takeLine(std::string_view line) {
   takeValue(line.substr(colon + 1));
 }
 
+std::string_view MessageFraming::fault() const {
+  // The library waits for the end of the connection then, whatever was announced.
+  const bool isLengthHidden = hidesLength_ && !isChunked_ && length_;
+  return fault_.empty() && isLengthHidden ? kBrokenField : fault_;
+}
+
 void MessageFraming::takeValue(std::string_view value) {
   for (const std::string_view piece : splitAt(value, ',')) {
     if (field_ == Field::kLength) {
@@ -54,7 +60,9 @@ void MessageFraming::takeValue(std::string_view value) {
       continue;
     }
     std::string name = lowercased(trimmed(piece));
-    if (name.empty() || name == "identity") continue;
+    const bool isNoCoding = name.empty() || name == "identity";
+    if (isNoCoding && field_ == Field::kTransferCoding) hidesLength_ = true;
+    if (isNoCoding) continue;
     if (field_ == Field::kTransferCoding) {
       takeTransferCoding(name);
     } else {

@@ -20,7 +20,7 @@ class MessageFraming {
   void takeLine(std::string_view line);
 
   /// Why nobody can tell where the body ends; empty when it can be told.
-  std::string_view fault() const { return fault_; }
+  std::string_view fault() const;
 
   /// The announced length; absent without one, and for a body in chunks, which end by themselves.
   std::optional<std::uint64_t> length() const { return isChunked_ ? std::nullopt : length_; }
@@ -42,6 +42,7 @@ class MessageFraming {
   Field field_ = Field::kOther;  // of the last line
   std::optional<std::uint64_t> length_;
   bool isChunked_ = false;
+  bool hidesLength_ = false;  // a transfer coding that is none
   std::vector<std::string> contentCodings_;
   std::string_view fault_;
 };

@@ -21,7 +21,7 @@ class EndingSignals {
 
   /// Lets the signal that came, if one did, end the process after all, so that its parent learns of
   /// it.
-  void passOn();
+  static void passOn();
 };
 
 }  // namespace platform

@@ -10,7 +10,7 @@ from email.utils import parsedate_to_datetime
 from pathlib import Path
 from xml.dom import minidom
 
-from support import Result, ToolTestCase, element, item, rss, without_publication_date
+from support import Result, ToolTestCase, counting_from_start, element, item, rss, without_publication_date
 
 EXAMPLE = Path(__file__).resolve().parents[3] / "examples" / "show"
 BASE = "https://media.example/lantern"
@@ -292,7 +292,8 @@ class OutputTest(PublishTestCase):
 
     def test_a_full_disk_leaves_the_old_feed(self):
         feed = self.write("feed.xml", "old")
-        result = self.publish(*self.source, feed, prefix=("/bin/sh", "-c", 'ulimit -f 0; exec "$0" "$@"'))
+        result = self.publish(*self.source, feed, env=counting_from_start("qel-publish"),
+                              prefix=("/bin/sh", "-c", 'ulimit -f 0; exec "$0" "$@"'))
         self.assertNotPublished(result, 1, f"cannot write '{feed}': File too large")
         self.assertEqual(feed.read_text(encoding="utf-8"), "old")
         self.assertEqual(sorted(os.listdir(self.directory)), ["feed.xml", "reference.plist"])

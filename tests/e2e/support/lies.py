@@ -161,7 +161,10 @@ LIES = {
         Lie("chunks within another coding", answer("Transfer-Encoding: chunked, rot13", body=chunk(BODY)),
             TRANSFER_CODING),
         Lie("a space before the colon", answer("Transfer-Encoding : chunked", body=chunk(BODY) + ZERO_CHUNK), UNFRAMED),
-        Lie("none, by name", answer("Transfer-Encoding: identity", length(SIZE)), closes=True),
+        Lie("none, by name", answer("Transfer-Encoding: identity"), closes=True),
+        Lie("none, by name, and a length", answer("Transfer-Encoding: identity", length(SIZE)), UNFRAMED),
+        Lie("none, by name, and a longer body", answer("Transfer-Encoding: identity", length(SIZE - 7)), UNFRAMED),
+        Lie("none, by no name, and a cut body", answer(length(SIZE + 7), "Transfer-Encoding:"), UNFRAMED, closes=True),
     ),
     "Content codings": (
         Lie("gzip, as feeds are asked for and media are not", coded("gzip", PACKED)),

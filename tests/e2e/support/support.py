@@ -68,7 +68,7 @@ def environment(changes=None):
 
 
 @functools.cache
-def counting_from_start():
+def counting_from_start(program="qel"):
     """Changes to the environment of a run that cannot write a file at its end: past a limit, as another user.
 
     Where coverage is measured, such a run counts into a file that is there from its start; nothing else changes.
@@ -78,7 +78,7 @@ def counting_from_start():
         return {}
     folder = Path(name).parent
     changes = {"LLVM_PROFILE_FILE": str(folder / f"{os.getpid()}-%c%m.profraw")}
-    run(env=changes)  # makes the file, whole
+    run(program=program, env=changes)  # makes the file, whole
     for file in folder.glob(f"{os.getpid()}-*"):
         file.chmod(0o666)
     return changes

@@ -23,7 +23,6 @@ namespace platform {
 namespace {
 
 using testing::ElementsAre;
-using testing::IsEmpty;
 
 class DirectoryTest : public testing::Test {
  protected:
