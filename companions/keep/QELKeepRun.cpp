@@ -69,7 +69,7 @@ int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   isWritten = isWritten && write(directory);
   if (platform::EndingSignals::hasCome()) commandLine_.report("interrupted; the next run goes on");
   const int status = conclude(isWritten);
-  signals.passOn();
+  platform::EndingSignals::passOn();
   if (status == kAllWell) show_.removeParts();
   return status;
 }

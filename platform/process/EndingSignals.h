@@ -9,7 +9,7 @@ namespace platform {
 ///     EndingSignals signals;
 ///     while (!signals.hasCome() && work()) continue;
 ///     tidyUp();
-///     signals.passOn();
+///     EndingSignals::passOn();
 class EndingSignals {
  public:
   EndingSignals();

@@ -16,7 +16,7 @@ TEST(EndingSignalsTest, ASignalIsNotedAndPassedOn) {
           if (EndingSignals::hasCome()) std::exit(1);
           std::raise(signal);
           if (!EndingSignals::hasCome()) std::exit(2);
-          signals.passOn();
+          EndingSignals::passOn();
         },
         testing::KilledBySignal(signal), "")
         << signal;
@@ -35,7 +35,7 @@ TEST(EndingSignalsTest, TheSecondOfAKindEndsTheProcess) {
 
 TEST(EndingSignalsTest, NothingIsPassedOnWhenNothingCame) {
   EndingSignals signals;
-  signals.passOn();
+  EndingSignals::passOn();
   EXPECT_FALSE(EndingSignals::hasCome());
 }
 
