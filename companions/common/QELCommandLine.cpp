@@ -122,3 +122,24 @@ std::function<bool(const std::string&)> QELTakeDirectory(QELDirectory& directory
     return isPrefix(directory.prefix) && platform::URL::parse(directory.uri).has_value();
   };
 }
+
+std::function<bool(const std::string&)> QELTakeURL(std::optional<std::string>& text) {
+  return [&text](const std::string& value) {
+    const auto url = platform::URL::parse(value);
+    if (!url || (url->scheme() != "http" && url->scheme() != "https")) return false;
+    text = url->encodedText();
+    return true;
+  };
+}
+
+std::function<bool(const std::string&)> QELTakeLanguage(std::optional<std::string>& tag) {
+  return [&tag](const std::string& value) {
+    const auto isOfTag = [](char c) {
+      return platform::isASCIILetter(c) || platform::isASCIIDigit(c) || c == '-';
+    };
+    tag = value;
+    return !value.empty() && platform::isASCIILetter(value.front()) && value.back() != '-' &&
+           value.find("--") == std::string::npos &&
+           std::all_of(value.begin(), value.end(), isOfTag);
+  };
+}
