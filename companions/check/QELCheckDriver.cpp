@@ -96,5 +96,5 @@ int QELRunCheck(std::span<const char* const> commandLine) {
   for (const std::string& path : arguments.operands()) {
     status = std::max(status, checkPath(path, options, arguments));
   }
-  return status;
+  return arguments.finish(status);
 }

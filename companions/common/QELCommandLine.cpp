@@ -52,7 +52,7 @@ std::optional<int> QELCommandLine::parse(std::span<const char* const> arguments)
     if (option.name == "help" || option.name == "version") {
       platform::writeToStandardOutput(option.name == "help" ? help()
                                                             : name_ + " " QEL_VERSION "\n");
-      return kAllWell;
+      return finish(kAllWell);
     }
     if (!option.take(value)) {
       return wrongUse("'" + value + "' is no value of option '--" + option.name + "'");
@@ -71,6 +71,13 @@ void QELCommandLine::report(std::string_view message) const {
 int QELCommandLine::wrongUse(std::string_view message) const {
   report(std::string(message).append("; see '").append(name_).append(" --help'"));
   return kNothingDone;
+}
+
+int QELCommandLine::finish(int status) const {
+  platform::ErrorSlot error;
+  if (platform::flushStandardOutput(error)) return status;
+  report("cannot write to standard output: " + error->description);
+  return std::max(status, kSomethingToLookAt);
 }
 
 std::string QELCommandLine::help() const {

@@ -51,6 +51,9 @@ class QELCommandLine {
   void report(std::string_view message) const;
   /// Reports the wrong use, with a hint at "--help", and gives its exit status.
   int wrongUse(std::string_view message) const;
+  /// The status with which a run ends that would end with the given one: a worse one, which was
+  /// reported, when standard output has not taken all that was printed.
+  int finish(int status) const;
 
  private:
   std::string help() const;
