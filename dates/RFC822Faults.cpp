@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <array>
+#include <cstddef>
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -9,6 +11,7 @@
 #include "platform/text/Case.h"
 #include "platform/text/LeadingInteger.h"
 #include "platform/text/Splitting.h"
+#include "platform/time/CivilDay.h"
 
 namespace {
 
@@ -32,6 +35,30 @@ bool isKnownZone(std::string_view zone) {
   return std::find(kNames.begin(), kNames.end(), name) != kNames.end();
 }
 
+/// What is wrong with a day of the calendar, and with the name that stands before it; one that is
+/// not English is only a word, which nobody reads.
+std::string_view dayFault(std::string_view name, platform::CivilDay day) {
+  // From that of 1970-01-01 on.
+  constexpr std::array<std::string_view, 7> kFaults = {
+      "that day is a Thursday", "that day is a Friday", "that day is a Saturday",
+      "that day is a Sunday",   "that day is a Monday", "that day is a Tuesday",
+      "that day is a Wednesday"};
+  const bool isOfTwoDigits = day.year < 100;
+  if (isOfTwoDigits) day.year += 2000;  // its months are as long as those of 19xx
+  const std::int64_t number = platform::daysFromCivil(day);
+  if (platform::civilFromDays(number).day != day.day) return "the month has no such day";
+  if (isOfTwoDigits) return "";
+  const auto beginsWith = [&](std::string_view fault) {
+    constexpr std::string_view kBefore = "that day is a ";
+    return platform::lowercased(name).starts_with(
+        platform::lowercased(fault.substr(kBefore.size(), 3)));
+  };
+  const std::int64_t weeks = platform::floorQuotient(number, 7);
+  const std::string_view right = kFaults.at(static_cast<std::size_t>(number - weeks * 7));
+  const bool isDayName = std::any_of(kFaults.begin(), kFaults.end(), beginsWith);
+  return isDayName && !beginsWith(right) ? right : "";
+}
+
 }  // namespace
 
 std::string_view RFC822Fault(std::string_view text) {
@@ -50,5 +77,8 @@ std::string_view RFC822Fault(std::string_view text) {
   const bool hasTime = (time.size() == 2 || (time.size() == 3 && isNumber(time[2], 0, 60))) &&
                        isNumber(time[0], 0, 23) && isNumber(time[1], 0, 59);
   if (!hasTime) return "the time is none";
-  return isKnownZone(field[4]) ? "" : "the time zone is not known";
+  if (!isKnownZone(field[4])) return "the time zone is not known";
+  return dayFault(fields.size() > kFields ? fields.front() : "",
+                  {platform::leadingInteger(field[2]), static_cast<std::int64_t>(found / 3) + 1,
+                   platform::leadingInteger(field[0])});
 }

@@ -4,6 +4,7 @@
 #include <array>
 #include <cstddef>
 #include <numeric>
+#include <string>
 #include <utility>
 #include <vector>
 
@@ -78,6 +79,11 @@ const QELReferenceKey* QELReferenceKeyNamed(std::string_view name) {
 const QELReferenceKey* QELLikeliestReferenceKey(std::string_view name, bool isOfEpisode) {
   constexpr std::size_t kLongest = 40;
   if (name.size() > kLongest) return nullptr;
+  // A podcast has not everything that an episode has: "PodcastDate" is not spelt wrongly.
+  if (!isOfEpisode && name.starts_with("Podcast") &&
+      QELReferenceKeyNamed("Episode" + std::string(name.substr(7))) != nullptr) {
+    return nullptr;
+  }
   const QELReferenceKey* likeliest = nullptr;
   std::size_t least = 3;  // a word that differs more is another one
   for (const QELReferenceKey& key : kKeys) {

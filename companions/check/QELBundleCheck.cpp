@@ -116,7 +116,7 @@ void QELBundleCheck::checkName(const std::string& name) {
                ? warn("a run that did not end left this behind: remove it, or run qel-keep again")
                : warn("a hidden file, which is no part of the bundle: remove it");
   }
-  const auto [other, isNew] = kept_.emplace(platform::lowercased(name), name);
+  const auto [other, isNew] = kept_.emplace(platform::caseFolded(name), name);
   if (!isNew) {
     warn(
         "its name differs from %@ in capitals alone, which other file systems take for one: "

@@ -30,5 +30,5 @@ class QELBundleCheck {
   bool isForPublishing_;
   QELFindings& findings_;
   std::set<std::string> listed_;             // names below the directory
-  std::map<std::string, std::string> kept_;  // names that are there, by themselves in lower case
+  std::map<std::string, std::string> kept_;  // names that are there, by themselves without case
 };

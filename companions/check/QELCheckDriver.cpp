@@ -34,8 +34,7 @@ constexpr std::size_t kMostOfAKind = 3;
 /// By what it is; by its name where its beginning does not tell.
 bool isPropertyList(std::string_view head, const std::string& name) {
   if (head.starts_with("bplist")) return true;
-  const std::optional<std::string> root = platform::rootElementName(head);
-  if (root) return *root == "plist" || *root == "dict";
+  if (const auto root = platform::rootElementName(head)) return *root == "plist" || *root == "dict";
   return platform::lowercased(platform::pathExtension(name)) == "plist";
 }
 
@@ -63,14 +62,9 @@ int checkPath(const std::string& path, const Options& options, const QELCommandL
   QELFindings findings(document, most);
 
   platform::ErrorSlot error;
-  std::optional<platform::ByteSource> bytes;
-  if (path == "-") {
-    bytes = platform::readStandardInput();
-  } else {
-    bytes = platform::openWholeFile(document, error);
-  }
-  std::string head;
-  if (bytes) head = bytes->head(error);
+  std::optional<platform::ByteSource> bytes =
+      path == "-" ? platform::readStandardInput() : platform::openWholeFile(document, error);
+  const std::string head(bytes ? bytes->head(error) : "");
   if (error) {
     commandLine.report(document + ": " + error->description);
     return kNothingDone;
@@ -102,5 +96,5 @@ int QELRunCheck(std::span<const char* const> commandLine) {
   for (const std::string& path : arguments.operands()) {
     status = std::max(status, checkPath(path, options, arguments));
   }
-  return status;
+  return arguments.finish(status);
 }

@@ -10,8 +10,10 @@
 #include <vector>
 
 #include "companions/common/QELFaultAdvice.h"
+#include "companions/common/QELMediaType.h"
 #include "dates/RFC822Faults.h"
 #include "platform/net/URL.h"
+#include "platform/net/URLFault.h"
 #include "platform/plist/PropertyListDate.h"
 #include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
@@ -139,8 +141,7 @@ class Watch final : public FeedParser {
     const bool isMinor = key == "author" || key == "keywords" || key == "copyright";
     add(isMinor ? QELSeverity::kNote : QELSeverity::kWarning, element.position,
         {"%@ makes the %@ of the %@ %@, which was %@: the last one counts, whatever its prefix; "
-         "leave "
-         "one of them out",
+         "leave one of them out",
          element.name + (isInItem() ? " item" : "")},
         {QELQuoted(element.name), key, isInItem() ? "episode" : "show", QELQuoted(becomes),
          QELQuoted(was)});
@@ -198,24 +199,30 @@ class Watch final : public FeedParser {
   void checkItem(const Dictionary& item) {
     const TextPosition& place = itemPosition_;
     demand(hasGuid_, place,
-           "this episode has no \"guid\", by which readers know it again: "
-           "qel-publish writes one");
+           "this episode has no \"guid\", by which readers know it again: qel-publish writes one");
     demand(has(item, "title"), place, "this episode has no \"title\": add one");
     demand(has(item, "date"), place,
            "this episode has no date, by which readers sort: add a \"pubDate\"");
     demand(has(item, "url"), place,
            "this episode has no \"enclosure\" with a \"url\", and so no media: add one");
+    checkURL(item, "poster", place);
     if (!has(item, "url")) return;
-    const std::string url = platform::textForKey(item, "url")->string();
-    if (!isAbsolute(url)) {
-      add(QELSeverity::kWarning, place,
-          "%@ is no URL that readers can fetch: qel-publish --base makes paths URLs",
-          {QELQuoted(url)});
-    }
+    checkURL(item, "url", place);
     demand(has(item, "contentLength"), place,
            "the enclosure has no \"length\": write the size of the file in bytes");
-    demand(has(item, "contentType"), place,
-           "the enclosure has no \"type\": write one such as audio/mpeg");
+    const auto type = platform::textForKey(item, "contentType").value_or(platform::Text());
+    demand(!type.empty(), place, "the enclosure has no \"type\": write one such as audio/mpeg");
+    if (type.empty() || QELIsMediaType(type)) return;
+    add(QELSeverity::kWarning, place, "%@ is no MIME type: write one such as audio/mpeg",
+        {QELQuoted(type)});
+  }
+
+  void checkURL(const Dictionary& dictionary, std::string_view key, const TextPosition& place) {
+    const auto url = platform::textForKey(dictionary, key);
+    if (!url || isAbsolute(*url)) return;
+    const std::string fault = platform::looksLikeURL(*url) ? platform::urlFault(*url) : "";
+    add(QELSeverity::kWarning, place, "%@ is no URL that readers can fetch: %@",
+        {QELQuoted(*url), fault.empty() ? "qel-publish --base makes paths URLs" : fault});
   }
 
   void checkChannel() {
@@ -223,6 +230,7 @@ class Watch final : public FeedParser {
     demand(has(feedAttributes(), "title"), place, "the show has no \"title\": add one");
     demand(has(feedAttributes(), "description"), place, "the show has no \"description\": add one");
     demand(hasPoster_, place, "the show has no poster: add an \"image\"");
+    checkURL(feedAttributes(), "poster", place);
     demand(hasLink_, place,
            "the show has no \"link\" with the URL of its home page: add one, or "
            "give it to qel-publish by --link");

@@ -21,6 +21,12 @@ void QELCheckForPublishing(const QELReferenceRecord& record, QELFindings& findin
   }
   demand("EpisodeName", "this episode has no title: add \"EpisodeName\"");
   demand("EpisodeDate", "this episode has no date, by which readers sort: add \"EpisodeDate\"");
+  if (!record.has("EpisodeUUID")) {
+    findings.add(
+        QELSeverity::kNote, place,
+        "this episode has no \"EpisodeUUID\", so the URL of its media becomes its guid, and "
+        "readers show it again when that changes: add one");
+  }
   const platform::PropertyListPart* const location = record.value("EpisodeReference");
   if (!location || isInBundle) return;
   const platform::PropertyListPart* const type = record.value("EpisodeReferenceType");

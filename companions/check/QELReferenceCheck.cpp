@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "companions/common/QELFaultAdvice.h"
+#include "companions/common/QELMediaType.h"
 #include "model/QELReferenceKeys.h"
 #include "platform/text/Case.h"
 
@@ -38,7 +39,11 @@ class Check {
              "a negative \"%@\" counts as missing: write 0 or more, or leave it out", {key});
       }
     }
-    if (const platform::PropertyListPart* type = record.value("EpisodeType")) mediaType(*type);
+    const platform::PropertyListPart* const type = record.value("EpisodeType");
+    if (type != nullptr && !QELIsMediaType(type->text())) {
+      warn(QELPlaceOf(*type), "%@ is no MIME type: write one such as audio/mpeg",
+           {QELQuoted(type->text())});
+    }
     if (record.isEpisode && !record.has("EpisodeReference")) {
       warn(QELPlaceOf(record.self),
            "this episode has no \"EpisodeReference\", and so no media: add their path or URL");
@@ -103,15 +108,6 @@ class Check {
         warn(QELPlaceOf(type), "%@ allows nothing: write it in lower case", {shown});
       }
     }
-  }
-
-  void mediaType(const platform::PropertyListPart& type) {
-    const std::string_view text = type.text();
-    const std::size_t slash = text.find('/');
-    const bool isSound = slash != 0 && slash + 1 < text.size() && text[slash + 1] != '/' &&
-                         text.find_first_of(" \t\r\n") > slash + 1;
-    if (slash != std::string_view::npos && isSound) return;
-    warn(QELPlaceOf(type), "%@ is no MIME type: write one such as audio/mpeg", {QELQuoted(text)});
   }
 
   QELFindings& findings_;

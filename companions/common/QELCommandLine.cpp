@@ -52,7 +52,7 @@ std::optional<int> QELCommandLine::parse(std::span<const char* const> arguments)
     if (option.name == "help" || option.name == "version") {
       platform::writeToStandardOutput(option.name == "help" ? help()
                                                             : name_ + " " QEL_VERSION "\n");
-      return kAllWell;
+      return finish(kAllWell);
     }
     if (!option.take(value)) {
       return wrongUse("'" + value + "' is no value of option '--" + option.name + "'");
@@ -71,6 +71,13 @@ void QELCommandLine::report(std::string_view message) const {
 int QELCommandLine::wrongUse(std::string_view message) const {
   report(std::string(message).append("; see '").append(name_).append(" --help'"));
   return kNothingDone;
+}
+
+int QELCommandLine::finish(int status) const {
+  platform::ErrorSlot error;
+  if (platform::flushStandardOutput(error)) return status;
+  report("cannot write to standard output: " + error->description);
+  return std::max(status, kSomethingToLookAt);
 }
 
 std::string QELCommandLine::help() const {
@@ -120,5 +127,26 @@ std::function<bool(const std::string&)> QELTakeDirectory(QELDirectory& directory
     if (equals == std::string::npos) return false;
     directory = {value.substr(0, equals), value.substr(equals + 1)};
     return isPrefix(directory.prefix) && platform::URL::parse(directory.uri).has_value();
+  };
+}
+
+std::function<bool(const std::string&)> QELTakeURL(std::optional<std::string>& text) {
+  return [&text](const std::string& value) {
+    const auto url = platform::URL::parse(value);
+    if (!url || (url->scheme() != "http" && url->scheme() != "https")) return false;
+    text = url->encodedText();
+    return true;
+  };
+}
+
+std::function<bool(const std::string&)> QELTakeLanguage(std::optional<std::string>& tag) {
+  return [&tag](const std::string& value) {
+    const auto isOfTag = [](char c) {
+      return platform::isASCIILetter(c) || platform::isASCIIDigit(c) || c == '-';
+    };
+    tag = value;
+    return !value.empty() && platform::isASCIILetter(value.front()) && value.back() != '-' &&
+           value.find("--") == std::string::npos &&
+           std::all_of(value.begin(), value.end(), isOfTag);
   };
 }

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cstddef>
 #include <utility>
 
 #include "platform/text/Case.h"
@@ -37,4 +38,10 @@ std::optional<std::string_view> QELMediaTypeOfExtension(std::string_view extensi
                    [&lowercased](const auto& type) { return type.first == lowercased; });
   if (found == kTypes.end()) return std::nullopt;
   return found->second;
+}
+
+bool QELIsMediaType(std::string_view text) {
+  const std::size_t slash = text.find('/');
+  return slash != std::string_view::npos && slash != 0 && slash + 1 < text.size() &&
+         text[slash + 1] != '/' && text.find_first_of(" \t\r\n") > slash + 1;
 }

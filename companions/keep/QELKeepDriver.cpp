@@ -111,5 +111,5 @@ int QELRunKeep(std::span<const char* const> commandLine) {
   if (platform::lowercased(platform::pathExtension(bundle)) != "podcast") {
     return arguments.wrongUse("the name of BUNDLE, '" + bundle + "', does not end in .podcast");
   }
-  return keep(arguments, options);
+  return arguments.finish(keep(arguments, options));
 }

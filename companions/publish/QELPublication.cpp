@@ -8,6 +8,7 @@
 
 #include "cli/common/QELReferenceType.h"
 #include "companions/common/QELMediaType.h"
+#include "companions/common/QELPrivateURL.h"
 #include "companions/publish/QELPublishedFeedGenerator.h"
 #include "platform/files/Paths.h"
 #include "platform/files/RegularFile.h"
@@ -67,8 +68,9 @@ OptionalText typeOf(const QELEpisode& episode) {
 
 }  // namespace
 
-QELPublication::QELPublication(std::optional<std::string> root, std::optional<std::string> base)
-    : root_(std::move(root)), base_(std::move(base)) {
+QELPublication::QELPublication(std::optional<std::string> root, std::optional<std::string> base,
+                               std::string feed)
+    : root_(std::move(root)), base_(std::move(base)), feed_(std::move(feed)) {
   if (root_ && !root_->ends_with('/')) *root_ += '/';
 }
 
@@ -140,6 +142,9 @@ QELPublication::Place QELPublication::placeOf(const Text& location, std::string_
   const bool isFileURL = platform::lowercased(location).starts_with("file:");
   if (!isFileURL && location.view().find("://") != std::string_view::npos) {
     if (!url) remarks_.add("not a valid URL, so that readers may not find it", part);
+    if (QELNamesUser(location)) {
+      remarks_.add("its URL has a user or a password, which all can read in the feed", part);
+    }
     return {location, std::nullopt};
   }
 
@@ -152,6 +157,8 @@ QELPublication::Place QELPublication::placeOf(const Text& location, std::string_
   const std::string given = isFileURL ? url->path() : location.string();
   const std::string path = platform::standardisedPath(
       platform::isAbsolutePath(given) ? given : platform::joinedPath(*root_, given));
+  std::error_code ignored;
+  holdsFeed_ |= std::filesystem::equivalent(path, feed_, ignored);
   const std::optional<std::string> below = pathBelow(*root_, path);
   if (!below) return leftOut("it does not lie in " + *root_);
   if (!base_) return leftOut("others cannot fetch it here: name where it will lie with --base");
@@ -161,6 +168,7 @@ QELPublication::Place QELPublication::placeOf(const Text& location, std::string_
   if (const auto file = platform::RegularFile::open(path, error)) {
     place.size = file->size();
   } else {
+    isIncomplete_ = true;
     remarks_.add("the file cannot be read: " + error->description,
                  std::string(part) + " (" + path + ")");
   }

@@ -19,7 +19,9 @@ class QELPublication {
   /// The root is the directory in which the show lies: relative locations begin there, and what
   /// lies below it will be found below the base, a URL that ends in "/". Absolute and standardised;
   /// without one, the show has no local file that could be published.
-  QELPublication(std::optional<std::string> root, std::optional<std::string> base);
+  /// The feed is the path at which it will be written.
+  QELPublication(std::optional<std::string> root, std::optional<std::string> base,
+                 std::string feed = {});
 
   /// The page of the show, instead of what its source says.
   void setLink(std::optional<std::string> link) { link_ = std::move(link); }
@@ -34,6 +36,10 @@ class QELPublication {
 
   /// What readers and directories will miss, and what was removed.
   const QELRemarks& remarks() const { return remarks_; }
+  /// Whether the feed would take the place of a file that the show lists.
+  bool holdsFeed() const { return holdsFeed_; }
+  /// Whether the show lists a file that cannot be read.
+  bool isIncomplete() const { return isIncomplete_; }
 
  private:
   /// What a location comes to.
@@ -47,5 +53,8 @@ class QELPublication {
   std::optional<std::string> root_;  // ends in "/"
   std::optional<std::string> base_;
   std::optional<std::string> link_;
+  std::string feed_;
   QELRemarks remarks_;
+  bool holdsFeed_ = false;
+  bool isIncomplete_ = false;
 };

@@ -1,6 +1,5 @@
 #include "companions/publish/QELPublishDriver.h"
 
-#include <algorithm>
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
@@ -17,12 +16,13 @@
 
 #include "cli/QELSourceResolution.h"
 #include "companions/common/QELCommandLine.h"
+#include "companions/common/QELPrivateURL.h"
 #include "companions/publish/QELPublication.h"
 #include "companions/publish/QELPublishedFeedGenerator.h"
+#include "generators/QELBundleDirectory.h"
 #include "platform/files/FileReplacement.h"
 #include "platform/files/Paths.h"
 #include "platform/net/URL.h"
-#include "platform/text/ASCII.h"
 #include "platform/time/PointInTime.h"
 #include "sources/QELBundlePodcastSource.h"
 #include "sources/QELFeedPodcastSource.h"
@@ -42,36 +42,13 @@ struct Options {
   QELDirectory directory;
 };
 
-/// A `take` that stores the text if it is a URL of the network.
-std::function<bool(const std::string&)> takeURL(OptionalString& text) {
-  return [&text](const std::string& value) {
-    const auto url = platform::URL::parse(value);
-    if (!url || (url->scheme() != "http" && url->scheme() != "https")) return false;
-    text = url->encodedText();
-    return true;
-  };
-}
-
-/// The same for one that others are made of: nothing stands behind its path.
+/// A `take` that stores a URL of the network that others are made of: nothing stands behind its
+/// path.
 std::function<bool(const std::string&)> takeBase(OptionalString& text) {
-  return [&text, take = takeURL(text)](const std::string& value) {
+  return [&text, take = QELTakeURL(text)](const std::string& value) {
     if (!take(value) || value.find_first_of("?#") != std::string::npos) return false;
     if (!text->ends_with('/')) *text += '/';
     return true;
-  };
-}
-
-/// A `take` that stores what looks like a language tag of RFC 5646: letters first, hyphens between
-/// the parts.
-std::function<bool(const std::string&)> takeLanguage(OptionalString& tag) {
-  return [&tag](const std::string& value) {
-    const auto isOfTag = [](char c) {
-      return platform::isASCIILetter(c) || platform::isASCIIDigit(c) || c == '-';
-    };
-    tag = value;
-    return !value.empty() && platform::isASCIILetter(value.front()) && value.back() != '-' &&
-           value.find("--") == std::string::npos &&
-           std::all_of(value.begin(), value.end(), isOfTag);
   };
 }
 
@@ -119,10 +96,20 @@ bool findRoot(const std::string& text, const QELPodcastSource& source, OptionalS
 }
 
 /// Whether the feed would take the place of what it is made from.
-bool isSourceItself(const std::string& feed, const std::string& source) {
+bool isSourceItself(const std::string& feed, const std::string& text) {
   std::error_code ignored;
+  const auto url = platform::URL::parse(text);
+  const std::string source = url && url->scheme() == "file" ? url->path() : text;
   return std::filesystem::equivalent(feed, source, ignored) ||
          std::filesystem::equivalent(feed, platform::joinedPath(source, "Info.plist"), ignored);
+}
+
+/// Whether the source is a bundle that came from a private URL; asked before it is prepared.
+bool remembersUser(const QELPodcastSource& source) {
+  if (dynamic_cast<const QELBundlePodcastSource*>(&source) == nullptr) return false;
+  platform::ErrorSlot ignored;
+  const auto kept = QELBundleDirectory::readReferenceFile(source.location()->string(), ignored);
+  return kept && QELRemembersUser(*kept);
 }
 
 int publish(const QELCommandLine& commandLine, const Options& options,
@@ -150,9 +137,13 @@ int publish(const QELCommandLine& commandLine, const Options& options,
     return kNothingDone;
   }
 
-  QELPublication publication(std::move(root), options.base);
+  const bool isPrivate = options.base && remembersUser(*source);
+  QELPublication publication(std::move(root), options.base, feed);
   publication.setLink(options.link);
   publication.prepare(*source);
+  if (publication.holdsFeed()) {
+    return commandLine.wrongUse("'" + feed + "' is a file of the show");
+  }
   QELPublishedFeedGenerator generator(options.directory, stamp);
   generator.setLanguage(options.language);
   generator.setSelfURL(options.self);
@@ -165,8 +156,11 @@ int publish(const QELCommandLine& commandLine, const Options& options,
   QELRemarks remarks = publication.remarks();
   if (!options.language) remarks.add("the show has no language: name it with --language");
   if (!options.self) remarks.add("the feed does not say where it will lie: name that with --self");
+  if (isPrivate) {
+    remarks.add("Info.plist remembers a URL with a user or a password: do not upload that file");
+  }
   for (const std::string& line : remarks.lines()) commandLine.report("warning: " + line);
-  return kAllWell;
+  return publication.isIncomplete() ? kSomethingToLookAt : kAllWell;
 }
 
 }  // namespace
@@ -180,10 +174,10 @@ int QELRunPublish(std::span<const char* const> commandLine) {
       "or - for a reference file on standard input. FEED is a file, or - for standard\n"
       "output.",
       {{"base", 'b', "URL", "where the directory of the show will lie", takeBase(options.base)},
-       {"link", 'l', "URL", "the page of the show", takeURL(options.link)},
+       {"link", 'l', "URL", "the page of the show", QELTakeURL(options.link)},
        {"language", 'L', "TAG", "the language of the show, as in en or pt-BR",
-        takeLanguage(options.language)},
-       {"self", 's', "URL", "where the feed will lie", takeURL(options.self)},
+        QELTakeLanguage(options.language)},
+       {"self", 's', "URL", "where the feed will lie", QELTakeURL(options.self)},
        {"directory", 'd', "NAME=URI", "the prefix and namespace of directory elements",
         QELTakeDirectory(options.directory)}});
   if (const auto status = arguments.parse(commandLine)) return *status;

@@ -3,16 +3,26 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstddef>
 #include <cstdio>
 
 #include "platform/files/FileManager.h"
+#include "platform/files/PosixError.h"
 
 namespace platform {
 namespace {
 
+/// The errno value of the last write to standard output that failed; 0 without one.
+int& outputFailure() {
+  static int code = 0;
+  return code;
+}
+
 ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
-  return writeAll(STDOUT_FILENO, {bytes, length}) ? static_cast<ssize_t>(length) : 0;
+  if (writeAll(STDOUT_FILENO, {bytes, length})) return static_cast<ssize_t>(length);
+  outputFailure() = errno;
+  return 0;
 }
 
 bool isTerminal(int descriptor) {
@@ -60,6 +70,13 @@ void writeToStandardOutput(std::string_view text) {
 
 void flushStandardOutput() {
   std::fflush(outputStream());
+}
+
+bool flushStandardOutput(ErrorSlot& error) {
+  flushStandardOutput();
+  if (outputFailure() == 0 || outputFailure() == EPIPE) return true;
+  error = posixError(outputFailure());
+  return false;
 }
 
 void writeToStandardError(std::string_view text) {

@@ -4,6 +4,7 @@
 #include <string_view>
 
 #include "platform/files/FileDescriptor.h"
+#include "platform/text/ErrorRecord.h"
 #include "platform/text/FormattedText.h"
 
 namespace platform {
@@ -18,9 +19,12 @@ ControlCharacters controlsOfStandardOutput();
 ControlCharacters controlsOfStandardError();
 
 /// Writes to standard output through a buffer, which is flushed at line breaks on a terminal; where
-/// the output is non-blocking, waits. Failures are not reported.
+/// the output is non-blocking, waits. Failures are not reported but where a slot is given for them.
 void writeToStandardOutput(std::string_view text);
 void flushStandardOutput();
+/// The same; false, and the slot filled, when anything that was printed was not taken, now or
+/// before. A reader that went away is no failure: it had enough.
+bool flushStandardOutput(ErrorSlot& error);
 
 /// Writes to standard error, unbuffered; failures are not reported.
 void writeToStandardError(std::string_view text);

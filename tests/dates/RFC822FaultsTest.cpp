@@ -7,7 +7,8 @@ namespace {
 TEST(RFC822FaultsTest, ADateInEnglishWithAKnownZoneHasNone) {
   for (const std::string_view text :
        {"Sat, 04 Apr 2026 04:30:00 GMT", "4 Apr 26 04:30 +0200", "31 DECEMBER 2026 23:59:60 -05:30",
-        "1 Jan 0 0:0 z", "Foo, 04 may 2026 04:30 pdt"}) {
+        "1 Jan 0 0:0 z", "Foo, 04 may 2026 04:30 pdt", "29 Feb 2028 04:30 GMT",
+        "29 Feb 28 04:30 GMT", "sunday, 29 Feb 2004 04:30 GMT", "Thu, 1 Jan 70 0:0 GMT"}) {
     EXPECT_EQ(RFC822Fault(text), "") << text;
   }
 }
@@ -24,6 +25,12 @@ TEST(RFC822FaultsTest, TellsTheFirstFault) {
            Row{"0 Apr 2026 04:30 GMT", "the day is none"},
            Row{"32 Apr 2026 04:30 GMT", "the day is none"},
            Row{"+4 Apr 2026 04:30 GMT", "the day is none"},
+           Row{"31 Feb 2026 04:30 GMT", "the month has no such day"},
+           Row{"29 Feb 2026 04:30 GMT", "the month has no such day"},
+           Row{"31 Apr 2026 04:30 GMT", "the month has no such day"},
+           Row{"Mon, 04 Apr 2026 04:30 GMT", "that day is a Saturday"},
+           Row{"Sat, 05 Apr 2026 04:30 GMT", "that day is a Sunday"},
+           Row{"SUNDAY 06 Apr 2026 04:30 GMT", "that day is a Monday"},
            Row{"4 Avr 2026 04:30 GMT", "the month is not known"},
            Row{"4 Ja 2026 04:30 GMT", "the month is not known"},
            Row{"4 anf 2026 04:30 GMT", "the month is not known"},

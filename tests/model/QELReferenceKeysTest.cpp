@@ -28,6 +28,7 @@ TEST(QELReferenceKeysTest, AMisspeltKeyIsLikeOneOfItsOwner) {
   EXPECT_EQ(likeliest("Episode", false), "Episodes");
   EXPECT_EQ(likeliest("EpisodeDay", false), "");
   EXPECT_EQ(likeliest("EpisodeTitle", true), "");
+  EXPECT_EQ(likeliest("PodcastDate", false), "");  // a key of episodes alone, and no PodcastName
   EXPECT_EQ(likeliest("", true), "");
   EXPECT_EQ(likeliest(std::string(1000000, 'x'), true), "");
 }

@@ -1,5 +1,6 @@
 """qel-check looks into bundles: what they list, what lies in them, and how it is named."""
 
+import datetime
 import os
 import plistlib
 import unittest
@@ -152,6 +153,20 @@ class BundleTest(ToolTestCase):
         self.assertEqual(self.findings(), [
             'é.mp3: warning: its name differs from "É.mp3" in capitals alone, which other file systems take for one: '
             "rename it, here and in Info.plist"])
+        for name in ("É.mp3", "é.mp3", "STRASSE.mp3", "straße.mp3"):
+            self.put(name)
+        self.list("é.mp3", "É.mp3", "STRASSE.mp3", "straße.mp3")
+        self.assertEqual(len(self.findings()), 2)
+
+    def test_an_episode_without_a_uuid_has_a_guid_that_changes(self):
+        self.put("a.mp3")
+        whole = {"EpisodeName": "e", "EpisodeDate": datetime.datetime(2026, 4, 4), "EpisodeReference": "a.mp3"}
+        note = ('note: this episode has no "EpisodeUUID", so the URL of its media becomes its guid, and readers show it '
+                "again when that changes: add one")
+        for episode, count in ((whole, 1), ({**whole, "EpisodeUUID": "u"}, 0)):
+            self.list(episode)
+            self.assertEqual([line.partition(" ")[2] for line in self.findings("--for-publishing", status=1)].count(note),
+                             count)
 
 
 if __name__ == "__main__":

@@ -17,6 +17,8 @@ OTHER_DATES = [
     ("Sa, 04 Avril 2026 04:30:00 GMT", "2026-01-04T04:30:00Z", "the month is not known"),
     ("04 Ja 2026 04:30:00 GMT", "2026-01-04T04:30:00Z", "the month is not known"),
     ("32 May 2026 04:30:00 GMT", "2026-06-01T04:30:00Z", "the day is none"),
+    ("Tue, 31 Feb 2026 10:00:00 GMT", "2026-03-03T10:00:00Z", "the month has no such day"),
+    ("Mon, 04 Apr 2026 10:00:00 GMT", "2026-04-04T10:00:00Z", "that day is a Saturday"),
     ("04 Apr 2026x 04:30:00 GMT", "2026-04-04T04:30:00Z", "the year is none"),
     ("04 Apr 2026 24:30:00 GMT", "2026-04-05T00:30:00Z", "the time is none"),
     ("04 Apr 2026 04:30:00:00 GMT", "2026-04-04T04:30:00Z", "the time is none"),
@@ -24,6 +26,11 @@ OTHER_DATES = [
     ("04 Apr 2026 04:30:00 J", "2026-04-04T04:30:00Z", "the time zone is not known"),
     ("04 Apr 2026 04:30:00 +020", "2026-04-04T02:30:00Z", "the time zone is not known"),
 ]
+
+# Of these nothing is missing.
+ITEM = element("guid", "g"), element("title", "t"), element("pubDate", DATE)
+CHANNEL = (element("title", "t"), element("description", "d"), element("link", "https://a.example/"),
+           element("language", "en"), "<image><url>https://a.example/p.png</url></image>")
 
 
 class FeedTestCase(ToolTestCase):
@@ -155,6 +162,33 @@ class PublishingTest(FeedTestCase):
             'warning: the show has no "link" with the URL of its home page: add one, or give it to qel-publish by '
             "--link",
             'warning: the show has no "language": add one such as en, or give it to qel-publish by --language'])
+
+    def test_what_the_enclosure_says(self):
+        said = "warning: "
+        for url, kind, finding in (
+                ("http://a.example/b.mp3", "audio/mpeg", []),
+                ("http://a.example/b.mp3", "", ['the enclosure has no "type": write one such as audio/mpeg']),
+                ("http://a.example/b.mp3", "nonsense", ['"nonsense" is no MIME type: write one such as audio/mpeg']),
+                ("", "audio/mpeg", ['"" is no URL that readers can fetch: qel-publish --base makes paths URLs']),
+                ("http://a.example/b c.mp3", "audio/mpeg",
+                 ['"http://a.example/b c.mp3" is no URL that readers can fetch: " " is written %20']),
+                ("file:///b.mp3", "audio/mpeg",
+                 ['"file:///b.mp3" is no URL that readers can fetch: qel-publish --base makes paths URLs'])):
+            with self.subTest(url, kind=kind):
+                enclosure = element("enclosure", url=url, type=kind, length="1")
+                self.assertEqual(self.said(item(*ITEM, enclosure), *CHANNEL, options=["--for-publishing"]),
+                                 [said + line for line in finding])
+
+    def test_posters_have_urls(self):
+        enclosure = element("enclosure", url="https://a.example/b.mp3", type="audio/mpeg", length="1")
+        poster = element("orvane:image", href="p q.png")
+        fault = 'warning: "%s" is no URL that readers can fetch: qel-publish --base makes paths URLs'
+        self.assertEqual(self.said(item(*ITEM, enclosure, poster), *CHANNEL, options=["--for-publishing"]),
+                         [fault % "p q.png"])
+        channel = [part.replace("https://a.example/p.png", "rel.png") for part in CHANNEL]
+        self.assertEqual(self.said(*channel, options=["--for-publishing"]), [fault % "rel.png"])
+        self.assertEqual(self.said(*CHANNEL[:-1], element("orvane:image", href="rel.png"),
+                                   options=["--for-publishing"]), [fault % "rel.png"])
 
     def test_what_qel_publish_writes_lacks_nothing(self):
         show = ROOT / "examples" / "show"

@@ -15,6 +15,8 @@ from support import ToolTestCase, element, environment, item, rss, tool
 
 ROOT = Path(__file__).resolve().parents[3]
 
+NO_UUID = ('note: this episode has no "EpisodeUUID", so the URL of its media becomes its guid, and readers show it again '
+           "when that changes: add one")
 MEDIA = "<key>EpisodeReference</key><string>a.mp3</string>"
 
 
@@ -93,6 +95,8 @@ REFUSED = [
 TAKEN_OTHERWISE = [
     (podcast(text("PodcastNmae", "x")),
      '3:1: warning: "PodcastNmae" is no key of a podcast, and is ignored; is it meant to be "PodcastName"?'),
+    (podcast("<key>PodcastDate</key><date>2026-04-04T04:30:00Z</date>"),
+     '3:1: warning: "PodcastDate" is no key of a podcast, and is ignored: correct it or leave it out'),
     (podcast(text("Zzz", "x")),
      '3:1: warning: "Zzz" is no key of a podcast, and is ignored: correct it or leave it out'),
     (podcast(text("EpisodeName", "x")),
@@ -305,9 +309,11 @@ class PublishingTest(ReferenceFileTestCase):
             "2:1: note: a reference file has no language: give it to qel-publish by --language",
             '3:27: warning: this episode has no title: add "EpisodeName"',
             '3:27: warning: this episode has no date, by which readers sort: add "EpisodeDate"',
+            f"3:27: {NO_UUID}",
             '4:28: note: "a.mp3" is a path: qel-publish makes it a URL with --base',
             '6:1: warning: this episode has no title: add "EpisodeName"',
             '6:1: warning: this episode has no date, by which readers sort: add "EpisodeDate"',
+            f"6:1: {NO_UUID}",
             "6:1: warning: the size of this episode's media is not known: add \"EpisodeFileSize\", in bytes"])
 
     def test_the_example_lacks_nothing(self):

@@ -157,6 +157,19 @@ TEST_F(StandardStreamsTest, PrintedTextWaitsForANonBlockingOutput) {
   EXPECT_TRUE(bytes == text) << bytes.size() << " bytes";
 }
 
+TEST_F(StandardStreamsTest, PrintedTextThatIsRefusedIsTold) {
+  ErrorSlot error;
+  EXPECT_TRUE(holdsWithOutput(FileDescriptor::open("/dev/null", O_WRONLY), [&] {
+    writeToStandardOutput("taken");
+    return flushStandardOutput(error) && !error;
+  }));
+  EXPECT_TRUE(holdsWithOutput(FileDescriptor::open("/dev/full", O_WRONLY), [&] {
+    writeToStandardOutput("refused");
+    flushStandardOutput();
+    return !flushStandardOutput(error) && error->code == ENOSPC;  // by an earlier call
+  }));
+}
+
 TEST_F(StandardStreamsTest, PrintedTextThatIsRefusedIsGone) {
   const std::string path = directory_.addFile("out", "");
   EXPECT_TRUE(holdsWithOutput(FileDescriptor::open("/dev/full", O_WRONLY), [&] {
