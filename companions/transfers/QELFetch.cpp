@@ -16,7 +16,9 @@ QELFetch::QELFetch(std::string title, QELMediaReference reference,
   } else if (reference_.isRemote && !reference_.url) {
     refuse("It is no valid URL");
   } else if (reference_.isRemote && reference_.url->scheme() != "file") {
-    part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText());
+    part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText(),
+                                      progress_.title);
+    finishedName_ = part_->finishedName();
   }
 }
 
@@ -34,8 +36,8 @@ void QELFetch::start(int stallLimit) {
     if (platform::copyFile(reference_.location->string(), place_, error)) return finish();
     return refuse(error->description);
   }
-  if (const auto name = part_ ? part_->finishedName() : std::nullopt) {
-    place_.name = *name;
+  if (part_ && finishedName_) {
+    place_.name = *finishedName_;
     return finish();
   }
   state_ = State::kRunning;

@@ -70,6 +70,7 @@ class QELFetch : private platform::DownloadReceiver {
   QELMediaReference reference_;
   platform::FilePlace place_;
   std::unique_ptr<QELPart> part_;
+  std::optional<std::string> finishedName_;  // as it was before any fetch of this run began
   std::string validator_;  // of the part, as the next try finds it
   QELRetrySchedule schedule_;
   QELTransferState progress_;
