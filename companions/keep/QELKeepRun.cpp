@@ -51,8 +51,10 @@ int QELKeepRun::rehearse() {
 int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   platform::EndingSignals signals;
   for (const auto& fetch : show_.fetches()) transfers.add(fetch);
+  // From the beginning it is a bundle that can be read, and that knows its source.
+  bool isWritten = write(directory);
+  if (!isWritten) return kNothingDone;
   Clock::time_point lastWriting = Clock::now();
-  bool isWritten = true;
   while (isWritten && !transfers.hasEnded() && !platform::EndingSignals::hasCome()) {
     for (const auto& ended : transfers.run()) {
       if (ended->state() != QELFetch::State::kDone) continue;
