@@ -106,7 +106,8 @@ int QELKeepRun::conclude(bool isWritten) {
   }
   say(summary);
   for (const std::string& title : show_.lostTitles()) {
-    failures.push_back(title + ": its file is gone, and the source does not have it any more");
+    failures.push_back(title + ": its file is gone, and the source does not have it any more; " +
+                       "put it back, or take its entry out of Info.plist");
   }
   for (const std::string& failure : failures) commandLine_.report(platform::harmlessText(failure));
   return isWritten && failures.empty() ? kAllWell : kSomethingToLookAt;
