@@ -64,7 +64,8 @@ void QELFetch::forgetPart() {
   part_.reset();
 }
 
-/// A part that nothing vouches for is of no use.
+/// A part that nothing vouches for is of no use. Nor is one that this system failed to store: on a
+/// full disk it would take the room of what came whole.
 void QELFetch::keepPart() const {
   if (part_ && validator_.empty()) part_->remove();
   if (part_ && !validator_.empty()) part_->note(validator_, place_.name, progress_.total);
@@ -91,7 +92,11 @@ void QELFetch::downloadDidFinish(Download& /*download*/) {
 void QELFetch::didFailWithError(Download& download, const platform::ErrorRecord& error) {
   const auto now = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
   const auto wait = schedule_.waitAfter(error, download.answer().retryAfter, now);
-  keepPart();
+  if (error.domain == "POSIX") {
+    forgetPart();
+  } else {
+    keepPart();
+  }
   if (!wait) return refuse(error.description);
   state_ = State::kWaiting;
   dueTime_ = Clock::now() + *wait;
