@@ -6,7 +6,7 @@ import time
 import unittest
 
 from keep_support import KeepTestCase
-from support import environment
+from support import element, environment, rss
 
 BODY = bytes(range(256)) * 4096  # a MiB
 STRONG = [("ETag", '"one"')]
@@ -166,6 +166,17 @@ class TransfersTest(KeepTestCase):
                          (1, b"", f'qel-keep: "Episode 1": {self.web.url("/1.mp3")}: File too large\n'))
         self.media(2)
         self.assertNothingHidden()
+
+    def test_a_feed_that_stalls_or_is_busy_is_tried_again(self):
+        feed = rss(element("title", "Show"), self.episode(1))
+        answers = iter([lambda exchange: time.sleep(5), lambda exchange: exchange.reply(503, b"busy")])
+
+        def answer(exchange):
+            next(answers, lambda exchange: exchange.reply(200, feed))(exchange)
+        self.web.route("/feed.xml", answer)
+        self.assertKept(self.keep("--stall", "1"), "1 new, 0 known, 0 failed")
+        self.media(1)
+        self.assertEqual(self.web.hits("/feed.xml"), 3)
 
     def test_servers_that_lie_about_a_part_are_not_believed(self):
         half, size = len(BODY) // 2, len(BODY)
