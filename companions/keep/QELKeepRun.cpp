@@ -72,7 +72,7 @@ int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   if (platform::EndingSignals::hasCome()) commandLine_.report("interrupted; the next run goes on");
   const int status = conclude(isWritten);
   signals.passOn();
-  if (status == kAllWell) show_.removeParts();
+  show_.removeParts();
   return status;
 }
 

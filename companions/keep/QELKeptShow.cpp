@@ -144,7 +144,8 @@ void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
     const std::string old = reference ? reference->string() : QELFileName(media).value_or("");
     const std::string base = QELBaseName(platform::lastPathComponent(old));
     const std::string name = mediaNames_.reserve(base, platform::pathExtension(old));
-    entry.media = makeFetch(title, media, directory_.mediaPlace(name), path_);
+    entry.media = std::make_shared<QELFetch>(title, media, directory_.mediaPlace(name), path_,
+                                             allowsLocalFiles_);
     reference = name;
   } else if (reference) {
     lose(entry);
@@ -183,22 +184,11 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
     if (!fetch) {
       const std::string extension(platform::pathExtension(QELFileName(poster).value_or("")));
       const std::string name = posterNames_.reserve(baseName, extension);
-      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), postersPath_);
+      fetch = std::make_shared<QELFetch>("poster of " + title, poster, directory_.posterPlace(name),
+                                         postersPath_, allowsLocalFiles_);
     }
     entry.poster = fetch;
   }
-}
-
-std::shared_ptr<QELFetch> QELKeptShow::makeFetch(const std::string& title,
-                                                 const QELMediaReference& reference,
-                                                 const std::optional<platform::FilePlace>& place,
-                                                 const std::string& folder) const {
-  auto fetch = std::make_shared<QELFetch>(title, reference, place, folder);
-  const bool isLocal = !reference.isRemote || (reference.url && reference.url->scheme() == "file");
-  if (isLocal && !allowsLocalFiles_) {
-    fetch->refuse("A feed of the network names a local file, see --allow-local");
-  }
-  return fetch;
 }
 
 Dictionary QELKeptShow::dictionary() const {
@@ -227,8 +217,10 @@ Dictionary QELKeptShow::dictionary() const {
 }
 
 void QELKeptShow::removeParts() const {
-  QELPart::removeAll(directory_.directory(), path_);
-  QELPart::removeAll(directory_.posters(), postersPath_);
+  std::set<std::string> names;
+  for (const auto& fetch : fetches_) names.insert(fetch->partName());
+  QELPart::removeAllBut(names, directory_.directory(), path_);
+  QELPart::removeAllBut(names, directory_.posters(), postersPath_);
 }
 
 std::size_t QELKeptShow::newCount() const {

@@ -44,7 +44,7 @@ class QELKeptShow {
   /// The titles of the kept episodes whose file is gone and cannot be had again.
   const std::vector<std::string>& lostTitles() const { return lostTitles_; }
 
-  /// Removes the parts that earlier runs left, whosever they are.
+  /// Removes the parts that are left, but those of what is still to be fetched, or to be listed.
   void removeParts() const;
 
   /// The reference dictionary of this moment. It lists what is whole, and what was listed before,
@@ -67,9 +67,6 @@ class QELKeptShow {
   void updatePoster(Entry& entry, const std::string& prefix, const QELMediaReference& poster,
                     const std::string& title, std::string_view baseName);
   void lose(const Entry& entry);
-  std::shared_ptr<QELFetch> makeFetch(const std::string& title, const QELMediaReference& reference,
-                                      const std::optional<platform::FilePlace>& place,
-                                      const std::string& folder) const;
 
   const QELBundleDirectory& directory_;
   const std::string& path_;

@@ -3,18 +3,24 @@
 #include <utility>
 
 #include "platform/files/FileManager.h"
+#include "platform/net/URLFault.h"
 
 using platform::Download;
 using platform::ErrorSlot;
 
 QELFetch::QELFetch(std::string title, QELMediaReference reference,
-                   const std::optional<platform::FilePlace>& place, const std::string& folder)
+                   const std::optional<platform::FilePlace>& place, const std::string& folder,
+                   bool allowsLocalFiles)
     : reference_(std::move(reference)), place_(place.value_or(platform::FilePlace(""))) {
   progress_.title = std::move(title);
   if (!place) {
     refuse("There is no place for it");
   } else if (reference_.isRemote && !reference_.url) {
     refuse("It is no valid URL");
+  } else if (!reference_.isRemote && platform::looksLikeURL(*reference_.location)) {
+    refuse("Only http, https and file URLs are fetched");
+  } else if (!allowsLocalFiles && (!reference_.isRemote || reference_.url->scheme() == "file")) {
+    refuse("A feed of the network names a local file, see --allow-local");
   } else if (reference_.isRemote && reference_.url->scheme() != "file") {
     part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText(),
                                       progress_.title);

@@ -101,11 +101,14 @@ void QELPart::remove() const {
   directory_.remove(name_, ignored);
 }
 
-void QELPart::removeAll(const platform::Directory& directory, const std::string& path) {
+void QELPart::removeAllBut(const std::set<std::string>& names, const platform::Directory& directory,
+                           const std::string& path) {
   std::error_code ignored;
   platform::ErrorSlot dropped;
   for (const auto& entry : std::filesystem::directory_iterator(path, ignored)) {
     const std::string name = entry.path().filename().string();
-    if (name.starts_with(kPrefix)) directory.remove(name, dropped);
+    if (!name.starts_with(kPrefix)) continue;
+    const std::string partName = std::string(platform::pathWithoutExtension(name)) + ".part";
+    if (!names.contains(partName)) directory.remove(name, dropped);
   }
 }

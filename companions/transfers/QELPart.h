@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -12,8 +13,8 @@
 /// proves that a server still has the same file, so that another try can go on behind the part; and
 /// which name the whole file gets, so that one that a run had no time to list is not lost.
 ///
-/// The names are ".qel-keep-", a digest of the URL and the title, and ".part" or ".note". Of one URL
-/// another episode may come each week, as of "latest.mp3"; each has its own part.
+/// The names are ".qel-keep-", a digest of the URL and the title, and ".part" or ".note". Of one
+/// URL another episode may come each week, as of "latest.mp3"; each has its own part.
 class QELPart {
  public:
   /// `path` is that of the directory, which must outlive this.
@@ -38,8 +39,9 @@ class QELPart {
   /// Removes part and note.
   void remove() const;
 
-  /// Removes all parts and notes of the directory.
-  static void removeAll(const platform::Directory& directory, const std::string& path);
+  /// Removes all parts and notes of the directory but those of the parts with the names.
+  static void removeAllBut(const std::set<std::string>& names, const platform::Directory& directory,
+                           const std::string& path);
 
  private:
   std::string noteBeginning() const;

@@ -101,7 +101,11 @@ TEST_F(QELPartTest, PartsAreRemovedWithTheirNotes) {
   one.remove();
   EXPECT_EQ(one.validator(), "");
   EXPECT_EQ(two.validator(), "\"tag\"");
-  QELPart::removeAll(directory_, path_);
+  write(one.name(), "half");
+  QELPart::removeAllBut({two.name()}, directory_, path_);
+  EXPECT_EQ(two.validator(), "\"tag\"");
+  EXPECT_FALSE(fs::exists(root_ / one.name()));
+  QELPart::removeAllBut({}, directory_, path_);
   std::size_t count = 0;
   for (const auto& entry : fs::directory_iterator(path_)) count += entry.is_regular_file() ? 1 : 0;
   EXPECT_EQ(count, 2U);

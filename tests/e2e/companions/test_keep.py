@@ -223,6 +223,13 @@ class KeepTest(KeepTestCase):
         self.assertKept(result, "2 new, 1 known, 1 failed", 1, result.stderr.decode())
         self.assertIn(b"secret", contents(self.bundle).values())
 
+    def test_a_url_that_is_not_fetched_is_told_as_such(self):
+        self.publish(self.episode(1, url="ftp://a.example/1.mp3"))
+        for options in ([], ["--allow-local"]):
+            self.assertKept(self.keep(*options), "0 new, 0 known, 1 failed", 1,
+                            'qel-keep: "Episode 1": ftp://a.example/1.mp3: '
+                            "Only http, https and file URLs are fetched\n")
+
     def test_a_feed_on_disk_may_name_local_files(self):
         media = self.write("one.mp3", b"media 1")
         feed = self.feed(rss(self.episode(1, url=str(media))), name="my feed.xml")

@@ -146,6 +146,13 @@ class TransfersTest(KeepTestCase):
         self.assertWhole()
         self.assertEqual(self.requests()[-1].headers.get("range"), "bytes=4000-")
 
+    def test_a_part_of_what_is_not_wanted_any_more_goes(self):
+        self.one(self.breaking_off(times=4, sent=1000))
+        self.assertEqual(self.keep().status, 1)
+        self.publish(self.episode(2, url=self.web.url("/none.mp3")))
+        self.assertEqual(self.keep().status, 1)
+        self.assertNothingHidden()
+
     def test_a_part_without_proof_is_not_gone_on_with(self):
         for headers in [[], [("ETag", 'W/"one"')], [("Last-Modified", "Mon, 01 Jan 2024 00:00:00 GMT"),
                                                     ("Date", "Mon, 01 Jan 2024 00:00:00 GMT")]]:
