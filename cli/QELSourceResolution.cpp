@@ -48,10 +48,13 @@ std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput()
 }
 
 std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source,
-                                                       std::vector<std::string> directoryPrefixes) {
+                                                       std::vector<std::string> directoryPrefixes,
+                                                       int stallLimit) {
   if (namesURL(source)) {
     auto feed = QELFeedPodcastSource::initWithURL(urlFromSource(source));
-    if (feed) feed->setDirectoryPrefixes(std::move(directoryPrefixes));
+    if (!feed) return nullptr;
+    feed->setDirectoryPrefixes(std::move(directoryPrefixes));
+    feed->setStallLimit(stallLimit);
     return feed;
   }
 

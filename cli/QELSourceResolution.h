@@ -23,9 +23,10 @@ std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput()
 /// The source that the string names: a feed for a URL (see QELValidateSource), a bundle or a
 /// reference file for an existing path with the extension "podcast" or "plist" in any mix of case.
 /// Null when there is no such thing. Nothing is fetched yet. The prefixes are those under which the
-/// podcast-directory elements of a feed are read.
+/// podcast-directory elements of a feed are read; for the stall limit see QELFeedPodcastSource.
 std::unique_ptr<QELPodcastSource> initWithSourceString(
-    std::string_view source, std::vector<std::string> directoryPrefixes = {QELDirectory().prefix});
+    std::string_view source, std::vector<std::string> directoryPrefixes = {QELDirectory().prefix},
+    int stallLimit = 0);
 
 /// The source for the reference file on standard input; null when there is none.
 std::unique_ptr<QELPodcastSource> initWithStandardInput();

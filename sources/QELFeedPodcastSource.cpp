@@ -33,7 +33,8 @@ bool QELFeedPodcastSource::loadSourceWithError(platform::ErrorSlot& error) {
   }
 
   platform::ErrorSlot said;
-  std::optional<platform::ByteSource> bytes = platform::readResource(*feedURL_, said);
+  std::optional<platform::ByteSource> bytes =
+      platform::readResource(*feedURL_, said, platform::kWholeReadLimit, stallLimit_);
   if (!bytes || bytes->head(said).empty()) {
     fillSlot(error, std::move(said), "Could not load or read the specified feed URL");
     return false;

@@ -25,6 +25,9 @@ class QELFeedPodcastSource : public QELPodcastSource {
     directoryPrefixes_ = std::move(prefixes);
   }
 
+  /// The number of seconds without a byte after which the fetching fails; 0, for never, at first.
+  void setStallLimit(int stallLimit) { stallLimit_ = stallLimit; }
+
   /// Fetches and parses the whole feed and fills the fields from it; what the feed lacks becomes
   /// absent. A feed does not say where it lies, so `location` is always absent afterwards. On
   /// failure the fields are as they were and the slot holds the read's, the XML parser's or the
@@ -33,5 +36,6 @@ class QELFeedPodcastSource : public QELPodcastSource {
 
  private:
   std::optional<platform::URL> feedURL_;
+  int stallLimit_ = 0;
   std::vector<std::string> directoryPrefixes_{QELDirectory().prefix};
 };

@@ -19,10 +19,12 @@ std::string QELLastingSource(const std::string& source) {
 }
 
 std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
-                                                  const QELDirectory& directory,
+                                                  const QELDirectory& directory, int stallLimit,
                                                   platform::ErrorSlot& error) {
   std::unique_ptr<QELPodcastSource> made;
-  if (QELValidateSource(source, false)) made = initWithSourceString(source, {directory.prefix});
+  if (QELValidateSource(source, false)) {
+    made = initWithSourceString(source, {directory.prefix}, stallLimit);
+  }
   if (!made) {
     error = QELError(1, "it is no feed, and no reference file or bundle that can be read");
     return nullptr;

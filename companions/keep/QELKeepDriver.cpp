@@ -1,5 +1,7 @@
 #include "companions/keep/QELKeepDriver.h"
 
+#include <algorithm>
+#include <climits>
 #include <cstdint>
 #include <filesystem>
 #include <memory>
@@ -12,6 +14,7 @@
 #include "companions/common/QELSourceLoading.h"
 #include "companions/keep/QELKeepRun.h"
 #include "companions/keep/QELKeptShow.h"
+#include "companions/transfers/QELRetrySchedule.h"
 #include "companions/transfers/QELTransfers.h"
 #include "generators/QELBundleDirectory.h"
 #include "model/QELSelection.h"
@@ -66,7 +69,12 @@ int keep(const QELCommandLine& arguments, const Options& options) {
   if (std::filesystem::equivalent(name, path, ignored)) {
     return arguments.wrongUse("SOURCE and BUNDLE are the same");
   }
-  const std::unique_ptr<QELPodcastSource> source = QELLoadedSource(name, options.directory, error);
+  const int stallLimit = static_cast<int>(std::min<std::int64_t>(options.stallLimit, INT_MAX));
+  QELRetrySchedule schedule;
+  std::unique_ptr<QELPodcastSource> source;
+  do {
+    source = QELLoadedSource(name, options.directory, stallLimit, error = std::nullopt);
+  } while (!source && schedule.sleepAfter(error));
   if (!source) return fail(name, error);
   if (!wasThere && !open()) return fail(path, error);
 
@@ -75,7 +83,7 @@ int keep(const QELCommandLine& arguments, const Options& options) {
               options.allowsLocalFiles || !QELIsOnNetwork(name));
   QELKeepRun run(arguments, show, std::move(*kept), options.isQuiet);
   if (options.isRehearsal) return run.rehearse();
-  return run.fetch(directory, QELTransfers(options.jobs, options.stallLimit));
+  return run.fetch(directory, QELTransfers(options.jobs, stallLimit));
 }
 
 }  // namespace

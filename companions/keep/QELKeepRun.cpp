@@ -51,8 +51,10 @@ int QELKeepRun::rehearse() {
 int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   platform::EndingSignals signals;
   for (const auto& fetch : show_.fetches()) transfers.add(fetch);
+  // From the beginning it is a bundle that can be read, and that knows its source.
+  bool isWritten = write(directory);
+  if (!isWritten) return kNothingDone;
   Clock::time_point lastWriting = Clock::now();
-  bool isWritten = true;
   while (isWritten && !transfers.hasEnded() && !platform::EndingSignals::hasCome()) {
     for (const auto& ended : transfers.run()) {
       if (ended->state() != QELFetch::State::kDone) continue;
@@ -70,7 +72,7 @@ int QELKeepRun::fetch(QELBundleDirectory& directory, QELTransfers transfers) {
   if (platform::EndingSignals::hasCome()) commandLine_.report("interrupted; the next run goes on");
   const int status = conclude(isWritten);
   platform::EndingSignals::passOn();
-  if (status == kAllWell) show_.removeParts();
+  show_.removeParts();
   return status;
 }
 
@@ -104,7 +106,8 @@ int QELKeepRun::conclude(bool isWritten) {
   }
   say(summary);
   for (const std::string& title : show_.lostTitles()) {
-    failures.push_back(title + ": its file is gone, and the source does not have it any more");
+    failures.push_back(title + ": its file is gone, and the source does not have it any more; " +
+                       "put it back, or take its entry out of Info.plist");
   }
   for (const std::string& failure : failures) commandLine_.report(platform::harmlessText(failure));
   return isWritten && failures.empty() ? kAllWell : kSomethingToLookAt;

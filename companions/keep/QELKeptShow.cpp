@@ -49,7 +49,7 @@ QELKeptShow::QELKeptShow(const Dictionary& kept, const QELBundleDirectory& direc
   const PropertyListValue* episodes = platform::valueForKey(kept, "Episodes");
   if (episodes == nullptr || episodes->asArray() == nullptr) return;
   for (const PropertyListValue& value : *episodes->asArray()) {
-    if (value.asDictionary()) entries_.emplace_back().dictionary = *value.asDictionary();
+    if (value.asDictionary()) entries_.push_back({*value.asDictionary(), true, false, {}, {}});
   }
 }
 
@@ -89,7 +89,7 @@ void QELKeptShow::update(const QELPodcastSource& source, const std::string& orig
   }
   for (std::size_t index = 0; index < entries_.size(); ++index) {
     if (isCurrent[index]) continue;
-    if (entries_[index].file == Entry::File::kNone) lose(entries_[index]);
+    if (!entries_[index].isThere) lose(entries_[index]);
     updated.push_back(std::move(entries_[index]));
   }
   entries_ = std::move(updated);
@@ -111,7 +111,7 @@ void QELKeptShow::noteFiles(Entry& entry, bool isCurrent) {
   const OptionalText reference = platform::textForKey(entry.dictionary, "EpisodeReference");
   const auto size = QELBundleDirectory::sizeOfFile(path_, reference);
   if (size) {
-    entry.file = Entry::File::kThere;
+    entry.isThere = true;
     entry.dictionary.insert_or_assign("EpisodeFileSize", *size);
   }
   if (reference && (size || !isCurrent)) mediaNames_.take(platform::lastPathComponent(*reference));
@@ -137,14 +137,15 @@ void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
   if (location) entry.dictionary.insert_or_assign("EpisodeOrigin", *location);
   const std::string title = quoted(episode.title(), location);
   OptionalText reference = platform::textForKey(entry.dictionary, "EpisodeReference");
-  if (entry.file == Entry::File::kThere) {
+  if (entry.isThere) {
     ++knownCount_;
   } else if (location) {
     const QELMediaReference media = episode.mediaReference();
     const std::string old = reference ? reference->string() : QELFileName(media).value_or("");
     const std::string base = QELBaseName(platform::lastPathComponent(old));
     const std::string name = mediaNames_.reserve(base, platform::pathExtension(old));
-    entry.media = makeFetch(title, media, directory_.mediaPlace(name), path_);
+    entry.media = std::make_shared<QELFetch>(title, media, directory_.mediaPlace(name), path_,
+                                             allowsLocalFiles_);
     reference = name;
   } else if (reference) {
     lose(entry);
@@ -156,8 +157,7 @@ void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
                platform::pathWithoutExtension(platform::lastPathComponent(*reference)));
 }
 
-void QELKeptShow::lose(Entry& entry) {
-  entry.file = Entry::File::kLost;
+void QELKeptShow::lose(const Entry& entry) {
   lostTitles_.push_back(quoted(platform::textForKey(entry.dictionary, "EpisodeName"),
                                platform::textForKey(entry.dictionary, "EpisodeReference")));
 }
@@ -184,22 +184,11 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
     if (!fetch) {
       const std::string extension(platform::pathExtension(QELFileName(poster).value_or("")));
       const std::string name = posterNames_.reserve(baseName, extension);
-      fetch = makeFetch("poster of " + title, poster, directory_.posterPlace(name), postersPath_);
+      fetch = std::make_shared<QELFetch>("poster of " + title, poster, directory_.posterPlace(name),
+                                         postersPath_, allowsLocalFiles_);
     }
     entry.poster = fetch;
   }
-}
-
-std::shared_ptr<QELFetch> QELKeptShow::makeFetch(const std::string& title,
-                                                 const QELMediaReference& reference,
-                                                 const std::optional<platform::FilePlace>& place,
-                                                 const std::string& folder) const {
-  auto fetch = std::make_shared<QELFetch>(title, reference, place, folder);
-  const bool isLocal = !reference.isRemote || (reference.url && reference.url->scheme() == "file");
-  if (isLocal && !allowsLocalFiles_) {
-    fetch->refuse("A feed of the network names a local file, see --allow-local");
-  }
-  return fetch;
 }
 
 Dictionary QELKeptShow::dictionary() const {
@@ -215,7 +204,7 @@ Dictionary QELKeptShow::dictionary() const {
   Dictionary whole = current(podcast_, "Podcast");
   PropertyListValue::Array episodes;
   for (const Entry& entry : entries_) {
-    if (entry.file == Entry::File::kNone && !isDone(entry.media)) continue;
+    if (!entry.wasListed && !isDone(entry.media)) continue;
     Dictionary dictionary = current(entry, "Episode");
     if (isDone(entry.media)) {
       setFile(dictionary, "EpisodeReference", entry.media->name());
@@ -228,8 +217,10 @@ Dictionary QELKeptShow::dictionary() const {
 }
 
 void QELKeptShow::removeParts() const {
-  QELPart::removeAll(directory_.directory(), path_);
-  QELPart::removeAll(directory_.posters(), postersPath_);
+  std::set<std::string> names;
+  for (const auto& fetch : fetches_) names.insert(fetch->partName());
+  QELPart::removeAllBut(names, directory_.directory(), path_);
+  QELPart::removeAllBut(names, directory_.posters(), postersPath_);
 }
 
 std::size_t QELKeptShow::newCount() const {

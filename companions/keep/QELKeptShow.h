@@ -44,18 +44,19 @@ class QELKeptShow {
   /// The titles of the kept episodes whose file is gone and cannot be had again.
   const std::vector<std::string>& lostTitles() const { return lostTitles_; }
 
-  /// Removes the parts that earlier runs left, whosever they are.
+  /// Removes the parts that are left, but those of what is still to be fetched, or to be listed.
   void removeParts() const;
 
-  /// The reference dictionary of this moment. It lists what is whole, and what was lost: nothing
-  /// else would tell of that.
+  /// The reference dictionary of this moment. It lists what is whole, and what was listed before,
+  /// also while its file is gone: nothing else would tell of that.
   platform::Dictionary dictionary() const;
 
  private:
   /// One entry of a reference file, the podcast's own or an episode's.
   struct Entry {
     platform::Dictionary dictionary;
-    enum class File { kNone, kThere, kLost } file = File::kNone;
+    bool wasListed = false;
+    bool isThere = false;              // its file
     std::shared_ptr<QELFetch> media;   // null when it is not fetched
     std::shared_ptr<QELFetch> poster;  // likewise; may be that of several entries
   };
@@ -65,10 +66,7 @@ class QELKeptShow {
   void updateEntry(Entry& entry, const QELEpisode& episode);
   void updatePoster(Entry& entry, const std::string& prefix, const QELMediaReference& poster,
                     const std::string& title, std::string_view baseName);
-  void lose(Entry& entry);
-  std::shared_ptr<QELFetch> makeFetch(const std::string& title, const QELMediaReference& reference,
-                                      const std::optional<platform::FilePlace>& place,
-                                      const std::string& folder) const;
+  void lose(const Entry& entry);
 
   const QELBundleDirectory& directory_;
   const std::string& path_;

@@ -3,20 +3,28 @@
 #include <utility>
 
 #include "platform/files/FileManager.h"
+#include "platform/net/URLFault.h"
 
 using platform::Download;
 using platform::ErrorSlot;
 
 QELFetch::QELFetch(std::string title, QELMediaReference reference,
-                   const std::optional<platform::FilePlace>& place, const std::string& folder)
+                   const std::optional<platform::FilePlace>& place, const std::string& folder,
+                   bool allowsLocalFiles)
     : reference_(std::move(reference)), place_(place.value_or(platform::FilePlace(""))) {
   progress_.title = std::move(title);
   if (!place) {
     refuse("There is no place for it");
   } else if (reference_.isRemote && !reference_.url) {
     refuse("It is no valid URL");
+  } else if (!reference_.isRemote && platform::looksLikeURL(*reference_.location)) {
+    refuse("Only http, https and file URLs are fetched");
+  } else if (!allowsLocalFiles && (!reference_.isRemote || reference_.url->scheme() == "file")) {
+    refuse("A feed of the network names a local file, see --allow-local");
   } else if (reference_.isRemote && reference_.url->scheme() != "file") {
-    part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText());
+    part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText(),
+                                      progress_.title);
+    finishedName_ = part_->finishedName();
   }
 }
 
@@ -34,8 +42,8 @@ void QELFetch::start(int stallLimit) {
     if (platform::copyFile(reference_.location->string(), place_, error)) return finish();
     return refuse(error->description);
   }
-  if (const auto name = part_ ? part_->finishedName() : std::nullopt) {
-    place_.name = *name;
+  if (part_ && finishedName_) {
+    place_.name = *finishedName_;
     return finish();
   }
   state_ = State::kRunning;
@@ -62,7 +70,8 @@ void QELFetch::forgetPart() {
   part_.reset();
 }
 
-/// A part that nothing vouches for is of no use.
+/// A part that nothing vouches for is of no use. Nor is one that this system failed to store: on a
+/// full disk it would take the room of what came whole.
 void QELFetch::keepPart() const {
   if (part_ && validator_.empty()) part_->remove();
   if (part_ && !validator_.empty()) part_->note(validator_, place_.name, progress_.total);
@@ -89,7 +98,11 @@ void QELFetch::downloadDidFinish(Download& /*download*/) {
 void QELFetch::didFailWithError(Download& download, const platform::ErrorRecord& error) {
   const auto now = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
   const auto wait = schedule_.waitAfter(error, download.answer().retryAfter, now);
-  keepPart();
+  if (error.domain == "POSIX") {
+    forgetPart();
+  } else {
+    keepPart();
+  }
   if (!wait) return refuse(error.description);
   state_ = State::kWaiting;
   dueTime_ = Clock::now() + *wait;

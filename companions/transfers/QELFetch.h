@@ -20,13 +20,15 @@ class QELFetch : private platform::DownloadReceiver {
   enum class State { kWaiting, kRunning, kDone, kFailed };
 
   /// `title` says what it is, for people; the folder is the path of the place's directory. It fails
-  /// at once without a place, and where the reference is no URL and should be one. What the place
-  /// refers to must outlive this.
+  /// at once without a place, where the reference is no URL and should be one, or one that is not
+  /// fetched, and for a local file where none is allowed. What the place refers to must outlive
+  /// this.
   ///
   /// A download goes on from the part that an earlier try left, and leaves one behind when it
   /// fails; a file that an earlier run had no time to list is taken as it is.
   QELFetch(std::string title, QELMediaReference reference,
-           const std::optional<platform::FilePlace>& place, const std::string& folder);
+           const std::optional<platform::FilePlace>& place, const std::string& folder,
+           bool allowsLocalFiles);
 
   /// The name of its part; empty for one that has none.
   std::string partName() const { return part_ ? part_->name() : ""; }
@@ -70,7 +72,8 @@ class QELFetch : private platform::DownloadReceiver {
   QELMediaReference reference_;
   platform::FilePlace place_;
   std::unique_ptr<QELPart> part_;
-  std::string validator_;  // of the part, as the next try finds it
+  std::optional<std::string> finishedName_;  // as it was before any fetch of this run began
+  std::string validator_;                    // of the part, as the next try finds it
   QELRetrySchedule schedule_;
   QELTransferState progress_;
   State state_ = State::kWaiting;

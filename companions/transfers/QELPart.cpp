@@ -18,7 +18,7 @@ namespace {
 constexpr std::string_view kPrefix = ".qel-keep-";
 constexpr std::size_t kNotedLines = 3;
 
-/// FNV-1a. URLs with the same digest share a name; the note tells them apart.
+/// FNV-1a. Files with the same digest share a name; the note tells them apart.
 std::string digest(std::string_view text) {
   std::uint64_t hash = 0xCBF29CE484222325;
   for (const char c : text) hash = (hash ^ static_cast<unsigned char>(c)) * 0x100000001B3;
@@ -36,16 +36,17 @@ std::string contentOf(const std::string& path) {
 
 }  // namespace
 
-QELPart::QELPart(const platform::Directory& directory, std::string path, std::string url)
+QELPart::QELPart(const platform::Directory& directory, std::string path, const std::string& url,
+                 const std::string& title)
     : directory_(directory),
       path_(std::move(path)),
-      url_(std::move(url)),
-      name_(std::string(kPrefix) + digest(url_) + ".part"),
-      noteName_(std::string(kPrefix) + digest(url_) + ".note") {}
+      file_(url + "\n" + title),
+      name_(std::string(kPrefix) + digest(file_) + ".part"),
+      noteName_(std::string(kPrefix) + digest(file_) + ".note") {}
 
-/// Which start of the system this is, as Linux names it, and the URL.
+/// Which start of the system this is, as Linux names it, and what the part is of.
 std::string QELPart::noteBeginning() const {
-  return contentOf("/proc/sys/kernel/random/boot_id") + url_ + "\n";
+  return contentOf("/proc/sys/kernel/random/boot_id") + file_ + "\n";
 }
 
 /// Validator, name and size as they were noted; empty when nothing of use was.
@@ -100,11 +101,14 @@ void QELPart::remove() const {
   directory_.remove(name_, ignored);
 }
 
-void QELPart::removeAll(const platform::Directory& directory, const std::string& path) {
+void QELPart::removeAllBut(const std::set<std::string>& names, const platform::Directory& directory,
+                           const std::string& path) {
   std::error_code ignored;
   platform::ErrorSlot dropped;
   for (const auto& entry : std::filesystem::directory_iterator(path, ignored)) {
     const std::string name = entry.path().filename().string();
-    if (name.starts_with(kPrefix)) directory.remove(name, dropped);
+    if (!name.starts_with(kPrefix)) continue;
+    const std::string partName = std::string(platform::pathWithoutExtension(name)) + ".part";
+    if (!names.contains(partName)) directory.remove(name, dropped);
   }
 }

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -12,16 +13,18 @@
 /// proves that a server still has the same file, so that another try can go on behind the part; and
 /// which name the whole file gets, so that one that a run had no time to list is not lost.
 ///
-/// The names are ".qel-keep-", a digest of the URL, and ".part" or ".note".
+/// The names are ".qel-keep-", a digest of the URL and the title, and ".part" or ".note". Of one
+/// URL another episode may come each week, as of "latest.mp3"; each has its own part.
 class QELPart {
  public:
   /// `path` is that of the directory, which must outlive this.
-  QELPart(const platform::Directory& directory, std::string path, std::string url);
+  QELPart(const platform::Directory& directory, std::string path, const std::string& url,
+          const std::string& title);
 
   const std::string& name() const { return name_; }
 
   /// The validator of the answer that the part came from. Empty without a part that can be gone on
-  /// from: one of another URL, say, or from before the system was started anew, when a power cut
+  /// from: one of another file, say, or from before the system was started anew, when a power cut
   /// may have lost some of its middle.
   std::string validator() const;
   /// The name of the whole file, when it has it already. Absent under the same conditions.
@@ -36,8 +39,9 @@ class QELPart {
   /// Removes part and note.
   void remove() const;
 
-  /// Removes all parts and notes of the directory.
-  static void removeAll(const platform::Directory& directory, const std::string& path);
+  /// Removes all parts and notes of the directory but those of the parts with the names.
+  static void removeAllBut(const std::set<std::string>& names, const platform::Directory& directory,
+                           const std::string& path);
 
  private:
   std::string noteBeginning() const;
@@ -45,7 +49,7 @@ class QELPart {
 
   const platform::Directory& directory_;
   std::string path_;
-  std::string url_;
+  std::string file_;  // what the part is of: the URL and the title
   std::string name_;
   std::string noteName_;
 };

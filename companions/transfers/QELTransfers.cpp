@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <chrono>
-#include <limits>
 #include <thread>
 #include <utility>
 
@@ -15,10 +14,8 @@ constexpr auto kLongestWait = std::chrono::milliseconds(200);
 
 }  // namespace
 
-QELTransfers::QELTransfers(std::int64_t jobs, std::int64_t stallLimit)
-    : jobs_(static_cast<std::size_t>(jobs)),
-      stallLimit_(
-          static_cast<int>(std::min<std::int64_t>(stallLimit, std::numeric_limits<int>::max()))) {}
+QELTransfers::QELTransfers(std::int64_t jobs, int stallLimit)
+    : jobs_(static_cast<std::size_t>(jobs)), stallLimit_(stallLimit) {}
 
 void QELTransfers::add(std::shared_ptr<QELFetch> fetch) {
   // Two of one URL may run at once.

@@ -17,7 +17,7 @@ class QELTransfers {
   using Fetches = std::vector<std::shared_ptr<QELFetch>>;
 
   /// At most `jobs` at once. For the limit see QELFetch. Both are at least 1.
-  QELTransfers(std::int64_t jobs, std::int64_t stallLimit);
+  QELTransfers(std::int64_t jobs, int stallLimit);
 
   void add(std::shared_ptr<QELFetch> fetch);
   bool hasEnded() const { return endedCount_ == count_; }

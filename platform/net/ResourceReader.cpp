@@ -103,11 +103,13 @@ class BodyCollector : public NetworkTransfer::Sink {
 
 }  // namespace
 
-std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit) {
+std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit,
+                                       int stallLimit) {
   if (url.scheme() == "file") return openWholeFile(url.path(), error);
 
   BodyCollector collector(limit);
-  const NetworkTransfer transfer(url, {.acceptedEncoding = "gzip"}, collector);
+  const NetworkTransfer transfer(url, {.acceptedEncoding = "gzip", .stallLimit = stallLimit},
+                                 collector);
   while (!transfer.hasEnded()) NetworkTransfer::runAll();
   if (transfer.error()) {
     error = transfer.error();

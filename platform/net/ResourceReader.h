@@ -17,9 +17,9 @@ namespace platform {
 /// http and https only; a compressed body is asked for and decompressed; a body cut short is a
 /// failure. On any failure gives no value and fills the slot. More than `limit` bytes, counted
 /// after decompression, are a failure too, and so is more than 1 MiB that is over 50 times its
-/// compressed size. The charset of the Content-Type is the encoding hint. For a file: URL see
-/// openWholeFile.
+/// compressed size. The charset of the Content-Type is the encoding hint. For the stall limit see
+/// TransferRequest. For a file: URL see openWholeFile.
 std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error,
-                                       std::uint64_t limit = kWholeReadLimit);
+                                       std::uint64_t limit = kWholeReadLimit, int stallLimit = 0);
 
 }  // namespace platform

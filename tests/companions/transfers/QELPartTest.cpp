@@ -18,7 +18,9 @@ class QELPartTest : public testing::Test {
     platform::ErrorSlot error;
     directory_ = *platform::Directory::open(path_, error);
   }
-  QELPart part(const std::string& url) const { return {directory_, path_, url}; }
+  QELPart part(const std::string& url, const std::string& title = "\"One\"") const {
+    return {directory_, path_, url, title};
+  }
   void write(const std::string& name, const std::string& content) { root_.addFile(name, content); }
 
   TemporaryDirectory root_;
@@ -28,7 +30,7 @@ class QELPartTest : public testing::Test {
 
 TEST_F(QELPartTest, ANoteVouchesForAPart) {
   const QELPart one = part("https://a.example/1.mp3");
-  EXPECT_EQ(one.name(), ".qel-keep-c928878f7227f43d.part");
+  EXPECT_EQ(one.name(), ".qel-keep-115081c6eee022e7.part");
   one.note("\"tag\"", "1.mp3", std::nullopt);
   EXPECT_EQ(one.validator(), "");  // no part
   write(one.name(), "");
@@ -44,7 +46,7 @@ TEST_F(QELPartTest, ANoteOfAnotherURLOrAnotherStartVouchesForNothing) {
   const QELPart one = part("https://a.example/1.mp3");
   write(one.name(), "half");
   one.note("\"tag\"", "1.mp3", 5);
-  const std::string note = ".qel-keep-c928878f7227f43d.note";
+  const std::string note = ".qel-keep-115081c6eee022e7.note";
   std::string content = contentOf(root_ / note);
   write(note, std::string("x").append(content));
   EXPECT_EQ(one.validator(), "");
@@ -77,6 +79,16 @@ TEST_F(QELPartTest, AWholeFileIsFoundAgain) {
   EXPECT_EQ(one.finishedName(), std::nullopt);
 }
 
+TEST_F(QELPartTest, AnotherEpisodeOfOneURLHasNoShareInIt) {
+  const QELPart one = part("https://a.example/latest.mp3");
+  one.note("\"tag\"", "latest.mp3", 5);
+  write("latest.mp3", "whole");
+  const QELPart two = part("https://a.example/latest.mp3", "\"Two\"");
+  EXPECT_EQ(one.finishedName(), "latest.mp3");
+  EXPECT_EQ(two.finishedName(), std::nullopt);
+  EXPECT_NE(one.name(), two.name());
+}
+
 TEST_F(QELPartTest, PartsAreRemovedWithTheirNotes) {
   const QELPart one = part("https://a.example/1.mp3");
   const QELPart two = part("https://a.example/2.mp3");
@@ -89,7 +101,11 @@ TEST_F(QELPartTest, PartsAreRemovedWithTheirNotes) {
   one.remove();
   EXPECT_EQ(one.validator(), "");
   EXPECT_EQ(two.validator(), "\"tag\"");
-  QELPart::removeAll(directory_, path_);
+  write(one.name(), "half");
+  QELPart::removeAllBut({two.name()}, directory_, path_);
+  EXPECT_EQ(two.validator(), "\"tag\"");
+  EXPECT_FALSE(fs::exists(root_ / one.name()));
+  QELPart::removeAllBut({}, directory_, path_);
   std::size_t count = 0;
   for (const auto& entry : fs::directory_iterator(path_)) count += entry.is_regular_file() ? 1 : 0;
   EXPECT_EQ(count, 2U);

@@ -73,13 +73,34 @@ class KeepTest(KeepTestCase):
         self.media(2, 1)
         self.assertEqual(self.listed("EpisodeReference"), ["2-2.mp3", "1.mp3"])
 
+    def test_a_file_that_cannot_be_fetched_again_stays_listed(self):
+        poster = self.web.serve("/1.png", b"poster")
+        part = element("orvane:image", href=poster)
+        self.publish(self.episode(1, part))
+        self.keep()
+        info = self.info()
+        info["Episodes"][0]["Mine"] = "entry"
+        (self.bundle / "Info.plist").write_bytes(plistlib.dumps(info))
+        (self.bundle / "1.mp3").unlink()
+        self.web.serve("/1.mp3", b"", 404)
+        item = self.episode(1, part, url=self.web.url("/1.mp3"))
+        self.publish(item)
+        self.assertKept(self.keep(), "0 new, 0 known, 1 failed", 1,
+                        f'qel-keep: "Episode 1": {self.web.url("/1.mp3")}: HTTP status 404\n')
+        self.assertEqual(self.info(), info)
+        self.web.serve("/1.mp3", b"media 1")
+        self.assertKept(self.keep(), "1 new, 0 known, 0 failed")
+        self.media(1)
+        self.assertEqual((self.listed("Mine"), self.web.hits("/1.png")), (["entry"], 1))
+
     def test_a_file_that_nobody_has_any_more_is_told(self):
         self.publish(self.episode(1))
         self.keep()
         (self.bundle / "1.mp3").unlink()
         self.publish(self.episode(2))
         self.assertKept(self.keep(), "1 new, 0 known, 0 failed", 1,
-                        'qel-keep: "Episode 1": its file is gone, and the source does not have it any more\n')
+                        'qel-keep: "Episode 1": its file is gone, and the source does not have it any more; '
+                        'put it back, or take its entry out of Info.plist\n')
         self.assertEqual(self.listed(), ["Episode 2", "Episode 1"])
 
     def test_another_file_of_one_url_is_another_episode(self):
@@ -201,6 +222,13 @@ class KeepTest(KeepTestCase):
         result = self.keep("--allow-local")
         self.assertKept(result, "2 new, 1 known, 1 failed", 1, result.stderr.decode())
         self.assertIn(b"secret", contents(self.bundle).values())
+
+    def test_a_url_that_is_not_fetched_is_told_as_such(self):
+        self.publish(self.episode(1, url="ftp://a.example/1.mp3"))
+        for options in ([], ["--allow-local"]):
+            self.assertKept(self.keep(*options), "0 new, 0 known, 1 failed", 1,
+                            'qel-keep: "Episode 1": ftp://a.example/1.mp3: '
+                            "Only http, https and file URLs are fetched\n")
 
     def test_a_feed_on_disk_may_name_local_files(self):
         media = self.write("one.mp3", b"media 1")

@@ -71,6 +71,22 @@ class InterruptedTest(KeepTestCase):
             self.assertEqual(sorted(self.listed("EpisodeReference")), sorted(f"{number}.mp3" for number in range(12)))
             self.assertEqual(len(list(self.bundle.glob("*.mp3"))), len(bodies))
 
+    def test_another_episode_of_one_url_does_not_get_what_a_killed_run_left(self):
+        latest = self.web.serve("/latest.mp3", b"media 1")
+        gate = Gate()
+        self.addCleanup(gate.open)
+        slow = self.web.route("/slow.mp3", lambda exchange: gate.wait())
+        self.publish(self.episode(1, url=latest), self.episode(9, url=slow))
+        process = self.start_keep()
+        eventually(lambda: list(self.bundle.glob("latest.mp3")))
+        process.kill()
+        process.communicate()
+        self.web.serve("/latest.mp3", b"media 2")
+        self.publish(self.episode(2, url=latest))
+        self.assertKept(self.keep(), "1 new, 0 known, 0 failed")
+        self.media(2)
+        self.assertEqual(self.web.hits("/latest.mp3"), 2)
+
     def test_a_signal_ends_a_run_in_order(self):
         for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):
             with self.subTest(number.name):
@@ -101,7 +117,9 @@ class InterruptedTest(KeepTestCase):
         self.publish(self.episode(1), self.episode(2, url=url))
         process = self.start_keep()
         gate.reached()
-        eventually((self.bundle / "Info.plist").exists)
+        self.assertEqual((self.listed(), self.info()["PodcastOrigin"]), ([], self.feed_url))
+        self.assertIsNotNone(self.createfeed(self.bundle).find("channel"))
+        eventually(self.listed)
         self.assertEqual(self.listed(), ["Episode 1"])
         gate.open()
         process.communicate()

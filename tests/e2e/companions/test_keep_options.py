@@ -1,9 +1,10 @@
 """The options of qel-keep, and wrong use of it."""
 
+import subprocess
 import unittest
 
 from keep_support import KeepTestCase
-from support import NO_FEED, element
+from support import NO_FEED, element, environment
 
 
 class OptionsTest(KeepTestCase):
@@ -50,6 +51,16 @@ class OptionsTest(KeepTestCase):
         self.assertEqual((result.status, result.stdout), (2, b""))
         self.assertTrue(result.stderr.startswith(f"qel-keep: {self.bundle}: Info.plist: ".encode()), result.stderr)
         self.assertEqual((self.bundle / "Info.plist").read_bytes(), b"<plist>")
+
+    def test_a_bundle_that_cannot_be_written_is_told_before_anything_is_fetched(self):
+        self.publish(self.episode(1))
+        limited = self.path("limited.podcast")
+        finished = subprocess.run(["sh", "-c", 'ulimit -f 0; trap "" XFSZ; exec "$@"', "sh",
+                                   *self.command(self.feed_url, limited)],
+                                  capture_output=True, env=environment(), timeout=60, check=False)
+        self.assertEqual((finished.returncode, finished.stdout, finished.stderr.decode()),
+                         (2, b"", "qel-keep: could not write Info.plist: File too large\n"))
+        self.assertEqual([request.path for request in self.web.requests], ["/feed.xml"])
 
     def test_a_file_is_no_bundle(self):
         self.bundle.write_bytes(b"")

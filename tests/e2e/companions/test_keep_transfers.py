@@ -1,10 +1,12 @@
 """How qel-keep gets its files from servers that are busy, break off, stall, change their minds or lie."""
 
+import subprocess
 import threading
 import time
 import unittest
 
 from keep_support import KeepTestCase
+from support import element, environment, rss
 
 BODY = bytes(range(256)) * 4096  # a MiB
 STRONG = [("ETag", '"one"')]
@@ -144,6 +146,13 @@ class TransfersTest(KeepTestCase):
         self.assertWhole()
         self.assertEqual(self.requests()[-1].headers.get("range"), "bytes=4000-")
 
+    def test_a_part_of_what_is_not_wanted_any_more_goes(self):
+        self.one(self.breaking_off(times=4, sent=1000))
+        self.assertEqual(self.keep().status, 1)
+        self.publish(self.episode(2, url=self.web.url("/none.mp3")))
+        self.assertEqual(self.keep().status, 1)
+        self.assertNothingHidden()
+
     def test_a_part_without_proof_is_not_gone_on_with(self):
         for headers in [[], [("ETag", 'W/"one"')], [("Last-Modified", "Mon, 01 Jan 2024 00:00:00 GMT"),
                                                     ("Date", "Mon, 01 Jan 2024 00:00:00 GMT")]]:
@@ -154,6 +163,27 @@ class TransfersTest(KeepTestCase):
                 self.assertKept(self.keep(), "1 new, 0 known, 0 failed")
                 self.assertWhole()
                 self.assertEqual([request.headers.get("range") for request in self.requests()], [None, None])
+
+    def test_a_file_that_cannot_be_stored_leaves_no_part(self):
+        self.publish(self.episode(1, url=self.web.route("/1.mp3", self.breaking_off(times=0))), self.episode(2))
+        finished = subprocess.run(["sh", "-c", 'ulimit -f 200; trap "" XFSZ; exec "$@"', "sh",
+                                   *self.command("--quiet", self.feed_url, self.bundle)],
+                                  capture_output=True, env=environment(), timeout=60, check=False)
+        self.assertEqual((finished.returncode, finished.stdout, finished.stderr.decode()),
+                         (1, b"", f'qel-keep: "Episode 1": {self.web.url("/1.mp3")}: File too large\n'))
+        self.media(2)
+        self.assertNothingHidden()
+
+    def test_a_feed_that_stalls_or_is_busy_is_tried_again(self):
+        feed = rss(element("title", "Show"), self.episode(1))
+        answers = iter([lambda exchange: time.sleep(5), lambda exchange: exchange.reply(503, b"busy")])
+
+        def answer(exchange):
+            next(answers, lambda exchange: exchange.reply(200, feed))(exchange)
+        self.web.route("/feed.xml", answer)
+        self.assertKept(self.keep("--stall", "1"), "1 new, 0 known, 0 failed")
+        self.media(1)
+        self.assertEqual(self.web.hits("/feed.xml"), 3)
 
     def test_servers_that_lie_about_a_part_are_not_believed(self):
         half, size = len(BODY) // 2, len(BODY)
