@@ -10,6 +10,7 @@
 #include "platform/files/TemporaryFile.h"
 #include "platform/plist/PropertyListReader.h"
 #include "platform/plist/PropertyListWriter.h"
+#include "platform/text/Case.h"
 
 using platform::Directory;
 using platform::ErrorSlot;
@@ -17,14 +18,17 @@ using platform::FileIdentity;
 using platform::FilePlace;
 
 bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error, Directory::Wait wait) {
-  if (!platform::createDirectories(path, error)) return false;
-  std::optional<Directory> opened = Directory::open(path, error);
-  if (!opened) return false;
-  bundle_ = std::move(*opened);
-  if (bundle_.lock(wait) == Directory::Lock::kHeldByAnother) {
-    error = platform::ErrorRecord{"QELDomain", 2, "Another run is filling it"};
-    return false;
-  }
+  // The directory that was waited for may have been renamed or removed meanwhile.
+  do {
+    if (!platform::createDirectories(path, error)) return false;
+    std::optional<Directory> opened = Directory::open(path, error);
+    if (!opened) return false;
+    bundle_ = std::move(*opened);
+    if (bundle_.lock(wait) == Directory::Lock::kHeldByAnother) {
+      error = platform::ErrorRecord{"QELDomain", 2, "Another run is filling it"};
+      return false;
+    }
+  } while (bundle_.isLocked() && !bundle_.isAt(path));
   platform::removeStaleTemporaryFiles(bundle_);
 
   ErrorSlot ignored;  // a poster that then cannot be saved is warned about
@@ -80,6 +84,7 @@ bool QELBundleDirectory::save(const FilePlace& place, const std::function<bool()
     return false;
   }
   saved_.insert_or_assign(*identity, place);
+  savedNames_.insert_or_assign({place.directory, platform::caseFolded(place.name)}, place.name);
   return true;
 }
 
@@ -87,6 +92,11 @@ bool QELBundleDirectory::isInUse(const FilePlace& place) const {
   const std::optional<FileIdentity> identity = place.directory->identity(place.name);
   if (!identity) return false;
   if (identity == bundle_.identity(std::string(kReferenceFileName))) return true;
+  const auto spelling = savedNames_.find({place.directory, platform::caseFolded(place.name)});
+  if (spelling != savedNames_.end() && spelling->second != place.name &&
+      place.directory->identity(spelling->second) == identity) {
+    return true;
+  }
   const auto found = saved_.find(*identity);
   if (found == saved_.end()) return false;
   // The number of a file that was removed since may have been given to a stranger's.

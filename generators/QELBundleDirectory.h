@@ -6,6 +6,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 
 #include "platform/files/Directory.h"
 #include "platform/plist/PropertyListValue.h"
@@ -70,4 +71,7 @@ class QELBundleDirectory {
   platform::Directory posters_;
   /// What was saved, and where last.
   std::map<platform::FileIdentity, platform::FilePlace> saved_;
+  /// The names of what was saved, by their directory and case folded: a file system that takes two
+  /// for one (FAT) may have forgotten a file's number, and give it another.
+  std::map<std::pair<const platform::Directory*, std::string>, std::string> savedNames_;
 };

@@ -26,6 +26,23 @@ std::optional<FileIdentity> identityOf(int descriptor) {
   return identityOf(status);
 }
 
+/// Whether everyone may make files in it and remove his own alone, as in /tmp.
+bool isOfEveryone(const struct stat& status) {
+  constexpr unsigned kEveryoneHisOwn = S_ISVTX | S_IWOTH;
+  return (status.st_mode & kEveryoneHisOwn) == kEveryoneHisOwn;
+}
+
+/// Whether nobody but this user and root can have put the child under the name; a link can lead to
+/// what is trusted, and still be a stranger's.
+bool isTrusted(int parent, const std::string& name, int child) {
+  struct stat above {};
+  struct stat named {};
+  if (::fstat(parent, &above) != 0) return false;
+  if (!isOfEveryone(above)) return true;
+  return lookAt(parent, name, named) && identityOf(named) == identityOf(child) &&
+         (named.st_uid == ::geteuid() || named.st_uid == 0);
+}
+
 }  // namespace
 
 bool isFileName(const std::string& name) {
@@ -62,6 +79,10 @@ std::optional<Directory> Directory::openOrMake(const std::string& name, ErrorSlo
     if (!child && failure != 0) error = posixError(failure);
   }
   if (!child) return std::nullopt;
+  if (!isTrusted(descriptor(), name, child->descriptor())) {
+    error = posixError(EPERM, "Not a directory of one's own");
+    return std::nullopt;
+  }
   if (!child->isAtOrBelow(*this)) {
     error = posixError(EXDEV, "The link leads out of the directory");
     return std::nullopt;
@@ -86,6 +107,12 @@ bool Directory::isAtOrBelow(const Directory& other) const {
   return goal && current;
 }
 
+bool Directory::isAt(const std::string& path) const {
+  struct stat status {};
+  return path.find('\0') == std::string::npos && ::stat(path.c_str(), &status) == 0 &&
+         identityOf(status) == identityOf(descriptor());
+}
+
 bool Directory::containsLink(const std::string& name) const {
   struct stat status {};
   return lookAt(descriptor(), name, status) && S_ISLNK(status.st_mode);
@@ -105,7 +132,10 @@ std::optional<std::uint64_t> Directory::fileSize(const std::string& name) const 
 
 std::optional<FileAttributes> Directory::attributesForSuccessor(const std::string& name) const {
   struct stat status {};
-  if (!lookAt(descriptor(), name, status) || !S_ISREG(status.st_mode)) return std::nullopt;
+  if (!lookAt(descriptor(), name, status) || !S_ISREG(status.st_mode) ||
+      status.st_uid != ::geteuid()) {
+    return std::nullopt;
+  }
   return FileAttributes{status.st_mode & kPermissions, std::nullopt};
 }
 
@@ -116,12 +146,8 @@ bool Directory::remove(const std::string& name, ErrorSlot& error) const {
 }
 
 Directory::Lock Directory::lock(Wait wait) {
-  constexpr unsigned kEveryoneHisOwn = S_ISVTX | S_IWOTH;
   struct stat status {};
-  if (::fstat(descriptor(), &status) != 0 ||
-      (status.st_mode & kEveryoneHisOwn) == kEveryoneHisOwn) {
-    return Lock::kNotToBeHad;
-  }
+  if (::fstat(descriptor(), &status) != 0 || isOfEveryone(status)) return Lock::kNotToBeHad;
   int result = -1;
   do {
     result = ::flock(descriptor(), wait == Wait::kNot ? LOCK_EX | LOCK_NB : LOCK_EX);

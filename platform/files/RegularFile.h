@@ -14,19 +14,20 @@
 namespace platform {
 
 /// A regular file open for reading. Nothing else is ever opened or waited for: a directory, a
-/// device, a FIFO and a socket fail at once.
+/// device, a FIFO and a socket fail at once, and so does what the kernel makes up (all below /proc
+/// and /sys) and a read that would have to wait.
 class RegularFile {
  public:
   /// Symbolic links are followed. No value, and the slot filled, on failure.
   static std::optional<RegularFile> open(const std::string& path, ErrorSlot& error);
 
   int descriptor() const { return descriptor_.get(); }
-  /// The size when it was opened; some files (in /proc) claim 0 and hold more.
+  /// The size when it was opened; some file systems in user space claim 0 and hold more.
   std::uint64_t size() const { return size_; }
   /// What a copy takes over, of the moment when it was opened.
   const FileAttributes& attributes() const { return attributes_; }
-  /// Whether it is shorter than when it was opened.
-  bool isShorterNow() const;
+  /// Whether its size or its time is another than when it was opened.
+  bool hasChanged() const;
   /// Reads the next bytes: their number, 0 at the end. No value, and the slot filled, on failure.
   std::optional<std::size_t> read(std::span<char> buffer, ErrorSlot& error);
 

@@ -376,8 +376,12 @@ void removeStaleTemporaryFiles(const Directory& directory) {
   while (const dirent* entry = ::readdir(entries.get())) {
     const std::string name = entry->d_name;
     if (!isTemporaryFileName(name) || !directory.fileSize(name)) continue;
-    const FileDescriptor file =
-        FileDescriptor::openAt(directory.descriptor(), name, O_RDWR | O_NONBLOCK | O_NOFOLLOW);
+    constexpr int kFlags = O_NONBLOCK | O_NOFOLLOW;
+    FileDescriptor file = FileDescriptor::openAt(directory.descriptor(), name, O_RDWR | kFlags);
+    // A copy may have the permissions of its original already; only NFS locks no file like that.
+    if (!file.isOpen() && errno == EACCES) {
+      file = FileDescriptor::openAt(directory.descriptor(), name, O_RDONLY | kFlags);
+    }
     if (file.isOpen() && lock(file.get())) ::unlinkat(directory.descriptor(), name.c_str(), 0);
   }
 }

@@ -174,8 +174,8 @@ class Download::FileDownload final : public Transfer {
     const std::optional<std::size_t> length = source_->read(buffer_, error);
     if (!length) return false;
     if (*length == 0) {
-      if (copiedLength_ < source_->size() || source_->isShorterNow()) {
-        error = transferError(CURLE_PARTIAL_FILE, "The file became shorter while it was read");
+      if (copiedLength_ < source_->size() || source_->hasChanged()) {
+        error = transferError(CURLE_PARTIAL_FILE, "The file changed while it was read");
       }
       return false;
     }

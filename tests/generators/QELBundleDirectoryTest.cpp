@@ -132,6 +132,22 @@ TEST_F(QELBundleDirectoryTest, WhatWasThereBeforeIsReplacedUnderWhateverName) {
   EXPECT_EQ(contentOf(path("Show.mp3")), "new");
 }
 
+// Some file systems give a file another number once they have forgotten it.
+TEST_F(QELBundleDirectoryTest, WhatWasSavedIsKnownByItsNameAsWell) {
+  fs::create_directory(path());
+  root_.addFile("bundle/one.mp3", "of an earlier run");
+  open();
+  EXPECT_TRUE(isMediaSaved("show.mp3", "first", "same number"));
+  fs::remove(path("show.mp3"));
+  root_.addFile("bundle/show.mp3", "first");
+  fs::create_hard_link(path("show.mp3"), path("Show.mp3"));
+  EXPECT_FALSE(isMediaSaved("Show.mp3", "second"));
+  EXPECT_EQ(contentOf(path("Show.mp3")), "first");
+  EXPECT_TRUE(isPosterSaved("SHOW.mp3", "poster"));
+  EXPECT_TRUE(isMediaSaved("ONE.mp3", "new"));
+  EXPECT_TRUE(isMediaSaved("one.mp3", "new"));
+}
+
 // The number of a file that is gone may be given to another.
 TEST_F(QELBundleDirectoryTest, WhatIsGoneIsNotInTheWay) {
   open();
@@ -195,6 +211,21 @@ TEST_F(QELBundleDirectoryTest, OneAtATimeFillsIt) {
   open();
   Directory another = *Directory::open(path(), error_);
   EXPECT_EQ(another.lock(Directory::Wait::kNot), Directory::Lock::kHeldByAnother);
+}
+
+// It has been renamed, or removed, while another run held its lock.
+TEST_F(QELBundleDirectoryTest, FillsTheDirectoryThatIsNamedAfterTheWait) {
+  int waits = 0;
+  const Interposed locks(&InterposedCalls::flock, std::function([&](int, int) {
+    if (++waits == 1) fs::rename(path(), root_ / "moved");
+    if (waits == 2) fs::remove_all(path());
+    return 0;
+  }));
+  open();
+  EXPECT_TRUE(isMediaSaved("a.mp3", "media"));
+  EXPECT_EQ(contentOf(path("a.mp3")), "media");
+  EXPECT_THAT(root_.names(), ElementsAre("bundle", "moved"));
+  EXPECT_TRUE(fs::is_empty(root_ / "moved"));
 }
 
 TEST_F(QELBundleDirectoryTest, LeftoversAreRemovedFromBothDirectories) {

@@ -24,7 +24,8 @@ def tearDownModule():
 
 # A directory that cannot be looked at is made, and one that exists is accepted then. One that may not be read is
 # opened all the same, and not listed. Leftovers of earlier runs are removed where that can be done. A "Posters" that
-# is not known to lie inside is not used. What cannot be locked is filled without a lock.
+# is not known to lie inside is not used. What cannot be locked is filled without a lock,
+# and what is not known to be at its path is opened again.
 DIRECTORIES = """
     stat                                    parent       done
     mkdir                                   parent       Could not generate bundle: Could not create bundle: {error}\\n
@@ -33,11 +34,13 @@ DIRECTORIES = """
     opendir                                 bundle       Could not generate bundle: Could not create bundle: {error}\\n
     fstat                                   bundle#1     done
     flock                                   bundle       done
-    fstat                                   bundle#2     leftovers may stay
+    fstat                                   bundle#2     done
+    fstat                                   bundle#3     leftovers may stay
     dup fcntl getdents close                bundle       leftovers may stay
     lseek                                   bundle       done
     lstat reopen flock unlink close         leftover     leftovers may stay
-    fstat                                   bundle#3     posters lost
+    fstat                                   bundle#4     posters lost
+    fstat                                   bundle#5     posters lost
     opendir mkdir                           Posters      posters lost
     fstat                                   Posters#1    posters lost
     opendir fstat                           above        posters lost
@@ -48,7 +51,7 @@ DIRECTORIES = """
     dup fcntl getdents close                Posters      leftovers may stay
     lseek                                   Posters      done
     fstat                                   Posters#4    done
-    fstat                                   bundle#4     done
+    fstat                                   bundle#6     done
     syncfs                                  bundle       reference file lost
     fsync                                   bundle       known too late
 """

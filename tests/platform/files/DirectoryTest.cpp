@@ -240,6 +240,52 @@ TEST_F(DirectoryTest, DirectoriesOfEveryoneAreNotLocked) {
   }
 }
 
+// A neighbour may have made it, to have files put where he wants them.
+TEST_F(DirectoryTest, TakesNothingOfStrangersInDirectoriesOfEveryone) {
+  std::filesystem::create_directories(root_ / "tmp/art");
+  std::filesystem::create_symlink("art", root_ / "tmp/link");
+  const Directory directory = opened(root_ / "tmp");
+  EXPECT_TRUE(directory.openOrMake("link", error_));
+  ::chmod((root_ / "tmp").c_str(), 01777);
+  EXPECT_FALSE(directory.openOrMake("link", error_));
+  EXPECT_EQ(description(), "Not a directory of one's own");
+  EXPECT_TRUE(leadsTo(directory.openOrMake("art", error_), root_ / "tmp/art"));
+  EXPECT_TRUE(leadsTo(directory.openOrMake("new", error_), root_ / "tmp/new"));
+  if (::chown((root_ / "tmp/art").c_str(), 65534, 65534) != 0) GTEST_SKIP() << "root is needed";
+  EXPECT_FALSE(directory.openOrMake("art", error_));
+  EXPECT_EQ(description(), "Not a directory of one's own");
+  EXPECT_TRUE(holdsInChild([&] {
+    ::chmod(root_.path().c_str(), 0755);
+    return ::seteuid(65534) == 0 && directory.openOrMake("art", error_) &&
+           directory.openOrMake("new", error_);
+  }));
+  ::chmod((root_ / "tmp").c_str(), 0777);
+  EXPECT_TRUE(directory.openOrMake("art", error_));
+}
+
+TEST_F(DirectoryTest, SuccessorsTakeNothingOverFromStrangers) {
+  ::chmod(root_.addFile("file", "").c_str(), 0640);
+  const Directory directory = opened(root_.path());
+  const auto attributes = directory.attributesForSuccessor("file");
+  ASSERT_TRUE(attributes);
+  EXPECT_EQ(attributes->mode, 0640U);
+  if (::chown((root_ / "file").c_str(), 65534, 65534) != 0) GTEST_SKIP() << "root is needed";
+  EXPECT_FALSE(directory.attributesForSuccessor("file"));
+}
+
+TEST_F(DirectoryTest, KnowsWhetherAPathStillLeadsToIt) {
+  std::filesystem::create_directory(root_ / "a");
+  std::filesystem::create_symlink("a", root_ / "link");
+  const Directory directory = opened(root_ / "link");
+  EXPECT_TRUE(directory.isAt(root_ / "a"));
+  EXPECT_TRUE(directory.isAt(root_ / "link"));
+  std::filesystem::rename(root_ / "a", root_ / "moved");
+  EXPECT_FALSE(directory.isAt(root_ / "link"));
+  std::filesystem::create_directory(root_ / "a");
+  EXPECT_FALSE(directory.isAt(root_ / "link"));
+  EXPECT_FALSE(Directory().isAt(root_ / "nowhere"));
+}
+
 TEST_F(DirectoryTest, DoesWithoutLocks) {
   Directory directory = opened(root_.path());
   const Interposed locks(&InterposedCalls::flock, std::function([](int, int) {

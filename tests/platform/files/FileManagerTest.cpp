@@ -36,6 +36,13 @@ std::string largeContent(std::size_t size) {
   return content;
 }
 
+/// As of a file system that tells no sizes.
+int statusWithoutSize(int descriptor, struct stat* status) {
+  const int result = ::fstatat(descriptor, "", status, AT_EMPTY_PATH);
+  status->st_size = 0;
+  return result;
+}
+
 class FileManagerTest : public testing::Test {
  protected:
   /// The paths of a FIFO, a socket and a device: all that is neither file nor directory.
@@ -87,10 +94,9 @@ TEST_F(FileManagerTest, ReadsFilesOfAnySizeWhole) {
 }
 
 TEST_F(FileManagerTest, ReadsFilesThatClaimToBeEmpty) {
-  const std::optional<std::string> content = wholeFile("/proc/self/status", error_);
-  ASSERT_TRUE(content);
-  EXPECT_EQ(content->substr(0, 5), "Name:");
-  EXPECT_EQ(content->back(), '\n');
+  const Interposed sizes(&InterposedCalls::fstat, std::function(&statusWithoutSize));
+  const std::string content = largeContent(100000);
+  EXPECT_EQ(wholeFile(directory_.addFile("file", content), error_), content);
 }
 
 TEST_F(FileManagerTest, FailedReadsTellTheCause) {
@@ -188,9 +194,9 @@ TEST_F(FileManagerTest, CopiesThroughLinksAndFilesThatClaimToBeEmpty) {
   EXPECT_FALSE(std::filesystem::is_symlink(directory_ / "copy"));
   EXPECT_EQ(contentOf(directory_ / "copy"), "content");
 
-  EXPECT_TRUE(copyFile("/proc/version", directory_ / "version"));
-  EXPECT_EQ(contentOf(directory_ / "version"), contentOf("/proc/version"));
-  EXPECT_NE(contentOf(directory_ / "version"), "");
+  const Interposed sizes(&InterposedCalls::fstat, std::function(&statusWithoutSize));
+  EXPECT_TRUE(copyFile(directory_ / "source", directory_ / "whole"));
+  EXPECT_EQ(contentOf(directory_ / "whole"), "content");
 }
 
 TEST_F(FileManagerTest, CopiesWhereTheKernelDoesNotHelp) {
@@ -263,14 +269,19 @@ TEST_F(FileManagerTest, CopyOfAFileThatIsCutMeanwhileIsRefused) {
   }
 }
 
-TEST_F(FileManagerTest, CopyOfAFileThatGrowsMeanwhileHasWhatWasFound) {
-  const std::string source = directory_.addFile("source", "content");
-  const Interposed growing(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
-    directory_.addFile("source", "content and more");
-    return ssize_t{0};
-  }));
-  EXPECT_TRUE(copyFile(source, directory_ / "copy"));
-  EXPECT_EQ(contentOf(directory_ / "copy"), "content and more");
+TEST_F(FileManagerTest, CopyOfAFileThatIsWrittenMeanwhileIsRefused) {
+  const std::string source = directory_ / "source";
+  for (const char* content : {"content and more", "another"}) {
+    directory_.addFile("source", "content");
+    const std::array<timespec, 2> times = {timespec{5, 0}, timespec{5, 0}};
+    ASSERT_EQ(::utimensat(AT_FDCWD, source.c_str(), times.data(), 0), 0);
+    const Interposed writer(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+      directory_.addFile("source", content);
+      return ssize_t{0};
+    }));
+    EXPECT_FALSE(copyFile(source, directory_ / "copy")) << content;
+    EXPECT_THAT(directory_.names(), ElementsAre("source"));
+  }
 }
 
 TEST_F(FileManagerTest, CopyIsOnTheDiskBeforeItHasItsName) {

@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <array>
@@ -11,7 +12,9 @@
 #include <functional>
 #include <string>
 
+#include "tests/support/ChildProcess.h"
 #include "tests/support/InterposedCalls.h"
+#include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace platform {
@@ -60,6 +63,39 @@ TEST_F(RegularFileTest, WhatTakesItsPlaceIsRefused) {
   std::filesystem::remove(directory_ / "file");
   EXPECT_EQ(errorAfter([](const char* path) { ::mkdir(path, 0700); }),
             (ErrorRecord{"POSIX", EISDIR, "Is a directory"}));
+}
+
+TEST_F(RegularFileTest, WhatTheKernelMakesUpIsRefused) {
+  const std::string link = directory_ / "link";
+  std::filesystem::create_symlink("/proc/self/environ", link);
+  for (const std::string& path :
+       {std::string("/proc/self/environ"), std::string("/proc/version"), link}) {
+    ErrorSlot error;
+    EXPECT_FALSE(RegularFile::open(path, error));
+    EXPECT_EQ(error, (ErrorRecord{"POSIX", EINVAL, "Not a stored file"})) << path;
+  }
+}
+
+TEST_F(RegularFileTest, LinksOfTheKernelLeadToStoredFiles) {
+  const FileDescriptor opened =
+      FileDescriptor::open(directory_.addFile("file", "content"), O_RDONLY);
+  ErrorSlot error;
+  const auto file = RegularFile::open("/proc/self/fd/" + std::to_string(opened.get()), error);
+  ASSERT_TRUE(file);
+  EXPECT_EQ(file->size(), 7U);
+}
+
+TEST_F(RegularFileTest, NothingIsWaitedFor) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  ErrorSlot error;
+  auto file = RegularFile::open(directory_.addFile("file", "content"), error);
+  ASSERT_TRUE(file);
+  EXPECT_TRUE(holdsInChild([&] {
+    ::alarm(10);
+    std::array<char, 3> buffer{};
+    return refuseSystemCall(SYS_read, EAGAIN) && !file->read(buffer, error) &&
+           error == ErrorRecord{"POSIX", EAGAIN, "Resource temporarily unavailable"};
+  }));
 }
 
 TEST_F(RegularFileTest, FileThatCannotBeLookedAtIsRefused) {

@@ -173,6 +173,21 @@ TEST_F(TemporaryFileInDirectoryTest, StaleFilesAreFoundTwice) {
   }
 }
 
+// One that was killed right after it had got the permissions of its original.
+TEST_F(TemporaryFileInDirectoryTest, StaleFilesThatMayOnlyBeReadAreRemoved) {
+  const std::string stale = directory_.addFile(".qel-0123456789abcdef.part", "stale");
+  ::chmod(stale.c_str(), 0444);
+  ::chmod(directory_.path().c_str(), 0777);
+  EXPECT_TRUE(holdsInChild([&] {
+    if (::geteuid() == 0 && (::chown(stale.c_str(), 65534, 65534) != 0 || ::seteuid(65534) != 0)) {
+      return false;
+    }
+    removeStaleTemporaryFiles(open_);
+    return true;
+  }));
+  EXPECT_THAT(directory_.names(), IsEmpty());
+}
+
 /// Whether the signal, by itself, ends a process without being about a fault of its own.
 bool endsFromOutside(int signal) {
   const std::array kOthers = {SIGABRT, SIGBUS,   SIGFPE,  SIGILL,  SIGSEGV, SIGSYS,

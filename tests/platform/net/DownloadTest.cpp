@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 
 #include <chrono>
 #include <csignal>
@@ -18,6 +19,7 @@
 #include "tests/support/ChildProcess.h"
 #include "tests/support/GzipSamples.h"
 #include "tests/support/HTTPTestServer.h"
+#include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace platform {
@@ -210,15 +212,20 @@ TEST_F(DownloadTest, MissingDirectoryIsAFailure) {
   server_.serve("/media", HTTPTestServer::response("media"));
   EXPECT_THAT(download(server_.url("/media"), directory_ / "none/media.mp3"),
               ElementsAre("failed: POSIX 2: No such file or directory"));
-  EXPECT_THAT(download("file:///proc/self/status", directory_ / "none/media.mp3"),
-              ElementsAre("failed: POSIX 2: No such file or directory"));
+  EXPECT_THAT(
+      download(fileURLText(directory_.addFile("source", "media")), directory_ / "none/media.mp3"),
+      ElementsAre("failed: POSIX 2: No such file or directory"));
 }
 
 TEST_F(DownloadTest, FileThatCannotBeReadToItsEndIsAFailure) {
-  // At its start no process has memory.
-  EXPECT_THAT(download("file:///proc/self/mem"),
-              ElementsAre("response 0", "failed: POSIX 5: Input/output error"));
-  EXPECT_THAT(directory_.names(), ElementsAre());
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  const std::string source = directory_.addFile("source", "media");
+  EXPECT_TRUE(holdsInChild([&] {
+    return refuseSystemCall(SYS_read, EIO) &&
+           download(fileURLText(source)) ==
+               std::vector<std::string>{"response 5", "failed: POSIX 5: Input/output error"};
+  }));
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
 }
 
 TEST_F(DownloadTest, DirectoryAtTheDestinationIsAFailure) {
@@ -335,8 +342,19 @@ TEST_F(DownloadTest, FileThatBecomesShorterIsAFailure) {
   while (recorder.total == 0) ASSERT_TRUE(runEventLoopOnce());
   std::filesystem::resize_file(source, 10);
   while (!recorder.ended && runEventLoopOnce()) continue;
-  EXPECT_EQ(recorder.events.back(),
-            "failed: transfer 18: The file became shorter while it was read");
+  EXPECT_EQ(recorder.events.back(), "failed: transfer 18: The file changed while it was read");
+  EXPECT_THAT(directory_.names(), ElementsAre("source"));
+}
+
+TEST_F(DownloadTest, FileThatIsCutAndFilledAgainIsAFailure) {
+  const std::string source = directory_.addFile("source", std::string(1'000'000, 'x'));
+  std::filesystem::last_write_time(source, std::filesystem::file_time_type());
+  Recorder recorder;
+  const Download download(urlOf(fileURLText(source)), destination_, recorder);
+  while (recorder.total == 0) ASSERT_TRUE(runEventLoopOnce());
+  directory_.addFile("source", std::string(1'000'000, 'y'));
+  while (!recorder.ended && runEventLoopOnce()) continue;
+  EXPECT_EQ(recorder.events.back(), "failed: transfer 18: The file changed while it was read");
   EXPECT_THAT(directory_.names(), ElementsAre("source"));
 }
 
