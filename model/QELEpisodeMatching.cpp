@@ -4,6 +4,8 @@
 #include <map>
 #include <string>
 
+#include "platform/text/Case.h"
+
 namespace {
 
 using Identity = QELEpisodeIdentity;
@@ -23,7 +25,7 @@ std::string written(const std::optional<std::chrono::seconds>& date) {
 }
 
 Sign uuidSign(const Identity& episode) {
-  return episode.uuid ? Sign(episode.uuid->string()) : std::nullopt;
+  return episode.uuid ? Sign(platform::lowercased(*episode.uuid)) : std::nullopt;
 }
 Sign originTitleDateSign(const Identity& episode) {
   if (!episode.origin) return std::nullopt;

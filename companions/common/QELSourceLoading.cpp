@@ -5,8 +5,33 @@
 
 #include "cli/QELSourceResolution.h"
 #include "cli/common/QELError.h"
+#include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
+#include "platform/net/URLFault.h"
 #include "platform/text/Case.h"
+
+namespace {
+
+/// What is wrong with the name of a source that is none.
+std::string faultOf(const std::string& source) {
+  if (platform::looksLikeURL(source) && !QELIsOnNetwork(source)) {
+    return "a URL begins with http:, https: or file:, in lower case";
+  }
+  if (platform::fileExists(source)) {
+    return "it is no reference file or bundle; a feed on the disk is named by a file:/// URL";
+  }
+  return "it is no feed, and no reference file or bundle that can be read";
+}
+
+/// The location, a local one below the directory.
+platform::OptionalText below(const std::string& directory, const QELMediaReference& reference) {
+  const platform::OptionalText& location = reference.location;
+  if (!location || location->empty() || reference.isRemote) return location;
+  if (location->view().starts_with("/") || platform::looksLikeURL(*location)) return location;
+  return platform::joinedPath(directory, *location);
+}
+
+}  // namespace
 
 bool QELIsOnNetwork(const std::string& source) {
   return source.starts_with("http") || source.starts_with("pcast");
@@ -26,16 +51,19 @@ std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
     made = initWithSourceString(source, {directory.prefix}, stallLimit);
   }
   if (!made) {
-    error = QELError(1, "it is no feed, and no reference file or bundle that can be read");
+    error = QELError(1, faultOf(source));
     return nullptr;
   }
   if (!made->loadSourceWithError(error)) return nullptr;
+  if (QELIsOnNetwork(source) || source.starts_with("file:")) return made;
   const bool isBundle = platform::lowercased(platform::pathExtension(source)) == "podcast";
-  if (!isBundle || QELIsOnNetwork(source) || !made->episodes()) return made;
+  const std::string folder =
+      isBundle ? source : std::filesystem::path(QELLastingSource(source)).parent_path().string();
+  if (!isBundle) made->setPosterLocation(below(folder, made->posterReference()));
+  if (!made->episodes()) return made;
   for (const auto& episode : *made->episodes()) {
-    const QELMediaReference poster = episode->posterReference();
-    if (!poster.location || poster.location->empty() || poster.isRemote) continue;
-    episode->setPosterLocation(platform::joinedPath(source, *poster.location));
+    if (!isBundle) episode->setLocation(below(folder, episode->mediaReference()));
+    episode->setPosterLocation(below(folder, episode->posterReference()));
   }
   return made;
 }

@@ -15,8 +15,10 @@ std::string QELLastingSource(const std::string& source);
 
 /// The source that the name stands for, loaded, with the elements of the podcast directory read
 /// under that one's prefix. Unlike those of a bundle source as such, posters of a bundle's episodes
-/// have paths that lead to them. A feed's server that sends no byte for `stallLimit` seconds is
-/// given up. Null, and the slot filled, when it cannot be loaded.
+/// have paths that lead to them, and the relative paths of a reference file are taken to begin in
+/// its directory, so that they lead to the same from any working directory. A feed's server that
+/// sends no byte for `stallLimit` seconds is given up. Null, and the slot filled, when it cannot be
+/// loaded.
 std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
                                                   const QELDirectory& directory, int stallLimit,
                                                   platform::ErrorSlot& error);

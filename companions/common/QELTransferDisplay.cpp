@@ -67,7 +67,7 @@ QELTransferDisplay::QELTransferDisplay(std::optional<std::size_t> columns, platf
 
 void QELTransferDisplay::print(std::string_view line) {
   clear();
-  sink_((columns_ ? platform::harmlessText(line) : std::string(line)) + "\n");
+  sink_(platform::harmlessText(line) + "\n");
 }
 
 bool QELTransferDisplay::wantsDrawing(Clock::time_point now) const {

@@ -199,6 +199,26 @@ class KeepTest(KeepTestCase):
         self.assertEqual((self.bundle / "one.mp3").stat().st_mode & 0o777, 0o600)
         self.assertKept(self.keep(source=None), "0 new, 2 known, 0 failed")
 
+    def test_relative_paths_of_a_reference_file_begin_in_its_directory(self):
+        folder = self.path("folder")
+        folder.mkdir()
+        for name, content in [("1.mp3", b"media 1"), ("1.png", b"poster")]:
+            (folder / name).write_bytes(content)
+        (folder / "show.plist").write_bytes(plistlib.dumps({"PodcastName": "Mine", "Episodes": [
+            {"EpisodeName": "Episode 1", "EpisodeReference": "1.mp3", "EpisodePosterReference": "1.png"}]}))
+        self.assertKept(self.keep(source="folder/show.plist"), "1 new, 0 known, 0 failed")
+        self.media(1)
+        self.assertEqual(self.listed("EpisodePosterReference"), ["Posters/1.png"])
+        self.assertKept(self.keep(source=None), "0 new, 1 known, 0 failed")
+
+    def test_the_case_of_uuids_does_not_matter(self):
+        for case in (str.upper, str.lower):
+            source = self.reference({"Episodes": [{
+                "EpisodeName": case("one"), "EpisodeReference": self.web.serve(f"/{case('a')}.mp3", b"media"),
+                "EpisodeUUID": case("6d0f3c3e-0f5c-4f0a-9a3b-0c6a4a1f2b7d")}]})
+            result = self.keep(source=source)
+        self.assertKept(result, "0 new, 1 known, 0 failed")
+
     def test_a_bundle_is_kept_in_another(self):
         poster = self.web.serve("/1.png", b"poster")
         self.publish(self.episode(1, element("orvane:image", href=poster)))

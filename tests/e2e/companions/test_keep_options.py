@@ -39,6 +39,9 @@ class OptionsTest(KeepTestCase):
         for source, cause in [(self.web.url("/none.xml"), "HTTP status 404"),
                               (self.web.url("/page.html"), NO_FEED.partition(": ")[2]),
                               ("none.plist", nothing),
+                              (self.write("feed.xml", b"<rss/>"), "it is no reference file or bundle; "
+                               "a feed on the disk is named by a file:/// URL"),
+                              ("HTTP://a.example/", "a URL begins with http:, https: or file:, in lower case"),
                               ("http://a b/", nothing)]:
             with self.subTest(source):
                 self.assertRefused(self.keep(source=source), f"{source}: {cause}")
@@ -91,6 +94,12 @@ class OptionsTest(KeepTestCase):
         self.assertIn('would not fetch "Episode 5" from /etc/passwd: A feed of the network names a local file, '
                       "see --allow-local\n", result.stdout.decode())
         self.assertEqual((self.bundle / "Info.plist").read_bytes(), before)
+
+    def test_a_title_of_two_lines_is_told_in_one(self):
+        self.publish(self.episode(1, title="One\nTwo"))
+        for options, line in [(["-n"], f'would fetch "One\ufffdTwo" from {self.web.url("/1.mp3")}'),
+                              ([], 'fetched "One\ufffdTwo": 1.mp3 (7 B)')]:
+            self.assertEqual(self.keep(*options).stdout.decode().splitlines()[:-1], [line])
 
     def test_quiet_prints_failures_alone(self):
         self.publish(self.episode(1), self.episode(2, url=self.web.url("/none")))
