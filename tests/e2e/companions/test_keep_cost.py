@@ -1,8 +1,9 @@
-"""What keeping a show costs: the time of many small files, and time and memory where nothing is new."""
+"""What keeping a show costs: transfers at once for many small files, and memory."""
 
 import os
 import plistlib
 import subprocess
+import threading
 import time
 import unittest
 
@@ -11,26 +12,31 @@ from support import element, environment, is_sanitized, item
 
 
 class CostTest(KeepTestCase):
-    def timed(self, *arguments):
-        """The seconds and the peak of memory (bytes) of a run that does well."""
-        start = time.monotonic()
+    def peak(self, *arguments):
+        """The peak of memory (bytes) of a run that does well."""
         process = subprocess.Popen(self.command(*arguments), stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
                                    env=environment())
         _, status, usage = os.wait4(process.pid, 0)
         process.returncode = os.waitstatus_to_exitcode(status)
         self.assertEqual(process.returncode, 0)
-        return time.monotonic() - start, usage.ru_maxrss * 1024
+        return usage.ru_maxrss * 1024
 
-    def test_files_come_as_fast_as_the_wire(self):
+    def test_as_many_files_come_at_once_as_there_are_jobs(self):
         body = os.urandom(100_000)
+        lock = threading.Lock()
+        running = [0]
 
         def answer(exchange):
+            with lock:
+                running.append(running[-1] + 1)
             time.sleep(0.1)
+            with lock:
+                running.append(running[-1] - 1)
             exchange.reply(200, body)
-        self.publish(*(self.episode(number, url=self.web.route(f"/{number}.mp3", answer)) for number in range(200)))
-        seconds, _ = self.timed(self.feed_url, self.bundle)
-        self.assertEqual(len(self.listed()), 200)
-        self.assertLess(seconds, 6 if not is_sanitized() else 12)
+        self.publish(*(self.episode(number, url=self.web.route(f"/{number}.mp3", answer)) for number in range(50)))
+        self.peak(self.feed_url, self.bundle)
+        self.assertEqual(len(self.listed()), 50)
+        self.assertEqual(max(running), 4)
 
     def test_known_episodes_cost_little(self):
         count = 20_000
@@ -46,13 +52,12 @@ class CostTest(KeepTestCase):
             entries.append({"EpisodeName": f"Episode {number}", "EpisodeOrigin": f"{url}{number}.mp3",
                             "EpisodeReference": f"{number}.mp3", "EpisodeReferenceType": "local"})
         (self.bundle / "Info.plist").write_bytes(plistlib.dumps({"Episodes": entries}))
-        self.timed(self.feed_url, self.bundle)  # takes over what the source says
+        self.peak(self.feed_url, self.bundle)  # takes over what the source says
         before = (self.bundle / "Info.plist").stat().st_mtime_ns
-        seconds, memory = self.timed(self.feed_url, self.bundle)
+        memory = self.peak(self.feed_url, self.bundle)
         self.assertEqual((self.bundle / "Info.plist").stat().st_mtime_ns, before)
         self.assertEqual(len(self.listed()), count)
         if not is_sanitized():
-            self.assertLess(seconds, 2)
             self.assertLess(memory, 200_000_000)
 
     def test_memory_does_not_grow_with_media(self):
@@ -65,7 +70,7 @@ class CostTest(KeepTestCase):
                     exchange.send(piece)
             self.bundle = self.path(f"{count}.podcast")
             self.publish(self.episode(1, url=self.web.route("/1.mp3", answer)))
-            _, sizes[count] = self.timed(self.feed_url, self.bundle)
+            sizes[count] = self.peak(self.feed_url, self.bundle)
         self.assertLess(sizes[64] - sizes[1], 4_000_000)
 
 

@@ -96,10 +96,8 @@ class InterruptedTest(KeepTestCase):
                 process = self.start_keep()
                 eventually(lambda: list(self.bundle.glob("1.mp3")) and list(self.bundle.glob(".qel-keep-*.note")))
                 time.sleep(0.5)
-                start = time.monotonic()
                 process.send_signal(number)
                 output, errors = process.communicate(timeout=60)
-                self.assertLess(time.monotonic() - start, 2)
                 self.assertEqual((process.returncode, output.splitlines()[-1], errors),
                                  (-number, b"1 new, 0 known, 0 failed",
                                   b"qel-keep: interrupted; the next run goes on\n"))
