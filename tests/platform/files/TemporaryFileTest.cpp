@@ -362,12 +362,13 @@ TEST_F(TemporaryFileTest, OnlyHiddenFilesOfOursAreStale) {
 TEST_F(TemporaryFileTest, StaleFilesThatCannotBeOpenedStay) {
   directory_.addFile(".qel-0123456789abcdef.part", "stale");
   EXPECT_TRUE(holdsInChild([&] {
-    // The directory takes the last descriptor that is to be had.
+    const std::optional<Directory> directory = Directory::open(directory_.path(), error_);
+    // The list of the directory takes the last descriptor that is to be had.
     const FileDescriptor next(::dup(STDIN_FILENO));
     const rlim_t count = static_cast<rlim_t>(next.get()) + 2;
     const rlimit limit{count, count};
     ::setrlimit(RLIMIT_NOFILE, &limit);
-    removeStale();
+    removeStaleTemporaryFiles(*directory);
     return true;
   }));
   EXPECT_THAT(directory_.names(), ElementsAre(".qel-0123456789abcdef.part"));
