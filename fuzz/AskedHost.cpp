@@ -56,7 +56,9 @@ Server shownServer(std::string_view url) {
   url.remove_prefix(url.rfind('@') + 1);  // none is the last position there is
   const std::size_t colon = url.find(':', url.starts_with('[') ? url.find(']') : 0);
   const bool hasPort = colon != std::string_view::npos;
-  return {normalised(platform::percentDecoded(url.substr(0, colon))),
+  // In an address a "%" begins the zone.
+  const std::string host(url.substr(0, colon));
+  return {normalised(host.starts_with('[') ? host : platform::percentDecoded(host)),
           hasPort ? withoutZeros(url.substr(colon + 1)) : ""};
 }
 
