@@ -114,13 +114,6 @@ std::function<bool(const std::string&)> QELTakeNumber(std::int64_t& number, std:
   };
 }
 
-std::function<bool(const std::string&)> QELTakeText(std::optional<std::string>& text) {
-  return [&text](const std::string& value) {
-    text = value;
-    return !value.empty();
-  };
-}
-
 std::function<bool(const std::string&)> QELTakeDirectory(QELDirectory& directory) {
   return [&directory](const std::string& value) {
     const std::size_t equals = value.find('=');

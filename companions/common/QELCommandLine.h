@@ -76,5 +76,3 @@ std::function<bool(const std::string&)> QELTakeLanguage(std::optional<std::strin
 /// A `take` that stores "NAME=URI": NAME is a prefix of XML that stands for nothing else in our
 /// feeds, URI an absolute one.
 std::function<bool(const std::string&)> QELTakeDirectory(QELDirectory& directory);
-/// A `take` that stores the text, which is not to be empty.
-std::function<bool(const std::string&)> QELTakeText(std::optional<std::string>& text);

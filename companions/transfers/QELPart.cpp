@@ -10,6 +10,7 @@
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
 #include "platform/files/TemporaryFile.h"
+#include "platform/process/SystemStart.h"
 #include "platform/text/ASCII.h"
 #include "platform/text/Splitting.h"
 
@@ -44,16 +45,17 @@ QELPart::QELPart(const platform::Directory& directory, std::string path, const s
       name_(std::string(kPrefix) + digest(file_) + ".part"),
       noteName_(std::string(kPrefix) + digest(file_) + ".note") {}
 
-/// Which start of the system this is, as Linux names it, and what the part is of.
+/// Which start of the system this is, and what the part is of.
 std::string QELPart::noteBeginning() const {
-  return contentOf("/proc/sys/kernel/random/boot_id") + file_ + "\n";
+  return platform::systemStart().append("\n").append(file_).append("\n");
 }
 
 /// Validator, name and size as they were noted; empty when nothing of use was.
 std::vector<std::string> QELPart::noted() const {
   const std::string note = contentOf(platform::joinedPath(path_, noteName_));
   const std::string beginning = noteBeginning();
-  if (!note.starts_with(beginning)) return {};
+  // Where the system tells no start of its own from another, nothing vouches for a part.
+  if (!note.starts_with(beginning) || note.starts_with('\n')) return {};
   std::vector<std::string> lines;
   for (const std::string_view line :
        platform::splitAt(std::string_view(note).substr(beginning.size()), '\n')) {

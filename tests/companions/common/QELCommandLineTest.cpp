@@ -26,7 +26,7 @@ Outcome outcomeOf(const std::vector<const char*>& arguments) {
   QELCommandLine commandLine("qel-try", "[OPTION]... FILE", "Tries.",
                              {{"quiet", 'q', "", "say less", QELTakeFlag(outcome.quiet)},
                               {"jobs", 'j', "N", "so many at once", QELTakeNumber(outcome.jobs, 1)},
-                              {"link", '\0', "URL", "the page", QELTakeText(outcome.link)}});
+                              {"link", '\0', "URL", "the page", QELTakeURL(outcome.link)}});
   testing::internal::CaptureStdout();
   testing::internal::CaptureStderr();
   outcome.status = commandLine.parse(arguments);
@@ -38,11 +38,11 @@ Outcome outcomeOf(const std::vector<const char*>& arguments) {
 }
 
 TEST(QELCommandLineTest, OptionsAndOperandsAreTaken) {
-  const Outcome outcome = outcomeOf({"one", "-q", "--jobs=7", "two", "--link", "l"});
+  const Outcome outcome = outcomeOf({"one", "-q", "--jobs=7", "two", "--link", "http://l/"});
   EXPECT_EQ(std::nullopt, outcome.status);
   EXPECT_TRUE(outcome.quiet);
   EXPECT_EQ(7, outcome.jobs);
-  EXPECT_EQ("l", outcome.link);
+  EXPECT_EQ("http://l/", outcome.link);
   EXPECT_EQ((std::vector<std::string>{"one", "two"}), outcome.operands);
 }
 

@@ -6,6 +6,7 @@
 #include <optional>
 #include <string>
 
+#include "platform/process/SystemStart.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace {
@@ -48,7 +49,10 @@ TEST_F(QELPartTest, ANoteOfAnotherURLOrAnotherStartVouchesForNothing) {
   one.note("\"tag\"", "1.mp3", 5);
   const std::string note = ".qel-keep-115081c6eee022e7.note";
   std::string content = contentOf(root_ / note);
-  write(note, std::string("x").append(content));
+  const std::string start = platform::systemStart();
+  ASSERT_NE(start, "");
+  ASSERT_TRUE(content.starts_with(start + "\n")) << content;
+  write(note, std::string(start.size(), '0').append(content, start.size()));
   EXPECT_EQ(one.validator(), "");
   write(note, content);
   EXPECT_EQ(one.validator(), "\"tag\"");
