@@ -165,3 +165,28 @@ class CompletionTestCase(ToolTestCase):
         for (line, expected), (_, completed) in zip(rows, results):
             with self.subTest(line):
                 self.assertEqual(completed, expected)
+
+
+class CompanionCompletions:
+    """The tests of a program with long options; a test case is to be made of it, CompletionTestCase and its tables."""
+
+    LONG = []  # its long options
+    OFFERS = []  # a line up to the cursor, and what is offered there
+    OFFERS_BUT_OF_ZSH = []  # which offers options where nothing else can stand
+    LINES = []  # a line up to the cursor, and what becomes of it
+
+    def offers(self):
+        return [*self.OFFERS, *self.OFFERS_BUT_OF_ZSH, (f"{self.PROGRAM} --", self.LONG)]
+
+    def test_bash(self):
+        self.check_offers("bash", self.offers())
+        self.record.unlink()
+        self.check_lines("bash", self.LINES)
+
+    def test_zsh(self):
+        self.check_offers("zsh", self.OFFERS)
+        self.record.unlink()
+        self.check_lines("zsh", self.LINES)
+
+    def test_fish(self):
+        self.check_offers("fish", self.offers())
