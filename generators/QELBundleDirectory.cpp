@@ -6,6 +6,7 @@
 #include "generators/QELBundleNames.h"
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
+#include "platform/files/PortablePaths.h"
 #include "platform/files/RegularFile.h"
 #include "platform/files/TemporaryFile.h"
 #include "platform/plist/PropertyListReader.h"
@@ -57,9 +58,10 @@ std::optional<platform::Dictionary> QELBundleDirectory::readReferenceFile(const 
 
 std::optional<std::uint64_t> QELBundleDirectory::sizeOfFile(
     const std::string& path, const platform::OptionalText& reference) {
-  if (!reference || reference->empty()) return std::nullopt;
+  const auto name = reference ? platform::pathInside(*reference) : std::nullopt;
+  if (!name || name->empty() || *name == kReferenceFileName) return std::nullopt;
   ErrorSlot ignored;
-  const auto file = platform::RegularFile::open(platform::joinedPath(path, *reference), ignored);
+  const auto file = platform::RegularFile::open(platform::joinedPath(path, *name), ignored);
   return file && file->size() > 0 ? std::optional(file->size()) : std::nullopt;
 }
 

@@ -44,7 +44,8 @@ class QELBundleDirectory {
   static std::optional<platform::Dictionary> readReferenceFile(const std::string& path,
                                                                platform::ErrorSlot& error);
   /// The size of the file to which a reference in that dictionary leads, in bytes. Absent when it
-  /// is not there, or is no regular file; an empty one is as good as none.
+  /// is not there, is no regular file, lies outside of the bundle or is the reference file itself;
+  /// an empty one is as good as none.
   static std::optional<std::uint64_t> sizeOfFile(const std::string& path,
                                                  const platform::OptionalText& reference);
 

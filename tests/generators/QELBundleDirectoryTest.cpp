@@ -105,6 +105,11 @@ TEST_F(QELBundleDirectoryTest, FilesOfReferencesHaveSizes) {
   root_.addFile("bundle/one.mp3", "one");
   root_.addFile("bundle/empty.mp3", "");
   EXPECT_EQ(QELBundleDirectory::sizeOfFile(path(), "one.mp3"), 3U);
+  root_.addFile("outside", "stranger's");
+  root_.addFile("bundle/Info.plist", "<plist/>");
+  for (const char* none : {"../outside", "Posters/../../outside", "Info.plist", "./Info.plist"}) {
+    EXPECT_EQ(QELBundleDirectory::sizeOfFile(path(), none), std::nullopt) << none;
+  }
   for (const platform::OptionalText& none :
        {platform::OptionalText(), platform::OptionalText(""), platform::OptionalText("empty.mp3"),
         platform::OptionalText("Posters"), platform::OptionalText("missing")}) {
