@@ -1,10 +1,9 @@
 """The options of qel-keep, and wrong use of it."""
 
-import subprocess
 import unittest
 
 from keep_support import KeepTestCase
-from support import NO_FEED, element, environment
+from support import NO_FEED, element
 
 
 class OptionsTest(KeepTestCase):
@@ -57,12 +56,8 @@ class OptionsTest(KeepTestCase):
 
     def test_a_bundle_that_cannot_be_written_is_told_before_anything_is_fetched(self):
         self.publish(self.episode(1))
-        limited = self.path("limited.podcast")
-        finished = subprocess.run(["sh", "-c", 'ulimit -f 0; trap "" XFSZ; exec "$@"', "sh",
-                                   *self.command(self.feed_url, limited)],
-                                  capture_output=True, env=environment(), timeout=60, check=False)
-        self.assertEqual((finished.returncode, finished.stdout, finished.stderr.decode()),
-                         (2, b"", "qel-keep: could not write Info.plist: File too large\n"))
+        self.assertRefused(self.run_keep(self.feed_url, self.path("limited.podcast"), blocks=0),
+                           "could not write Info.plist: File too large")
         self.assertEqual([request.path for request in self.web.requests], ["/feed.xml"])
 
     def test_a_file_is_no_bundle(self):
