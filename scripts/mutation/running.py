@@ -34,6 +34,7 @@ class Test:
                        "GTEST_FAIL_FAST": "1"}
 
         def limit():
+            signal.signal(signal.SIGINT, signal.SIG_DFL)  # a shell that started this behind its back ignores it
             resource.setrlimit(resource.RLIMIT_AS, (MEMORY, MEMORY))
             resource.setrlimit(resource.RLIMIT_FSIZE, (FILE_SIZE, FILE_SIZE))
             resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
