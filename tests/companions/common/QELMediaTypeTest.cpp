@@ -15,4 +15,15 @@ TEST(QELMediaTypeTest, ExtensionsTellTypes) {
   }
 }
 
+TEST(QELMediaTypeTest, TellsWhatIsNoMediaType) {
+  for (const char* type :
+       {"audio/mpeg", "x/y", "audio/ogg; codecs=opus", "audio/mpeg ", "application/epub+zip"}) {
+    EXPECT_TRUE(QELIsMediaType(type)) << type;
+  }
+  for (const char* type : {"", "mp3", "/", "/mpeg", "audio/", "audio//mpeg", "audio/ mpeg",
+                           "audio /mpeg", " audio/mpeg", "audio/\t", "audio/\r", "audio/\n"}) {
+    EXPECT_FALSE(QELIsMediaType(type)) << type;
+  }
+}
+
 }  // namespace
