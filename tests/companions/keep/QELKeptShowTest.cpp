@@ -93,11 +93,12 @@ TEST_F(QELKeptShowTest, WhatIsNoListOfEpisodesIsDropped) {
 }
 
 TEST_F(QELKeptShowTest, ASourceWithoutEpisodesTakesNoneAway) {
-  QELKeptShow show(listOf({entryOf("one", "1"), entryOf("two")}), directory_, path_);
+  const Dictionary three = dictionaryOf({{"EpisodeName", "three"}});  // and no file
+  QELKeptShow show(listOf({entryOf("one", "1"), entryOf("two"), three}), directory_, path_);
   show.update(source_, kOrigin, {}, false);
-  EXPECT_EQ(episodesOf(show).size(), 2U);
+  EXPECT_EQ(episodesOf(show).size(), 3U);
   EXPECT_EQ(show.knownCount(), 0U);
-  EXPECT_THAT(show.lostTitles(), ElementsAre("\"two\""));
+  EXPECT_THAT(show.lostTitles(), ElementsAre("\"two\"", "\"three\""));
   EXPECT_THAT(show.fetches(), IsEmpty());
 }
 

@@ -122,6 +122,15 @@ TEST_F(QELPublicationTest, TheRootMayEndInASlashAndNeedNotExist) {
   EXPECT_EQ(episode->location(), std::nullopt);
 }
 
+TEST_F(QELPublicationTest, TheRootMayBeALinkToAllFiles) {
+  std::filesystem::create_symlink("/", directory_ / "all");
+  const std::string file =
+      std::filesystem::canonical(directory_.addFile("a.mp3", "12345")).string();
+  const auto episode = addEpisode(directory_ / "a.mp3");
+  EXPECT_THAT(preparedWith(directory_ / "all"), IsEmpty());
+  EXPECT_EQ(episode->location(), kBase + file.substr(1));
+}
+
 TEST_F(QELPublicationTest, TheRootItselfIsNoFileOfTheShow) {
   for (const std::string& root : {directory_.path(), std::string()}) {
     const auto episode = addEpisode(root + "/");

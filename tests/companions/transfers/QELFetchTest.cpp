@@ -89,6 +89,16 @@ TEST_F(QELFetchTest, OneThatIsCancelledGoesOnWithItsPart) {
   EXPECT_EQ(contentOf(directory_ / "1.mp3"), "first last");
 }
 
+TEST_F(QELFetchTest, OneThatIsCancelledLeavesNoPartThatNothingVouchesFor) {
+  server_.serve("/", std::string(kHalf) + "\r\nfirst");
+  QELFetch fetch = download();
+  fetch.start(5);
+  while (fetch.progress().received < 5 && platform::runEventLoopOnce()) continue;
+  EXPECT_EQ(contentOf(directory_ / fetch.partName()), "first");
+  fetch.cancel();
+  EXPECT_THAT(directory_.names(), IsEmpty());
+}
+
 TEST_F(QELFetchTest, OneThatIsNotRunningLosesNothingByBeingCancelled) {
   serve(std::string(kHalf) + "ETag: \"v\"\r\n\r\nfirst");
   QELFetch fetch = download();
