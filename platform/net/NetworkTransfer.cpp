@@ -185,7 +185,8 @@ CURLcode NetworkTransfer::configure() {
   set(CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
   set(CURLOPT_NOSIGNAL, 1L);
   const long stallLimit = request_.stallLimit;
-  set(CURLOPT_CONNECTTIMEOUT, stallLimit > 0 ? stallLimit : kNoConnectTimeout);
+  set(CURLOPT_CONNECTTIMEOUT,
+      stallLimit > 0 ? std::min(stallLimit, kNoConnectTimeout) : kNoConnectTimeout);
   set(CURLOPT_LOW_SPEED_LIMIT, 1L);
   set(CURLOPT_LOW_SPEED_TIME, stallLimit);
   set(CURLOPT_BUFFERSIZE, kReceiveBufferSize);
