@@ -15,4 +15,15 @@ TEST(QELMediaTypeTest, ExtensionsTellTypes) {
   }
 }
 
+TEST(QELMediaTypeTest, ATypeHasTwoPartsWithoutWhiteSpace) {
+  for (const char* type :
+       {"audio/mpeg", "a/b", "audio/x-m4a", "audio/mpeg; codecs=mp3", "audio/mpeg "}) {
+    EXPECT_TRUE(QELIsMediaType(type)) << type;
+  }
+  for (const char* text : {"", "audio", "/", "audio/", "/mpeg", "audio//mpeg", "audio/ mpeg",
+                           "audio/\tmpeg", " audio/mpeg", "audio /mpeg"}) {
+    EXPECT_FALSE(QELIsMediaType(text)) << text;
+  }
+}
+
 }  // namespace

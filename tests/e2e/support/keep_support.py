@@ -6,6 +6,7 @@ import subprocess
 from email.utils import format_datetime
 from pathlib import Path
 
+from interruption import expect_signals
 from support import Result, ToolTestCase, counting_from_start, element, environment, is_emulated, item, rss, run, tool
 
 FIRST_DAY = datetime.datetime(2024, 1, 1, 12, tzinfo=datetime.timezone.utc)
@@ -63,6 +64,7 @@ class KeepTestCase(ToolTestCase):
     def start_keep(self, *arguments, **options):
         options.setdefault("stdout", subprocess.PIPE)
         options.setdefault("stderr", subprocess.PIPE)
+        options.setdefault("preexec_fn", expect_signals)
         return subprocess.Popen(self.command(*arguments, self.feed_url, self.bundle), stdin=subprocess.DEVNULL,
                                 cwd=self.directory, env=environment(), **options)
 

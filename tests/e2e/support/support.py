@@ -35,7 +35,7 @@ _CLOSING = {0: "<&-", 1: ">&-", 2: "2>&-"}
 
 # Nothing of the machine may decide a result, unless a test asks for it.
 _HIDDEN_VARIABLES = {"http_proxy", "https_proxy", "all_proxy", "no_proxy", "lang", "language", "curl_ca_bundle",
-                     "ssl_cert_file", "ssl_cert_dir", "sslkeylogfile"}
+                     "ssl_cert_file", "ssl_cert_dir", "sslkeylogfile", "source_date_epoch"}
 
 
 class Result(NamedTuple):

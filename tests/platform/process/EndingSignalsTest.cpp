@@ -8,7 +8,15 @@ namespace {
 
 using platform::EndingSignals;
 
-TEST(EndingSignalsTest, ASignalIsNotedAndPassedOn) {
+class EndingSignalsTest : public testing::Test {
+ protected:
+  // nohup, and shells that start something behind their back, have some of them ignored.
+  void SetUp() override {
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP}) std::signal(signal, SIG_DFL);
+  }
+};
+
+TEST_F(EndingSignalsTest, ASignalIsNotedAndPassedOn) {
   for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
     EXPECT_EXIT(
         {
@@ -23,7 +31,7 @@ TEST(EndingSignalsTest, ASignalIsNotedAndPassedOn) {
   }
 }
 
-TEST(EndingSignalsTest, TheSecondOfAKindEndsTheProcess) {
+TEST_F(EndingSignalsTest, TheSecondOfAKindEndsTheProcess) {
   EXPECT_EXIT(
       {
         const EndingSignals signals;
@@ -33,13 +41,13 @@ TEST(EndingSignalsTest, TheSecondOfAKindEndsTheProcess) {
       testing::KilledBySignal(SIGINT), "");
 }
 
-TEST(EndingSignalsTest, NothingIsPassedOnWhenNothingCame) {
+TEST_F(EndingSignalsTest, NothingIsPassedOnWhenNothingCame) {
   EndingSignals signals;
   EndingSignals::passOn();
   EXPECT_FALSE(EndingSignals::hasCome());
 }
 
-TEST(EndingSignalsTest, AnIgnoredSignalStaysIgnored) {
+TEST_F(EndingSignalsTest, AnIgnoredSignalStaysIgnored) {
   std::signal(SIGHUP, SIG_IGN);
   {
     const EndingSignals signals;
@@ -49,7 +57,7 @@ TEST(EndingSignalsTest, AnIgnoredSignalStaysIgnored) {
   EXPECT_EQ(std::signal(SIGHUP, SIG_DFL), SIG_IGN);
 }
 
-TEST(EndingSignalsTest, AfterwardsASignalEndsTheProcess) {
+TEST_F(EndingSignalsTest, AfterwardsASignalEndsTheProcess) {
   { const EndingSignals signals; }
   EXPECT_EXIT(std::raise(SIGTERM), testing::KilledBySignal(SIGTERM), "");
 }
