@@ -39,12 +39,12 @@ bool QELIsOnNetwork(const std::string& source) {
   return source.starts_with("http") || source.starts_with("pcast");
 }
 
-bool QELIsSourceItself(const std::string& path, const std::string& source) {
+bool QELIsSourceItself(const std::string& file, const std::string& source) {
   std::error_code ignored;
   const auto url = platform::URL::parse(source);
-  const std::string file = url && url->scheme() == "file" ? url->path() : source;
-  return std::filesystem::equivalent(path, file, ignored) ||
-         std::filesystem::equivalent(path, platform::joinedPath(file, "Info.plist"), ignored);
+  const std::string path = url && url->scheme() == "file" ? url->path() : source;
+  return std::filesystem::equivalent(file, path, ignored) ||
+         std::filesystem::equivalent(file, platform::joinedPath(path, "Info.plist"), ignored);
 }
 
 std::string QELLastingSource(const std::string& source) {
