@@ -324,6 +324,9 @@ void NetworkTransfer::end(CURLcode result) {
   } else if (result == CURLE_OUT_OF_MEMORY && isInHeader) {
     // What the library says of a line beyond its limit.
     error_ = transferError(result, "A line of the answer's header is too long");
+  } else if (result == CURLE_BAD_FUNCTION_ARGUMENT && isInHeader) {
+    // What it says of one that is no field.
+    error_ = transferError(result, "A line of the answer's header is malformed");
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
     error_ = transferError(result, detail.empty() ? library().easyStrerror(result) : detail);
