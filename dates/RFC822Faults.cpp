@@ -62,16 +62,20 @@ std::string_view dayFault(std::string_view name, platform::CivilDay day) {
 }  // namespace
 
 std::string_view RFC822Fault(std::string_view text) {
-  constexpr std::string_view kMonths = "janfebmaraprmayjunjulaugsepoctnovdec";
+  constexpr std::array<std::string_view, 12> kMonths = {
+      "january", "february", "march",     "april",   "may",      "june",
+      "july",    "august",   "september", "october", "november", "december"};
   constexpr std::size_t kFields = 5;
   const std::vector<std::string_view> fields = platform::splitAtWhitespace(text, kFields + 2);
   if (fields.size() < kFields || fields.size() > kFields + 1) return "it has not all of its parts";
   const std::string_view* const field = fields.data() + (fields.size() - kFields);
   if (!isNumber(field[0], 1, 31)) return "the day is none";
-  const std::string month = platform::lowercased(field[1].substr(0, 3));
-  const std::size_t found = kMonths.find(month);
-  if (month.size() < 3 || found == std::string_view::npos || found % 3 != 0)
-    return "the month is not known";
+  const std::string month = platform::lowercased(field[1]);
+  const auto* const found = std::find_if(kMonths.begin(), kMonths.end(), [&](auto name) {
+    return month.size() >= 3 && name.starts_with(month.substr(0, 3));
+  });
+  if (found == kMonths.end()) return "the month is not known";
+  if (month.size() > 3 && month != *found) return "the month is no English one";
   if (!isNumber(field[2], 0, 9999)) return "the year is none";
   const std::vector<std::string_view> time = platform::splitAt(field[3], ':', 4);
   const bool hasTime = (time.size() == 2 || (time.size() == 3 && isNumber(time[2], 0, 60))) &&
@@ -79,6 +83,6 @@ std::string_view RFC822Fault(std::string_view text) {
   if (!hasTime) return "the time is none";
   if (!isKnownZone(field[4])) return "the time zone is not known";
   return dayFault(fields.size() > kFields ? fields.front() : "",
-                  {platform::leadingInteger(field[2]), static_cast<std::int64_t>(found / 3) + 1,
+                  {platform::leadingInteger(field[2]), found - kMonths.begin() + 1,
                    platform::leadingInteger(field[0])});
 }

@@ -1,6 +1,5 @@
 #include "generators/QELBundlePodcastGenerator.h"
 
-#include <algorithm>
 #include <string_view>
 #include <utility>
 
@@ -23,8 +22,7 @@ using platform::ErrorSlot;
 using platform::Text;
 
 bool allows(const std::optional<QELPodcastSource::FileTypes>& types, std::string_view extension) {
-  return !types ||
-         std::find(types->begin(), types->end(), platform::lowercased(extension)) != types->end();
+  return !types || types->contains(platform::lowercased(extension));
 }
 
 /// Warns about what is left out of the bundle; absent, as what is left out is.

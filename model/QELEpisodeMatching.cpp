@@ -3,8 +3,11 @@
 #include <array>
 #include <map>
 #include <string>
+#include <utility>
 
+#include "platform/text/ASCII.h"
 #include "platform/text/Case.h"
+#include "platform/xml/XMLEscaping.h"
 
 namespace {
 
@@ -16,16 +19,28 @@ std::optional<std::chrono::seconds> wholeSeconds(std::optional<platform::PointIn
   return std::chrono::floor<std::chrono::seconds>(date->time_since_epoch());
 }
 
-/// Unlike for different values, an absent one included, also when others are appended.
+/// An empty element is no uuid: others have the same.
+platform::OptionalText unlessBlank(platform::OptionalText uuid) {
+  return uuid && platform::trimmed(*uuid).empty() ? std::nullopt : std::move(uuid);
+}
+
+/// Unlike for different values, an absent one included, also when others are appended; alike for
+/// those that a reference file cannot tell apart.
 std::string written(const platform::OptionalText& text) {
-  return text ? std::to_string(text->size()).append(":").append(text->view()) : "-";
+  if (!text) return "-";
+  const std::string kept = platform::textReadBack(*text);
+  return std::to_string(kept.size()).append(":").append(kept);
 }
 std::string written(const std::optional<std::chrono::seconds>& date) {
   return date ? std::to_string(date->count()).append(";") : "-";
 }
 
 Sign uuidSign(const Identity& episode) {
-  return episode.uuid ? Sign(platform::lowercased(*episode.uuid)) : std::nullopt;
+  return episode.uuid ? Sign(platform::lowercased(written(episode.uuid))) : std::nullopt;
+}
+Sign uuidOriginSign(const Identity& episode) {
+  if (!episode.uuid || !episode.origin) return std::nullopt;
+  return *uuidSign(episode) + written(episode.origin);
 }
 Sign originTitleDateSign(const Identity& episode) {
   if (!episode.origin) return std::nullopt;
@@ -45,8 +60,8 @@ Sign titleDateSign(const Identity& episode) {
 }
 
 /// The surest first.
-constexpr std::array kSigns = {&uuidSign, &originTitleDateSign, &originTitleSign, &originDateSign,
-                               &titleDateSign};
+constexpr std::array kSigns = {&uuidOriginSign,  &uuidSign,       &originTitleDateSign,
+                               &originTitleSign, &originDateSign, &titleDateSign};
 
 /// The kept episodes with one sign that are still to be had, those without and those with a uuid:
 /// whoever may not take the one kind need not look through it for the other.
@@ -69,13 +84,14 @@ struct Candidates {
 }  // namespace
 
 QELEpisodeIdentity QELIdentityOf(const QELEpisode& episode) {
-  return {episode.uuid(), episode.location(), episode.title(), wholeSeconds(episode.date())};
+  return {unlessBlank(episode.uuid()), episode.location(), episode.title(),
+          wholeSeconds(episode.date())};
 }
 
 QELEpisodeIdentity QELIdentityOf(const platform::Dictionary& entry) {
   const platform::PropertyListValue* date = platform::valueForKey(entry, "EpisodeDate");
-  return {platform::textForKey(entry, "EpisodeUUID"), platform::textForKey(entry, "EpisodeOrigin"),
-          platform::textForKey(entry, "EpisodeName"),
+  return {unlessBlank(platform::textForKey(entry, "EpisodeUUID")),
+          platform::textForKey(entry, "EpisodeOrigin"), platform::textForKey(entry, "EpisodeName"),
           wholeSeconds(date ? date->asDate() : std::nullopt)};
 }
 
@@ -91,6 +107,7 @@ std::vector<std::optional<std::size_t>> QELMatchedEpisodes(std::span<const Ident
   std::vector<std::optional<std::size_t>> matches(source.size());
   std::vector<bool> isTaken(kept.size());
   for (const auto& sign : kSigns) {
+    const bool isOfUUID = sign == &uuidOriginSign || sign == &uuidSign;
     std::map<std::string, Candidates> candidates;
     for (std::size_t number = 0; number < kept.size(); ++number) {
       const Sign has = isTaken[number] ? std::nullopt : sign(kept[number]);
@@ -101,7 +118,7 @@ std::vector<std::optional<std::size_t>> QELMatchedEpisodes(std::span<const Ident
       const Sign has = matches[index] ? std::nullopt : sign(source[index]);
       const auto found = has ? candidates.find(*has) : candidates.end();
       if (found == candidates.end()) continue;
-      matches[index] = found->second.take(!source[index].uuid || sign == &uuidSign);
+      matches[index] = found->second.take(isOfUUID || !source[index].uuid);
       if (matches[index]) isTaken[*matches[index]] = true;
     }
   }

@@ -26,10 +26,10 @@ std::vector<QELEpisodeIdentity> QELIdentitiesOf(const QELEpisodeList& episodes);
 
 /// For each episode of the source the number of the kept one that it is; absent for a new one.
 ///
-/// Where both have a uuid, it decides, in any mix of case. Otherwise they are the same if they come
-/// from one place, unless title and date both differ ("latest.mp3" is another one each week); else
-/// if title and date are the same, where both have both. Each kept episode is one of the source's
-/// at most: the surer sign takes it, and of equal ones the first. The cost grows with the number of
-/// episodes as sorting them does, however many have a sign in common.
+/// Where both have a uuid, and not a blank one, it decides, in any mix of case. Otherwise they are
+/// the same if they come from one place, unless title and date both differ ("latest.mp3" is another
+/// one each week); else if title and date are the same, where both have both. Each kept episode is
+/// one of the source's at most: the surer sign takes it, and of equal ones the first. The cost
+/// grows with the number of episodes as sorting them does, however many have a sign in common.
 std::vector<std::optional<std::size_t>> QELMatchedEpisodes(
     std::span<const QELEpisodeIdentity> source, std::span<const QELEpisodeIdentity> kept);

@@ -2,9 +2,9 @@
 
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
 #include <utility>
-#include <vector>
 
 #include "model/QELEpisode.h"
 #include "model/QELFetcher.h"
@@ -25,8 +25,8 @@
 class QELPodcastSource : private QELFetcher {
  public:
   using OptionalText = platform::OptionalText;
-  /// File-name extensions in lower case.
-  using FileTypes = std::vector<std::string>;
+  /// File-name extensions in lower case. Each of many episodes is looked up in what may be many.
+  using FileTypes = std::set<std::string>;
 
   /// Fills the fields from wherever the source's kind reads them. On failure returns false with the
   /// slot filled, the fields as they were. The base, which has nothing to read, always fails with

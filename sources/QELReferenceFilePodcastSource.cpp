@@ -24,7 +24,7 @@ std::optional<QELPodcastSource::FileTypes> fileTypesForKey(const Dictionary& dic
 
   QELPodcastSource::FileTypes types;
   for (const PropertyListValue& element : *array) {
-    if (const auto text = element.asText()) types.push_back(text->string());
+    if (const auto text = element.asText()) types.insert(text->string());
   }
   return types;
 }

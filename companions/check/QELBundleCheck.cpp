@@ -6,6 +6,7 @@
 
 #include "companions/check/QELPublishingCheck.h"
 #include "companions/check/QELReferenceCheck.h"
+#include "companions/common/QELSourceLoading.h"
 #include "platform/files/FileKind.h"
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
@@ -15,7 +16,8 @@
 #include "platform/text/Case.h"
 
 void QELBundleCheck::check(platform::ByteSource bytes) {
-  if (platform::lowercased(platform::pathExtension(directory_)) != "podcast") {
+  // It may be the working directory.
+  if (platform::lowercased(platform::pathExtension(QELLastingSource(directory_))) != "podcast") {
     findings_.add(QELSeverity::kWarning, {.file = directory_},
                   "qel takes a directory for a bundle when its name ends in .podcast: rename it");
   }

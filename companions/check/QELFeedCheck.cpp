@@ -181,7 +181,7 @@ class Watch final : public FeedParser {
     const auto uuid = platform::textForKey(item, "QELUUID");
     if (uuid && !uuids_.insert(uuid->string()).second) {
       add(QELSeverity::kWarning, itemPosition_,
-          "the uuid %@ is that of an episode before: qel-keep takes both for one; give each its "
+          "the uuid %@ is that of an episode before: others take both for one; give each its "
           "own",
           {QELQuoted(*uuid)});
     }

@@ -7,6 +7,7 @@
 #include "cli/common/QELError.h"
 #include "platform/files/FileManager.h"
 #include "platform/files/Paths.h"
+#include "platform/net/URL.h"
 #include "platform/net/URLFault.h"
 #include "platform/text/Case.h"
 
@@ -14,8 +15,9 @@ namespace {
 
 /// What is wrong with the name of a source that is none.
 std::string faultOf(const std::string& source) {
-  if (platform::looksLikeURL(source) && !QELIsOnNetwork(source)) {
-    return "a URL begins with http:, https: or file:, in lower case";
+  if (platform::looksLikeURL(source)) {
+    const std::string fault = platform::hasFetchedScheme(source) ? platform::urlFault(source) : "";
+    return fault.empty() ? "a URL begins with http:, https: or file:, in lower case" : fault;
   }
   if (platform::fileExists(source)) {
     return "it is no reference file or bundle; a feed on the disk is named by a file:/// URL";
@@ -35,6 +37,14 @@ platform::OptionalText below(const std::string& directory, const QELMediaReferen
 
 bool QELIsOnNetwork(const std::string& source) {
   return source.starts_with("http") || source.starts_with("pcast");
+}
+
+bool QELIsSourceItself(const std::string& file, const std::string& source) {
+  std::error_code ignored;
+  const auto url = platform::URL::parse(source);
+  const std::string path = url && url->scheme() == "file" ? url->path() : source;
+  return std::filesystem::equivalent(file, path, ignored) ||
+         std::filesystem::equivalent(file, platform::joinedPath(path, "Info.plist"), ignored);
 }
 
 std::string QELLastingSource(const std::string& source) {

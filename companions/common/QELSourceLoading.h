@@ -10,6 +10,9 @@
 /// Whether a source, as a user names it, lies on the network, and so was written by strangers.
 bool QELIsOnNetwork(const std::string& source);
 
+/// Whether the file is the source itself, or the reference file of one that is a bundle.
+bool QELIsSourceItself(const std::string& file, const std::string& source);
+
 /// The name of a source by which it is found from any working directory.
 std::string QELLastingSource(const std::string& source);
 

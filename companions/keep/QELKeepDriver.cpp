@@ -3,11 +3,9 @@
 #include <algorithm>
 #include <climits>
 #include <cstdint>
-#include <filesystem>
 #include <memory>
 #include <optional>
 #include <string>
-#include <system_error>
 #include <utility>
 
 #include "companions/common/QELCommandLine.h"
@@ -65,10 +63,7 @@ int keep(const QELCommandLine& arguments, const Options& options) {
     }
     name = remembered->string();
   }
-  std::error_code ignored;
-  if (std::filesystem::equivalent(name, path, ignored)) {
-    return arguments.wrongUse("SOURCE and BUNDLE are the same");
-  }
+  if (QELIsSourceItself(name, path)) return arguments.wrongUse("SOURCE and BUNDLE are the same");
   const int stallLimit = static_cast<int>(std::min<std::int64_t>(options.stallLimit, INT_MAX));
   QELRetrySchedule schedule;
   std::unique_ptr<QELPodcastSource> source;

@@ -10,6 +10,7 @@
 #include "model/QELPodcastKeys.h"
 #include "platform/files/Paths.h"
 #include "platform/text/FormattedText.h"
+#include "platform/xml/XMLEscaping.h"
 
 namespace {
 
@@ -145,7 +146,7 @@ void QELKeptShow::updateEntry(Entry& entry, const QELEpisode& episode) {
     const std::string base = QELBaseName(platform::lastPathComponent(old));
     const std::string name = mediaNames_.reserve(base, platform::pathExtension(old));
     entry.media = std::make_shared<QELFetch>(title, media, directory_.mediaPlace(name), path_,
-                                             allowsLocalFiles_);
+                                             allowsLocalFiles_, episode.uuid().value_or(Text()));
     reference = name;
   } else if (reference) {
     lose(entry);
@@ -170,7 +171,9 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
   if (!poster.location || poster.location->empty()) return;
   const std::string key = prefix + "PosterReference";
   const std::string originKey = prefix + "PosterOrigin";
-  const std::string origin = poster.location->string();
+  const std::string origin = platform::textReadBack(*poster.location);
+  // Nobody lists the poster of an episode that does not come.
+  const bool isNew = entry.media && !entry.wasListed;
   const OptionalText oldOrigin = platform::textForKey(entry.dictionary, originKey);
   const OptionalText old = platform::textForKey(entry.dictionary, key);
   const bool isThere = QELBundleDirectory::sizeOfFile(path_, old).has_value();
@@ -186,7 +189,9 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
       const std::string name = posterNames_.reserve(baseName, extension);
       fetch = std::make_shared<QELFetch>("poster of " + title, poster, directory_.posterPlace(name),
                                          postersPath_, allowsLocalFiles_);
+      if (isNew) fetch->hold();
     }
+    if (isNew) entry.media->setFollower(fetch);
     entry.poster = fetch;
   }
 }

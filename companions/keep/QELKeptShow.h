@@ -16,9 +16,9 @@
 
 /// A show in its bundle: what was kept, what the source says now, and what is to be fetched.
 ///
-/// Beside the keys of every reference file, the bundle's has PodcastOrigin (the source),
-/// EpisodeOrigin, PodcastPosterOrigin and EpisodePosterOrigin (where a file came from); other
-/// readers ignore them.
+/// The bundle's reference file has PodcastOrigin (the source), and EpisodeOrigin,
+/// PodcastPosterOrigin and EpisodePosterOrigin (where a file came from), which other readers
+/// ignore.
 class QELKeptShow {
  public:
   using Fetches = std::vector<std::shared_ptr<QELFetch>>;
@@ -36,8 +36,7 @@ class QELKeptShow {
 
   /// What is to be fetched, in the order of the source.
   const Fetches& fetches() const { return fetches_; }
-  /// How many episodes of the source were there already, how many have come, and how many have no
-  /// media.
+  /// How many episodes of the source were there already, have come, and have no media.
   std::size_t knownCount() const { return knownCount_; }
   std::size_t newCount() const;
   std::size_t emptyCount() const { return emptyCount_; }

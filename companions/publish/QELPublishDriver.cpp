@@ -4,19 +4,18 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
-#include <filesystem>
 #include <functional>
 #include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
-#include <system_error>
 #include <utility>
 #include <vector>
 
 #include "cli/QELSourceResolution.h"
 #include "companions/common/QELCommandLine.h"
 #include "companions/common/QELPrivateURL.h"
+#include "companions/common/QELSourceLoading.h"
 #include "companions/publish/QELPublication.h"
 #include "companions/publish/QELPublishedFeedGenerator.h"
 #include "generators/QELBundleDirectory.h"
@@ -95,15 +94,6 @@ bool findRoot(const std::string& text, const QELPodcastSource& source, OptionalS
   return true;
 }
 
-/// Whether the feed would take the place of what it is made from.
-bool isSourceItself(const std::string& feed, const std::string& text) {
-  std::error_code ignored;
-  const auto url = platform::URL::parse(text);
-  const std::string source = url && url->scheme() == "file" ? url->path() : text;
-  return std::filesystem::equivalent(feed, source, ignored) ||
-         std::filesystem::equivalent(feed, platform::joinedPath(source, "Info.plist"), ignored);
-}
-
 /// Whether the source is a bundle that came from a private URL; asked before it is prepared.
 bool remembersUser(const QELPodcastSource& source) {
   if (dynamic_cast<const QELBundlePodcastSource*>(&source) == nullptr) return false;
@@ -119,7 +109,7 @@ int publish(const QELCommandLine& commandLine, const Options& options,
     commandLine.report("SOURCE_DATE_EPOCH is not a number of seconds since 1970");
     return kNothingDone;
   }
-  if (isSourceItself(feed, sourceText)) {
+  if (QELIsSourceItself(feed, sourceText)) {
     return commandLine.wrongUse("'" + feed + "' is the source itself");
   }
   const auto source = sourceOf(sourceText, options.directory);

@@ -20,7 +20,7 @@ class QELPublishedFeedGenerator : public QELFeedPodcastGenerator {
   void setSelfURL(std::optional<std::string> url) { selfURL_ = std::move(url); }
 
   /// What tells the episode from all others: its uuid, else the location of its media; absent
-  /// without both, and empty texts are none.
+  /// without both, and blank texts are none.
   static std::optional<platform::Text> guidOf(const QELEpisode& episode);
 
  protected:

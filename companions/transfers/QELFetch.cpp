@@ -10,7 +10,7 @@ using platform::ErrorSlot;
 
 QELFetch::QELFetch(std::string title, QELMediaReference reference,
                    const std::optional<platform::FilePlace>& place, const std::string& folder,
-                   bool allowsLocalFiles)
+                   bool allowsLocalFiles, std::string_view uuid)
     : reference_(std::move(reference)), place_(place.value_or(platform::FilePlace(""))) {
   progress_.title = std::move(title);
   if (!place) {
@@ -23,9 +23,19 @@ QELFetch::QELFetch(std::string title, QELMediaReference reference,
     refuse("A feed of the network names a local file, see --allow-local");
   } else if (reference_.isRemote && reference_.url->scheme() != "file") {
     part_ = std::make_unique<QELPart>(*place->directory, folder, reference_.url->encodedText(),
-                                      progress_.title);
+                                      progress_.title + std::string(uuid));
     finishedName_ = part_->finishedName();
   }
+}
+
+void QELFetch::hold() {
+  if (state_ == State::kWaiting) state_ = State::kHeld;
+}
+
+std::shared_ptr<QELFetch> QELFetch::release() {
+  if (!follower_ || follower_->state_ != State::kHeld) return nullptr;
+  follower_->state_ = State::kWaiting;
+  return follower_;
 }
 
 void QELFetch::refuse(const std::string& cause) {

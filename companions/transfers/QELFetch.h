@@ -5,6 +5,8 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <utility>
 
 #include "companions/common/QELTransferDisplay.h"
 #include "companions/transfers/QELPart.h"
@@ -17,23 +19,29 @@
 class QELFetch : private platform::DownloadReceiver {
  public:
   using Clock = std::chrono::steady_clock;
-  enum class State { kWaiting, kRunning, kDone, kFailed };
+  enum class State { kHeld, kWaiting, kRunning, kDone, kFailed };
 
-  /// `title` says what it is, for people; the folder is the path of the place's directory. It fails
-  /// at once without a place, where the reference is no URL and should be one, or one that is not
-  /// fetched, and for a local file where none is allowed. What the place refers to must outlive
-  /// this.
+  /// `title` says what it is, for people; the uuid, which may be empty, tells it from others of the
+  /// URL and title; the folder is the path of the place's directory. It fails at once without a
+  /// place, where the reference is no URL and should be one, or one that is not fetched, and for a
+  /// local file where none is allowed. What the place refers to must outlive this.
   ///
   /// A download goes on from the part that an earlier try left, and leaves one behind when it
   /// fails; a file that an earlier run had no time to list is taken as it is.
   QELFetch(std::string title, QELMediaReference reference,
            const std::optional<platform::FilePlace>& place, const std::string& folder,
-           bool allowsLocalFiles);
+           bool allowsLocalFiles, std::string_view uuid = {});
 
   /// The name of its part; empty for one that has none.
   std::string partName() const { return part_ ? part_->name() : ""; }
   /// Has it do without a part.
   void forgoPart() { part_.reset(); }
+
+  /// Holds it, unless it has failed, until one that it follows is done: alone it is of no use.
+  void hold();
+  void setFollower(std::shared_ptr<QELFetch> follower) { follower_ = std::move(follower); }
+  /// Lets the follower go. Null when there is none, or it is not held any more.
+  std::shared_ptr<QELFetch> release();
 
   /// Fails it without a try.
   void refuse(const std::string& cause);
@@ -80,4 +88,5 @@ class QELFetch : private platform::DownloadReceiver {
   Clock::time_point dueTime_;
   std::string cause_;
   std::unique_ptr<platform::Download> download_;
+  std::shared_ptr<QELFetch> follower_;
 };

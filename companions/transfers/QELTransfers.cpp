@@ -18,6 +18,7 @@ QELTransfers::QELTransfers(std::int64_t jobs, int stallLimit)
     : jobs_(static_cast<std::size_t>(jobs)), stallLimit_(stallLimit) {}
 
 void QELTransfers::add(std::shared_ptr<QELFetch> fetch) {
+  if (fetch->state() == QELFetch::State::kHeld) return;
   // Two of one URL may run at once.
   if (!partNames_.insert(fetch->partName()).second) fetch->forgoPart();
   queue_.push_back(std::move(fetch));
@@ -62,6 +63,10 @@ QELTransfers::Fetches QELTransfers::run() {
     return true;
   });
   endedCount_ += ended.size();
+  for (const auto& fetch : ended) {
+    if (fetch->state() != QELFetch::State::kDone) continue;
+    if (auto follower = fetch->release()) add(std::move(follower));
+  }
   return ended;
 }
 

@@ -19,6 +19,7 @@ class QELTransfers {
   /// At most `jobs` at once. For the limit see QELFetch. Both are at least 1.
   QELTransfers(std::int64_t jobs, int stallLimit);
 
+  /// One that is held is added when it is let go.
   void add(std::shared_ptr<QELFetch> fetch);
   bool hasEnded() const { return endedCount_ == count_; }
 

@@ -26,10 +26,17 @@ bool isRegular(const struct stat& status, ErrorSlot& error) {
 /// Refuses what the kernel makes up while it is read: it shows the state of the process (its
 /// environment, for one) and of the machine, and may never end.
 bool isStored(int descriptor, ErrorSlot& error) {
-  constexpr std::array<std::uint32_t, 13> kOfTheKernel = {
-      PROC_SUPER_MAGIC, SYSFS_MAGIC,  DEBUGFS_MAGIC,      TRACEFS_MAGIC,       SECURITYFS_MAGIC,
-      SELINUX_MAGIC,    SMACK_MAGIC,  CGROUP_SUPER_MAGIC, CGROUP2_SUPER_MAGIC, PSTOREFS_MAGIC,
-      EFIVARFS_MAGIC,   BPF_FS_MAGIC, 0x62656570 /* configfs */};
+  // Those that are mounted below /proc and /sys have types of their own.
+  constexpr std::uint32_t kConfigFS = 0x62656570;  // these have no names in the kernel's header
+  constexpr std::uint32_t kFuseControl = 0x65735543;
+  constexpr std::uint32_t kMessageQueues = 0x19800202;
+  constexpr std::uint32_t kNFSServer = 0x6E667364;
+  constexpr std::uint32_t kRemoteCalls = 0x67596969;
+  constexpr std::array<std::uint32_t, 20> kOfTheKernel = {
+      PROC_SUPER_MAGIC, SYSFS_MAGIC,  DEBUGFS_MAGIC,      TRACEFS_MAGIC,        SECURITYFS_MAGIC,
+      SELINUX_MAGIC,    SMACK_MAGIC,  CGROUP_SUPER_MAGIC, CGROUP2_SUPER_MAGIC,  PSTOREFS_MAGIC,
+      EFIVARFS_MAGIC,   BPF_FS_MAGIC, BINFMTFS_MAGIC,     RDTGROUP_SUPER_MAGIC, XENFS_SUPER_MAGIC,
+      kConfigFS,        kFuseControl, kMessageQueues,     kNFSServer,           kRemoteCalls};
   struct statfs status {};
   if (::fstatfs(descriptor, &status) != 0) {
     error = posixError(errno);

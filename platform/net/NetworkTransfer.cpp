@@ -185,7 +185,8 @@ CURLcode NetworkTransfer::configure() {
   set(CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
   set(CURLOPT_NOSIGNAL, 1L);
   const long stallLimit = request_.stallLimit;
-  set(CURLOPT_CONNECTTIMEOUT, stallLimit > 0 ? stallLimit : kNoConnectTimeout);
+  set(CURLOPT_CONNECTTIMEOUT,
+      stallLimit > 0 ? std::min(stallLimit, kNoConnectTimeout) : kNoConnectTimeout);
   set(CURLOPT_LOW_SPEED_LIMIT, 1L);
   set(CURLOPT_LOW_SPEED_TIME, stallLimit);
   set(CURLOPT_BUFFERSIZE, kReceiveBufferSize);
@@ -323,6 +324,9 @@ void NetworkTransfer::end(CURLcode result) {
   } else if (result == CURLE_OUT_OF_MEMORY && isInHeader) {
     // What the library says of a line beyond its limit.
     error_ = transferError(result, "A line of the answer's header is too long");
+  } else if (result == CURLE_BAD_FUNCTION_ARGUMENT && isInHeader) {
+    // What it says of one that is no field.
+    error_ = transferError(result, "A line of the answer's header is malformed");
   } else if (result != CURLE_OK) {
     const std::string_view detail = errorText_.data();
     error_ = transferError(result, detail.empty() ? library().easyStrerror(result) : detail);

@@ -93,6 +93,18 @@ bool isXMLText(std::string_view text) {
   return true;
 }
 
+std::string textReadBack(std::string_view text) {
+  if (isXMLText(text)) return std::string(text);
+  std::string kept;
+  for (std::size_t next = 0; next < text.size();) {
+    const std::size_t begin = next;
+    nextCharacter(text, next);
+    const std::string_view character = text.substr(begin, next - begin);
+    if (isXMLText(character)) kept += character;
+  }
+  return kept;
+}
+
 std::size_t sizeOfReferences(std::string_view text) {
   std::size_t size = 0;
   for (const char byte : text) {

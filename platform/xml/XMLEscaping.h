@@ -9,6 +9,9 @@ namespace platform {
 /// Whether XML 1.0 can hold the text whole: UTF-8 without the characters that it excludes.
 bool isXMLText(std::string_view text);
 
+/// The text as it is read back once it was written: without what XML 1.0 cannot hold.
+std::string textReadBack(std::string_view text);
+
 /// Appends the text to `output`, escaped for the content of an XML 1.0 element so that a parser
 /// reads back the very same text: markup characters and carriage returns as references. Characters
 /// that XML 1.0 cannot hold and bytes that are no UTF-8 are left out.

@@ -10,9 +10,11 @@ import tempfile
 import threading
 import time
 from collections import defaultdict
+from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
 
 from building import BUILD, WORK
+from schemata import MOST_FAULTS
 
 MEMORY = 6 << 30    # for a fault that takes all
 FILE_SIZE = 8 << 30  # some tests make sparse files beyond 2 GiB
@@ -26,12 +28,13 @@ class Test:
         self.environment = environment
         self.directory = directory
         self.seconds = None  # without a fault; None as well where it fails then
+        self.meets = frozenset()  # the faults in what it runs
         self.noticed = 0
 
-    def run(self, number, timeout, temporary):
-        """Whether it passes with the fault of that number."""
+    def run(self, number, timeout, temporary, **more):
+        """Whether it passes with the fault of that number; `more` is for its environment."""
         environment = {**os.environ, **self.environment, "QEL_MUTANT": str(number), "TMPDIR": temporary,
-                       "GTEST_FAIL_FAST": "1"}
+                       "GTEST_FAIL_FAST": "1", **more}
 
         def limit():
             signal.signal(signal.SIGINT, signal.SIG_DFL)  # a shell that started this behind its back ignores it
@@ -77,48 +80,62 @@ def _known_tests():
 class Tests:
     """All tests that pass without a fault, which is tried first unless that was done for this state of the sources."""
 
-    def __init__(self, state):
+    def __init__(self, state, jobs):
         self.lock = threading.Lock()
         self.tests = []
         file = WORK / "tests.json"
         known = json.loads(file.read_text()) if file.is_file() else {}
-        self.seconds = known["seconds"] if known.get("state") == state else {}
+        self.known = known["tests"] if known.get("state") == state else {}
         units, others = _known_tests()
-        for suite, tests in units.items():
-            # One process for all its tests is much faster than one for each, which some need.
-            first = tests[0]
-            whole = Test(suite, [first.command[0], f"--gtest_filter={suite}.*"], first.environment, first.directory)
-            if not self.take(whole):
-                others += tests
-        for test in others:
-            if not self.take(test):
-                print(f"{test.name} fails without any fault, and is left out", flush=True)
-        file.write_text(json.dumps({"state": state, "seconds": self.seconds}))
+        # One process for all tests of a suite is much faster than one for each, which some need.
+        wholes = [Test(suite, [tests[0].command[0], f"--gtest_filter={suite}.*"], tests[0].environment,
+                       tests[0].directory) for suite, tests in units.items()]
+        with ThreadPoolExecutor(jobs) as pool:
+            for whole, passes in zip(wholes, pool.map(self.take, wholes)):
+                if not passes:
+                    others += units[whole.name]
+            for test, passes in zip(others, pool.map(self.take, others)):
+                if not passes:
+                    print(f"{test.name} fails without any fault, and is left out", flush=True)
+        file.write_text(json.dumps({"state": state, "tests": self.known}))
 
     def take(self, test):
         """Whether it passes without a fault; then it belongs to the tests."""
-        if test.name not in self.seconds:
-            began = time.monotonic()
-            passes = self.run(test, 0, 600)
-            self.seconds[test.name] = time.monotonic() - began if passes else None
-        test.seconds = self.seconds[test.name]
+        if test.name not in self.known:
+            self.known[test.name] = self.tried(test)
+        test.seconds, meets = self.known[test.name]
+        test.meets = frozenset(meets)
         if test.seconds is not None:
             self.tests.append(test)
         return test.seconds is not None
 
+    def tried(self, test):
+        """Its time without a fault, None where it fails then, and the numbers of the faults in what it runs."""
+        with tempfile.NamedTemporaryFile(prefix="qm-") as met:
+            met.write(bytes(MOST_FAULTS))
+            met.flush()
+            os.chmod(met.name, 0o666)
+            began = time.monotonic()
+            if self.run(test, 0, 600, QEL_REACHED=met.name):
+                seconds = time.monotonic() - began
+                return seconds, [number for number, byte in enumerate(Path(met.name).read_bytes()) if byte]
+        began = time.monotonic()  # some count the calls of the system, that file's among them
+        passes = self.run(test, 0, 600)
+        return time.monotonic() - began if passes else None, list(range(MOST_FAULTS))
+
     @staticmethod
-    def run(test, number, timeout):
+    def run(test, number, timeout, **more):
         temporary = tempfile.mkdtemp(prefix="qm-")
         os.chmod(temporary, 0o755)  # some tests run the tool as another user
         try:
-            return test.run(number, timeout, temporary)
+            return test.run(number, timeout, temporary, **more)
         finally:
             shutil.rmtree(temporary, ignore_errors=True)
 
-    def sequence(self, path):
-        """The tests in the order in which one of them will soonest notice a fault in the file."""
+    def sequence(self, number, path):
+        """The tests that meet the fault, in the order in which one of them will soonest notice it."""
         suite = f"{Path(path).stem}Test"
-        remaining = list(self.tests)
+        remaining = [test for test in self.tests if number in test.meets]
         while remaining:
             with self.lock:
                 test = max(remaining, key=lambda one: (one.name.split(".")[0] == suite,
@@ -128,7 +145,7 @@ class Tests:
 
     def first_to_notice(self, number, path):
         """The name of the first test that fails with the fault, or None."""
-        for test in self.sequence(path):
+        for test in self.sequence(number, path):
             if not self.run(test, number, LEAST_TIMEOUT + 5 * test.seconds):
                 with self.lock:
                     test.noticed += 1

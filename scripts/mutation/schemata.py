@@ -1,13 +1,36 @@
-"""Writes sources that hold many faults at once, of which a run chooses one by the environment variable QEL_MUTANT."""
+"""Writes sources that hold many faults at once, of which a run chooses one by the environment variable QEL_MUTANT.
 
-SWITCH = """\
+Where the variable QEL_REACHED names a file, a run sets a byte of it for each fault that it could have met: that at the
+fault's number.
+"""
+
+MOST_FAULTS = 1 << 16
+
+# Calls the system itself: the tests look at what the product calls, and let it fail.
+SWITCH = f"""\
 #pragma once
+#include <fcntl.h>
+#include <sys/mman.h>
+#include <sys/syscall.h>
+#include <unistd.h>
 #include <cstdlib>
 #include <type_traits>
-inline const int qelMutant = [] {
+inline const int qelMutant = [] {{
   const char* number = std::getenv("QEL_MUTANT");
   return number != nullptr ? std::atoi(number) : 0;
-}();
+}}();
+inline unsigned char* const qelReached = []() -> unsigned char* {{
+  const char* path = std::getenv("QEL_REACHED");
+  const long file = path != nullptr ? ::syscall(SYS_openat, AT_FDCWD, path, O_RDWR | O_CLOEXEC) : -1;
+  if (file < 0) return nullptr;
+  const long place = ::syscall(SYS_mmap, nullptr, {MOST_FAULTS}, PROT_READ | PROT_WRITE, MAP_SHARED, file, 0L);
+  ::syscall(SYS_close, file);
+  return place != -1 ? reinterpret_cast<unsigned char*>(place) : nullptr;
+}}();
+inline bool qelIsChosen(int number) {{
+  if (qelReached != nullptr) qelReached[number] = 1;
+  return qelMutant == number;
+}}
 """
 
 
@@ -28,7 +51,7 @@ def _rendered(source, start, end, sites, numbers):
     text = b""
     for site in sites:
         kept = _rendered(source, site.start, site.end, site.children, numbers).decode()
-        is_chosen = f"qelMutant == {numbers[site.name]}"
+        is_chosen = f"qelIsChosen({numbers[site.name]})"
         if site.may_be_constant:
             is_chosen = f"!std::is_constant_evaluated() && {is_chosen}"
         text += source[start:site.start]

@@ -51,6 +51,10 @@ TEST(QELEpisodeMatchingTest, OneIsKnownByItsSigns) {
        false},
       {"no origins, title", identity(kNone, kNone, "A", kNone), identity(kNone, kNone, "A", kNone),
        false},
+      {"what no reference file holds", identity(kNone, "/\xE9/1.mp3", "A", kNone),
+       identity(kNone, "//1.mp3", "B", kNone), true},
+      {"uuid, with what no reference file holds", identity("u\x01", "a", "A", 1),
+       identity("u", "b", "B", 2), true},
       {"texts that run together", identity(kNone, "a", "bA", 1), identity(kNone, "ab", "A", 1),
        false},
   };
@@ -67,7 +71,7 @@ TEST(QELEpisodeMatchingTest, EachKeptOneIsTakenOnce) {
             (Matches{0, kNone}));
   EXPECT_EQ(QELMatchedEpisodes(source,
                                Identities{identity("u", "b", "B", 2), identity("u", "a", "A", 1)}),
-            (Matches{0, 1}));
+            (Matches{1, 0}));
 }
 
 TEST(QELEpisodeMatchingTest, TheSurerSignTakesIt) {
@@ -83,6 +87,22 @@ TEST(QELEpisodeMatchingTest, WhoHasAUUIDTakesNoneWithAnother) {
   EXPECT_EQ(QELMatchedEpisodes(Identities{identity("u", "a", "A", 1)}, kept), (Matches{1}));
   EXPECT_EQ(QELMatchedEpisodes(Identities{identity(kNone, "a", "A", 1)}, Identities{kept[0]}),
             (Matches{0}));
+}
+
+TEST(QELEpisodeMatchingTest, OfOneUUIDTheOriginTells) {
+  const Identities kept = {identity("u", "a", "A", 1), identity("u", "b", "B", 2)};
+  const Identities source = {identity("u", "c", "C", 3), identity("U", "b", "B", 2)};
+  EXPECT_EQ(QELMatchedEpisodes(source, kept), (Matches{0, 1}));
+  EXPECT_EQ(QELMatchedEpisodes(Identities{source[1], source[0]}, kept), (Matches{1, 0}));
+}
+
+TEST(QELEpisodeMatchingTest, ABlankUUIDIsNone) {
+  for (const char* blank : {"", " \n"}) {
+    const auto episode = QELEpisode::episode();
+    episode->setUuid(platform::Text(blank));
+    EXPECT_EQ(QELIdentityOf(*episode).uuid, kNone);
+    EXPECT_EQ(QELIdentityOf(platform::Dictionary{{"EpisodeUUID", blank}}).uuid, kNone);
+  }
 }
 
 TEST(QELEpisodeMatchingTest, FractionsOfSecondsDoNotCount) {

@@ -56,7 +56,7 @@ TEST(QELPodcastSourceTest, FileTypeListsAreCopied) {
   QELPodcastSource source;
   QELPodcastSource::FileTypes types{"mp3"};
   source.setAllowedEpisodeFileTypes(types);
-  types.emplace_back("m4a");
+  types.insert("m4a");
   EXPECT_EQ(source.allowedEpisodeFileTypes(), QELPodcastSource::FileTypes{"mp3"});
 }
 

@@ -27,7 +27,7 @@ TEST(QELPublishedFeedGeneratorTest, AddsTheRowsOfReaders) {
   first->setLocation("https://a.example/1.mp3");
   first->setDate(PointInTime(1s));
   const auto second = QELEpisode::episodeWithDictionary(nullptr);
-  second->setUuid("");
+  second->setUuid(" ");
   second->setLocation("https://a.example/2.mp3");
   const auto third = QELEpisode::episodeWithDictionary(nullptr);
   QELPodcastSource source;

@@ -61,6 +61,7 @@ class BundleTest(ToolTestCase):
         bundle = self.path("lantern.podcast")
         self.assertSucceeds(self.run_tool("createbundle", SHOW / "reference.plist", "-d", bundle, cwd=SHOW))
         self.assertEqual(self.run_tool(bundle, program="qel-check"), (0, b"", b""))
+        self.assertEqual(self.run_tool(".", program="qel-check", cwd=bundle), (0, b"", b""))
         os.rename(bundle, self.path("lantern"))
         self.assertEqual(self.run_tool("lantern", program="qel-check"), (
             1, b"lantern: warning: qel takes a directory for a bundle when its name ends in .podcast: rename it\n",

@@ -96,7 +96,7 @@ class TakenTest(FeedTestCase):
     def test_repeated_identifiers(self):
         items = [item(element("qel:uuid", "u"), element("orvane:duration", "9"), element("guid", "g"))] * 2
         self.assertEqual(self.said(*items), [
-            'warning: the uuid "u" is that of an episode before: qel-keep takes both for one; give each its own',
+            'warning: the uuid "u" is that of an episode before: others take both for one; give each its own',
             'warning: the guid "g" is that of an episode before: readers show one of the two; give each its own'])
 
     def test_labels(self):

@@ -1,5 +1,6 @@
 """A show that is kept: what is new comes, what is there stays, and what the source says is brought up to date."""
 
+import os
 import plistlib
 import unittest
 
@@ -186,6 +187,35 @@ class KeepTest(KeepTestCase):
                         f'qel-keep: poster of "Show": {gone}: HTTP status 404\n')
         self.assertEqual((self.info()["PodcastPosterReference"], self.info()["PodcastPosterOrigin"]),
                          ("Posters/Podcast.png", show))
+
+    def test_the_poster_of_an_episode_comes_with_it_and_not_alone(self):
+        parts = [element("orvane:image", href=self.web.serve("/1.png", b"poster"))]
+        missing = self.episode(1, *parts, url=self.web.url("/missing.mp3"))
+        for number in (2, 3):  # that Info.plist is written each time
+            self.publish(missing, self.episode(number))
+            self.assertEqual(self.keep().status, 1)
+        self.assertEqual((list((self.bundle / "Posters").iterdir()), self.web.hits("/1.png")), ([], 0))
+        self.publish(missing, self.episode(4, *parts))
+        self.assertEqual(self.keep().status, 1)
+        self.publish(self.episode(1, *parts), self.episode(4, *parts))
+        self.assertKept(self.keep(), "1 new, 1 known, 0 failed")
+        self.assertEqual(self.listed("EpisodePosterReference"), ["Posters/missing.png"] * 2 + [None] * 2)
+        self.assertEqual(self.web.hits("/1.png"), 1)
+        self.assertNothingHidden()
+
+    def test_paths_that_are_no_text_are_known_again(self):
+        folder = os.fsencode(self.directory) + b"/\xE9"
+        os.mkdir(folder)
+        for name, content in [(b"1.mp3", b"media 1"), (b"1.png", b"poster"), (b"show.plist", plistlib.dumps(
+                {"Episodes": [{"EpisodeName": "Episode 1", "EpisodeReference": "1.mp3",
+                               "EpisodePosterReference": "1.png"}]}))]:
+            with open(folder + b"/" + name, "wb") as file:
+                file.write(content)
+        source = os.fsdecode(folder + b"/show.plist")
+        self.assertKept(self.keep(source=source), "1 new, 0 known, 0 failed")
+        before = contents(self.bundle)
+        self.assertKept(self.keep(source=source), "0 new, 1 known, 0 failed")
+        self.assertEqual(contents(self.bundle), before)
 
     def test_local_files_are_kept_from_a_local_source(self):
         media = self.write("one.mp3", b"media 1")

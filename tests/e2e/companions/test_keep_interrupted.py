@@ -9,7 +9,7 @@ import unittest
 
 from bundle_support import Gate, eventually
 from keep_support import KeepTestCase
-from support import soaking
+from support import element, soaking
 
 BODY = bytes(range(256)) * 2048  # half a MiB
 KILLS = 200 if soaking() else 25
@@ -86,6 +86,21 @@ class InterruptedTest(KeepTestCase):
         self.assertKept(self.keep(), "1 new, 0 known, 0 failed")
         self.media(2)
         self.assertEqual(self.web.hits("/latest.mp3"), 2)
+
+    def test_nor_does_one_of_the_same_title_and_another_uuid(self):
+        latest = self.web.serve("/latest.mp3", b"media 1")
+        gate = Gate()
+        self.addCleanup(gate.open)
+        slow = self.web.route("/slow.mp3", lambda exchange: gate.wait())
+        self.publish(self.episode(1, element("qel:uuid", "one"), title="News", url=latest), self.episode(9, url=slow))
+        process = self.start_keep()
+        eventually(lambda: list(self.bundle.glob("latest.mp3")))
+        process.kill()
+        process.communicate()
+        self.web.serve("/latest.mp3", b"media 2")
+        self.publish(self.episode(2, element("qel:uuid", "two"), title="News", url=latest))
+        self.assertKept(self.keep(), "1 new, 0 known, 0 failed")
+        self.assertEqual((self.bundle / self.listed("EpisodeReference")[0]).read_bytes(), b"media 2")
 
     def test_a_signal_ends_a_run_in_order(self):
         for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):

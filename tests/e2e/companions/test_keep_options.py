@@ -41,7 +41,8 @@ class OptionsTest(KeepTestCase):
                               (self.write("feed.xml", b"<rss/>"), "it is no reference file or bundle; "
                                "a feed on the disk is named by a file:/// URL"),
                               ("HTTP://a.example/", "a URL begins with http:, https: or file:, in lower case"),
-                              ("http://a b/", nothing)]:
+                              ("http://a b/", '" " is written %20'),
+                              (f"file://{self.directory}/my feed.xml", '" " is written %20')]:
             with self.subTest(source):
                 self.assertRefused(self.keep(source=source), f"{source}: {cause}")
                 self.assertFalse(self.bundle.exists())
@@ -67,7 +68,14 @@ class OptionsTest(KeepTestCase):
     def test_a_bundle_is_not_its_own_source(self):
         self.publish(self.episode(1))
         self.keep()
-        self.assertRefused(self.keep(source=self.bundle), "SOURCE and BUNDLE are the same; see 'qel-keep --help'")
+        before = self.info()
+        for source in (self.bundle, self.bundle / "Info.plist"):
+            self.assertRefused(self.keep(source=source), "SOURCE and BUNDLE are the same; see 'qel-keep --help'")
+        self.assertEqual(self.info(), before)
+
+    def test_a_patience_without_end_is_one(self):
+        self.publish(self.episode(1))
+        self.assertKept(self.keep("--stall", "99999999999"), "1 new, 0 known, 0 failed")
 
     def test_a_rehearsal_makes_nothing(self):
         poster = self.web.serve("/1.png", b"poster")

@@ -62,6 +62,24 @@ class TransfersTest(KeepTestCase):
         self.assertKept(self.keep("--jobs", "3"), "8 new, 0 known, 0 failed")
         self.assertEqual(most[0], 3)
 
+    def test_two_of_one_url_and_title_come_at_once(self):
+        bodies = {number: bytes([number]) * (100_000 * number) for number in (1, 2)}
+        numbers = iter(bodies)
+        both = threading.Barrier(2)
+
+        def answer(exchange):
+            body = bodies[next(numbers)]
+            exchange.head(200, [("Content-Length", str(len(body))), *STRONG])
+            exchange.send(body[:50_000])
+            both.wait(30)
+            exchange.send(body[50_000:])
+        url = self.web.route("/latest.mp3", answer)
+        self.publish(*(self.episode(number, title="Latest", url=url) for number in (1, 2)))
+        self.assertKept(self.keep(), "2 new, 0 known, 0 failed")
+        self.assertEqual(sorted((self.bundle / name).read_bytes() for name in self.listed("EpisodeReference")),
+                         list(bodies.values()))
+        self.assertNothingHidden()
+
     def test_what_may_pass_is_tried_again(self):
         statuses = iter([503, 429])
 

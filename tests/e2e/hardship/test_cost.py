@@ -3,6 +3,8 @@
 That time grows as the size does is for scripts/cost-table --check to say, since it takes minutes.
 """
 
+import os
+import plistlib
 import unittest
 import unittest.mock
 
@@ -27,6 +29,22 @@ class CostTest(ToolTestCase):
                 size, (cost,) = family.costs(MEGABYTE)
                 self.assertRegex(cost.message, rf"\A(?s:{family.message})\Z")
                 self.assertLessEqual(cost.memory, least[family.is_served] + ALLOWANCE + family.memory * size)
+
+    def test_memory_of_a_bundle_grows_little_with_each_file_that_is_saved(self):
+        original = self.path("a" * 100)
+        original.write_bytes(b"media")
+        episode = {"EpisodeReference": original.as_uri(), "EpisodePosterReference": original.as_uri()}
+
+        def memory(count):
+            # What stands for nothing is room for the records that the shared episode becomes.
+            document = {"Unknown": bytes(100_000), "Episodes": [episode] * count}
+            source = self.write(f"{count}.plist", plistlib.dumps(document, fmt=plistlib.FMT_BINARY))
+            taken = cost.cost_of("createbundle", str(source), "-d", str(self.path(f"{count}.podcast"))).memory
+            self.assertEqual(len(os.listdir(self.path(f"{count}.podcast") / "Posters")), count)
+            return taken
+
+        files = 2 * (4000 - 1000)
+        self.assertLessEqual(memory(4000) - memory(1000), 2000 * files)
 
 
 class BoundsTest(unittest.TestCase):

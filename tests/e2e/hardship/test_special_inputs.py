@@ -102,6 +102,20 @@ class InputTest(SpecialFileTestCase):
                     posters = {"Posters/Podcast.jpg": MEDIA, "Posters/one.jpg": MEDIA} if cause is None else {}
                     self.assertEqual(self.files(), {"one.mp3": MEDIA, **posters})
 
+    def test_what_the_kernel_makes_up_in_file_systems_of_their_own(self):
+        point = self.path("binfmt_misc")
+        point.mkdir()
+        command = ["mount", "-t", "binfmt_misc", "none", point]
+        if os.geteuid() != 0 or subprocess.run(command, check=False, capture_output=True).returncode != 0:
+            self.skipTest("root and binfmt_misc are needed")
+        self.addCleanup(subprocess.run, ["umount", "-l", point], check=True)
+        status = point / "status"
+        self.assertFails(self.run_tool("parsefeed", status.as_uri()), "Could not load source: Not a stored file")
+        for location in (str(status), status.as_uri()):
+            result = self.create_episodes({"EpisodeName": "One", "EpisodeReference": location})
+            self.assertWarns(result, 'Could not save or download episode "One"')
+            self.assertEqual(self.files(), {})
+
     def test_as_standard_input(self):
         """Standard input is read whatever it is, to its end, to an error or until the memory runs out."""
         whole = plistlib.dumps(PODCAST)

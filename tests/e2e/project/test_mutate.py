@@ -12,7 +12,7 @@ from support import ToolTestCase
 ROOT = Path(__file__).resolve().parents[3]
 sys.path.insert(0, str(ROOT / "scripts" / "mutation"))
 try:
-    from schemata import SWITCH, with_faults
+    from schemata import MOST_FAULTS, SWITCH, with_faults
     from sites import sites_of
 except ImportError:
     sites_of = None
@@ -92,6 +92,11 @@ class MutateTest(ToolTestCase):
                 printed = subprocess.run([self.path("faulty")], env={"QEL_MUTANT": str(number)}, timeout=30,
                                          check=True, capture_output=True, text=True).stdout
                 self.assertEqual(printed, expected)
+
+        met = self.write("met", bytes(MOST_FAULTS))
+        subprocess.run([self.path("faulty")], env={"QEL_REACHED": str(met)}, timeout=30, check=True,
+                       stdout=subprocess.DEVNULL)
+        self.assertEqual([number for number, byte in enumerate(met.read_bytes()) if byte], [*numbers.values()])
 
     def test_operators_in_a_row_are_told_apart(self):
         self.write("source.cpp", "bool f(bool a, bool b, bool c) { return a || b || c; }")

@@ -331,6 +331,11 @@ NAMES = (
             b"<key>AllowedEpisodeTypes</key><array/><key>Episodes</key><array><dict><key>EpisodeReference</key>"
             b"<string>a." + repeated("Σ\u0301".encode(), size) + b"</string></dict></array>"),
                command="createbundle"),
+        Family("types that are allowed, none of them one of as many media, to a bundle", lambda size: podcast(
+            b"<key>AllowedEpisodeTypes</key><array>" + numbered(b"<string>#</string>", size // 2) +
+            b"</array><key>Episodes</key><array>" +
+            repeated(b"<dict><key>EpisodeReference</key><string>a.mp3</string></dict>", size // 2) + b"</array>"),
+               command="createbundle", outgrows_caches=True),
         Family("media of distinct names in a list, to a bundle", lambda size: episodes(numbered(
             b"<dict><key>EpisodeReference</key><string>/nowhere/#.mp3</string></dict>", size)),
                command="createbundle")),

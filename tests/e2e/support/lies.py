@@ -63,6 +63,7 @@ TRANSFER_CODING = Cause("The body comes in a transfer coding that was not asked 
 CONTENT_CODING = Cause("The body comes in a content coding that was not asked for")
 CUT_HEADER = Cause("The header of the answer is cut short")
 LONG_LINE = Cause("A line of the answer's header is too long")
+BAD_LINE = LibraryCause("A line of the answer's header is malformed")
 OUT_OF_MEMORY = Cause("Out of memory.")
 CUT_STREAM = Cause("The compressed body is cut short")
 BAD_STREAM = Cause("The compressed body is malformed")
@@ -220,6 +221,8 @@ LIES = {
             LibraryCause("Unsupported HTTP version in response")),
         Lie("a line without a colon", answer("garbage", length(SIZE)), LibraryCause("Header without colon")),
         Lie("a NUL in a field", answer("X: a\0b", length(SIZE)), LibraryCause("Nul byte in header")),
+        Lie("a first field without a name", answer(f" {length(SIZE)}"), BAD_LINE),
+        Lie("a carriage return in the name of a field", answer(f"Content-\rLength: {SIZE}"), BAD_LINE),
         Lie("an endless status line", endless(b"HTTP/1.1 200 ", b"x" * 8000), LONG_LINE),
         Lie("an endless field", endless(FOUND + b"X: ", b"x" * 8000), LONG_LINE),
         Lie("endless fields", endless(FOUND, FIELD * 100), LONG_HEADER),

@@ -119,6 +119,8 @@ TEST_F(NetworkTransferTest, RefusesWhatMayNotBeWhole) {
       {kOK + "Content-Length: 0\r\n", cutHeader},
       {kOK + "X: " + std::string(200'000, 'x'),
        "transfer 27: A line of the answer's header is too long"},
+      {kOK + " Content-Length: 6\r\n\r\n<rss/>",
+       "transfer 43: A line of the answer's header is malformed"},
       {HTTPTestServer::response("<rss/>", "Content-Length: 5\r\n"), contradictory},
       {HTTPTestServer::response("", "Location: /x\r\nContent-Length: 5\r\n", "302 Found"),
        contradictory},

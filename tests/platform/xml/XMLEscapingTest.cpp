@@ -121,5 +121,14 @@ TEST(XMLEscapingTest, TellsWhatXMLCanHoldWhole) {
   for (const Row& row : rows) EXPECT_EQ(isXMLText(row.text), row.holds) << row.text;
 }
 
+TEST(XMLEscapingTest, TextReadBackIsWhatXMLCanHold) {
+  EXPECT_EQ(textReadBack("a <&>\"\t\n\r"), "a <&>\"\t\n\r");
+  EXPECT_EQ(textReadBack("\x01"
+                         "a\xC3\xBC\xE9\xE2\x82"
+                         "b\xEF\xBF\xBF"),
+            "a\xC3\xBC"
+            "b");
+}
+
 }  // namespace
 }  // namespace platform
