@@ -15,7 +15,6 @@ namespace {
 
 using Connection = HTTPTestServer::Connection;
 using State = QELFetch::State;
-using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
