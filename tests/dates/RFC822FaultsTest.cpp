@@ -8,7 +8,8 @@ TEST(RFC822FaultsTest, ADateInEnglishWithAKnownZoneHasNone) {
   for (const std::string_view text :
        {"Sat, 04 Apr 2026 04:30:00 GMT", "4 Apr 26 04:30 +0200", "31 DECEMBER 2026 23:59:60 -05:30",
         "1 Jan 0 0:0 z", "Foo, 04 may 2026 04:30 pdt", "29 Feb 2028 04:30 GMT",
-        "29 Feb 28 04:30 GMT", "sunday, 29 Feb 2004 04:30 GMT", "Thu, 1 Jan 70 0:0 GMT"}) {
+        "4 Apr 2026 04:30 +2359", "29 Feb 28 04:30 GMT", "sunday, 29 Feb 2004 04:30 GMT",
+        "Thu, 1 Jan 70 0:0 GMT"}) {
     EXPECT_EQ(RFC822Fault(text), "") << text;
   }
 }
@@ -44,7 +45,13 @@ TEST(RFC822FaultsTest, TellsTheFirstFault) {
            Row{"4 Apr 2026 0430 GMT", "the time is none"},
            Row{"4 Apr 2026 04:30 UTC", "the time zone is not known"},
            Row{"4 Apr 2026 04:30 +020", "the time zone is not known"},
+           Row{"4 Apr 2026 04:30 +05030", "the time zone is not known"},
+           Row{"4 Apr 2026 04:30 -2360", "the time zone is not known"},
+           Row{"4 Apr 2026 04:30 +02a0", "the time zone is not known"},
            Row{"4 Apr 2026 04:30 j", "the time zone is not known"},
+           Row{"4 Apr 2026 04:30 1", "the time zone is not known"},
+           Row{"4 Apr 2026 :30 GMT", "the time is none"},
+           Row{"4 Apr 2026 04: GMT", "the time is none"},
        }) {
     EXPECT_EQ(RFC822Fault(row.text), row.fault) << row.text;
   }

@@ -98,6 +98,10 @@ TEST_F(QELBundleDirectoryTest, AReferenceFileIsRead) {
   root_.addFile("bundle/Info.plist", "<plist><array/></plist>");
   EXPECT_EQ(QELBundleDirectory::readReferenceFile(path(), error_), std::nullopt);
   EXPECT_EQ(error_->description, "Info.plist: no dictionary at its root");
+  std::filesystem::remove(path() + "/Info.plist");
+  std::filesystem::create_directory(path() + "/Info.plist");
+  EXPECT_EQ(QELBundleDirectory::readReferenceFile(path(), error_), std::nullopt);
+  EXPECT_EQ(error_->description, "Is a directory");
 }
 
 TEST_F(QELBundleDirectoryTest, FilesOfReferencesHaveSizes) {

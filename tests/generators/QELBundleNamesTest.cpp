@@ -31,6 +31,7 @@ TEST(QELBundleNamesTest, TakesTheLastComponentOfALocation) {
   for (const auto& row : rows) {
     EXPECT_EQ(QELFileName({Text(row.location), row.referenceType}), row.name) << row.location;
   }
+  EXPECT_EQ(QELFileName({std::nullopt, Text("local")}), std::nullopt);
 }
 
 TEST(QELBundleNamesTest, BaseNamesHoldNeitherExtensionNorSlash) {

@@ -39,7 +39,10 @@ TEST(QELFreeNamesTest, NamesAreThoseOfEveryFileSystem) {
       {"CON", "mp3", "_CON.mp3"},
       {"con.tar", "mp3", "_con.tar.mp3"},
       {"lpt1", "mp3", "_lpt1.mp3"},
+      {"Com0", "mp3", "_Com0.mp3"},
       {"lptx", "mp3", "lptx.mp3"},
+      {"comx", "mp3", "comx.mp3"},
+      {"com10", "mp3", "com10.mp3"},
       {"com", "mp3", "com.mp3"},
       {"console", "mp3", "console.mp3"},
       {"Gänse", "mp3", "Gänse.mp3"},
@@ -61,6 +64,25 @@ TEST(QELFreeNamesTest, ALongNameIsCutBetweenCharacters) {
   EXPECT_EQ(names.reserve(base, "mp3"), cut + ".mp3");  // 251 bytes for the base, an odd number
   cut.resize(cut.size() - 2);
   EXPECT_EQ(names.reserve(base, "mp3"), cut + "-2.mp3");
+}
+
+TEST(QELFreeNamesTest, ACharacterThatIsCutGoesAsAWhole) {
+  const auto repeated = [](std::string_view character, int count) {
+    std::string text;
+    for (int i = 0; i < count; ++i) text += character;
+    return text;
+  };
+  const struct {
+    std::string_view character;
+    int mostTimes;  // in 255 bytes, and in the 251 before an extension
+    int mostTimesInExtension;
+  } rows[] = {{"ä", 125, 16}, {"日", 83, 10}, {"😀", 62, 8}};
+  for (const auto& [character, mostTimes, mostTimesInExtension] : rows) {
+    EXPECT_EQ(QELFreeNames().reserve(repeated(character, 300), "mp3"),
+              repeated(character, mostTimes) + ".mp3");
+    EXPECT_EQ(QELFreeNames().reserve("a", repeated(character, 300)),
+              "a." + repeated(character, mostTimesInExtension));
+  }
 }
 
 }  // namespace

@@ -15,6 +15,7 @@ TEST(FeedParserMemoryTest, RecordsOfACompressedFeedAreCounted) {
     int exceeds;
   } rows[] = {
       {"<item/>", 27'000, 29'000},
+      {"<title/>", 27'000, 32'000},
       {"<item><title>" + amps + "</title></item>", 2, 4},
       {"<item><link>document/uuid/" + std::string(36, 'x') + "</link></item>", 10'000, 11'000},
       {"<item><explicit>yes</explicit></item>", 14'000, 15'500},

@@ -42,21 +42,46 @@ bool HTTPTestServer::Connection::receiveRequest() {
   return true;
 }
 
-HTTPTestServer::HTTPTestServer() {
-  // A proxy that the environment names must not come between.
-  setenv("no_proxy", "127.0.0.1", 1);
+namespace {
 
-  listener_ = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+/// Binds the socket to a port of the loopback interface that the system chooses.
+bool bindToLoopback(int socket, HTTPTestServer::Family family) {
+  sockaddr_in old{};
+  old.sin_family = AF_INET;
+  old.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  sockaddr_in6 address{};
+  address.sin6_family = AF_INET6;
+  address.sin6_addr = in6addr_loopback;
+  return family == HTTPTestServer::Family::kIPv4
+             ? bind(socket, reinterpret_cast<sockaddr*>(&old), sizeof(old)) == 0
+             : bind(socket, reinterpret_cast<sockaddr*>(&address), sizeof(address)) == 0;
+}
+
+int openSocket(HTTPTestServer::Family family) {
+  return socket(family == HTTPTestServer::Family::kIPv4 ? AF_INET : AF_INET6,
+                SOCK_STREAM | SOCK_CLOEXEC, 0);
+}
+
+}  // namespace
+
+bool HTTPTestServer::isToBeHad(Family family) {
+  const int socket = openSocket(family);
+  const bool isBound = socket >= 0 && bindToLoopback(socket, family);
+  if (socket >= 0) ::close(socket);
+  return isBound;
+}
+
+HTTPTestServer::HTTPTestServer(Family family) : family_(family), listener_(openSocket(family)) {
+  // A proxy that the environment names must not come between.
+  setenv("no_proxy", "127.0.0.1,::1", 1);
+
+  sockaddr_in6 address{};  // the port of the other family lies at the same place
   socklen_t size = sizeof(address);
-  auto* const generic = reinterpret_cast<sockaddr*>(&address);
-  if (bind(listener_, generic, size) != 0 || listen(listener_, 16) != 0 ||
-      getsockname(listener_, generic, &size) != 0) {
+  if (!bindToLoopback(listener_, family) || listen(listener_, 16) != 0 ||
+      getsockname(listener_, reinterpret_cast<sockaddr*>(&address), &size) != 0) {
     throw std::runtime_error("The test server cannot listen");
   }
-  port_ = ntohs(address.sin_port);
+  port_ = ntohs(address.sin6_port);
   acceptThread_ = std::thread([this] { acceptConnections(); });
 }
 
@@ -123,7 +148,8 @@ void HTTPTestServer::serve(const std::string& path, std::string answer) {
 }
 
 std::string HTTPTestServer::url(std::string_view path) const {
-  return "http://127.0.0.1:" + std::to_string(port_) + std::string(path);
+  const std::string host = family_ == Family::kIPv4 ? "127.0.0.1" : "[::1]";
+  return "http://" + host + ":" + std::to_string(port_) + std::string(path);
 }
 
 int HTTPTestServer::hits(const std::string& path) const {

@@ -44,7 +44,9 @@ class HTTPTestServer {
   };
   using Route = std::function<void(Connection&)>;
 
-  HTTPTestServer();
+  enum class Family { kIPv4, kIPv6 };
+
+  explicit HTTPTestServer(Family family = Family::kIPv4);
   ~HTTPTestServer();
   HTTPTestServer(const HTTPTestServer&) = delete;
   HTTPTestServer& operator=(const HTTPTestServer&) = delete;
@@ -54,6 +56,9 @@ class HTTPTestServer {
   void serve(const std::string& path, Route route);
   /// The same with an answer that is always the same; the connection stays open.
   void serve(const std::string& path, std::string answer);
+
+  /// Whether this machine has a loopback interface of that family.
+  static bool isToBeHad(Family family);
 
   std::string url(std::string_view path) const;
   int port() const { return port_; }
@@ -72,6 +77,7 @@ class HTTPTestServer {
   void acceptConnections();
   void serveConnection(int socket);
 
+  Family family_;
   int listener_ = -1;
   int port_ = 0;
   std::atomic<int> connections_ = 0;

@@ -85,6 +85,19 @@ TEST(QELCommandLineTest, WrongUseIsOneLineThatPointsToTheHelp) {
   }
 }
 
+TEST(QELCommandLineTest, LanguageIsATag) {
+  std::optional<std::string> tag;
+  const auto take = QELTakeLanguage(tag);
+  for (const char* value : {"en", "pt-BR", "zh-Hant-TW", "de-1996", "i-klingon"}) {
+    EXPECT_TRUE(take(value)) << value;
+    EXPECT_EQ(tag, value);
+  }
+  for (const char* value : {"", "-", "en-", "-en", "en--us", "1996", "en_US", "en us", "e\u00F1",
+                            "en@", "en`", "en/"}) {
+    EXPECT_FALSE(take(value)) << value;
+  }
+}
+
 TEST(QELCommandLineTest, DirectoryIsAPrefixAndItsNamespace) {
   QELDirectory directory;
   const auto take = QELTakeDirectory(directory);

@@ -74,8 +74,15 @@ TEST(QELTransferDisplayTest, WithoutALengthThereIsNoBar) {
             "A                                                  3.0 kB     1.0 kB/s          ");
 }
 
+TEST(QELTransferDisplayTest, OfNothingThereIsNoShare) {
+  EXPECT_EQ(drawn(state("A", 0, 0), kStart + seconds(3)),
+            "A                                                     0 B        0 B/s          ");
+}
+
 TEST(QELTransferDisplayTest, LongTimesHaveHours) {
   EXPECT_EQ(drawn(state("A", 1000, 3725000 + 1000), kStart + seconds(1)).substr(70), "   1:02:05");
+  EXPECT_EQ(drawn(state("A", 1000, 4199000 + 1000), kStart + seconds(1)).substr(70), "   1:09:59");
+  EXPECT_EQ(drawn(state("A", 1000, 4200000 + 1000), kStart + seconds(1)).substr(70), "   1:10:00");
   EXPECT_EQ(drawn(state("A", 1, 400000), kStart + seconds(1)).substr(70), "     --:--");
 }
 

@@ -96,6 +96,61 @@ TEST_F(QELPublicationTest, URLsStay) {
   EXPECT_EQ(episode->location(), "https://a.example/a b.mp3");
 }
 
+TEST_F(QELPublicationTest, ThePageOfTheShowIsAURLOfTheNetwork) {
+  for (const char* page : {"http://show.example/", "https://show.example/"}) {
+    podcast_.setLocation(page);
+    EXPECT_THAT(prepared(), IsEmpty()) << page;
+    EXPECT_EQ(podcast_.location(), page);
+  }
+  for (const char* page : {"ftp://show.example/", "file:///show", "show", "", "http://a b/"}) {
+    podcast_.setLocation(page);
+    EXPECT_THAT(prepared(), ElementsAre("the show has no link: name its page with --link")) << page;
+    EXPECT_EQ(podcast_.location(), std::nullopt);
+  }
+}
+
+TEST_F(QELPublicationTest, TheRootMayEndInASlashAndNeedNotExist) {
+  directory_.addFile("a.mp3", "12345");
+  const auto episode = addEpisode("a.mp3");
+  EXPECT_THAT(preparedWith(directory_ / ""), IsEmpty());
+  EXPECT_EQ(episode->location(), "https://media.example/a/a.mp3");
+
+  const std::string missing = directory_ / "missing";
+  episode->setLocation(directory_ / "a.mp3");
+  EXPECT_THAT(preparedWith(missing), ElementsAre("left out, since it does not lie in " + missing +
+                                                 "/: \"E1\" (" + (directory_ / "a.mp3") + ")"));
+  EXPECT_EQ(episode->location(), std::nullopt);
+}
+
+TEST_F(QELPublicationTest, TheRootMayBeALinkToAllFiles) {
+  std::filesystem::create_symlink("/", directory_ / "all");
+  const std::string file =
+      std::filesystem::canonical(directory_.addFile("a.mp3", "12345")).string();
+  const auto episode = addEpisode(directory_ / "a.mp3");
+  EXPECT_THAT(preparedWith(directory_ / "all"), IsEmpty());
+  EXPECT_EQ(episode->location(), kBase + file.substr(1));
+}
+
+TEST_F(QELPublicationTest, TheRootItselfIsNoFileOfTheShow) {
+  for (const std::string& root : {directory_.path(), std::string()}) {
+    const auto episode = addEpisode(root + "/");
+    EXPECT_THAT(preparedWith(root + "/"), ElementsAre("left out, since it does not lie in " + root +
+                                                      "/: \"E1\" (" + root + "/)"));
+    EXPECT_EQ(episode->location(), std::nullopt);
+    episodes_->clear();
+  }
+}
+
+TEST_F(QELPublicationTest, AFileURLOfAnotherHostIsNothingToFetch) {
+  directory_.addFile("a.mp3", "12345");
+  const std::string url = "file://host" + (directory_ / "a.mp3");
+  const auto episode = addEpisode(url);
+  EXPECT_THAT(
+      prepared(),
+      ElementsAre("left out, since a path is nothing that others can fetch: \"E1\" (" + url + ")"));
+  EXPECT_EQ(episode->location(), std::nullopt);
+}
+
 TEST_F(QELPublicationTest, OtherPathsAreLeftOut) {
   TemporaryDirectory elsewhere;
   const std::string outside = elsewhere.addFile("x.mp3", "x");

@@ -1,12 +1,15 @@
 #include "companions/transfers/QELPart.h"
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 
+#include <csignal>
 #include <filesystem>
 #include <optional>
 #include <string>
 
 #include "platform/process/SystemStart.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace {
@@ -61,6 +64,16 @@ TEST_F(QELPartTest, ANoteOfAnotherURLOrAnotherStartVouchesForNothing) {
   std::string steering = content;
   write(note, steering.insert(steering.find("\"tag"), 1, '\r'));
   EXPECT_EQ(one.validator(), "");
+  for (const char* character : {"\x7F", "\x1F", "\u00E9"}) {
+    std::string unprintable = content;
+    write(note, unprintable.insert(unprintable.find("tag"), character));
+    EXPECT_EQ(one.validator(), "") << character;
+  }
+  for (const char* character : {"~", " "}) {
+    std::string printable = content;
+    write(note, printable.insert(printable.find("tag"), character));
+    EXPECT_EQ(one.validator(), std::string("\"") + character + "tag\"");
+  }
   content.replace(content.find("/1.mp3"), 6, "/2.mp3");
   write(note, content);
   EXPECT_EQ(one.validator(), "");
@@ -81,6 +94,25 @@ TEST_F(QELPartTest, AWholeFileIsFoundAgain) {
   EXPECT_EQ(one.finishedName(), std::nullopt);  // it is not the part's file
   one.remove();
   EXPECT_EQ(one.finishedName(), std::nullopt);
+}
+
+TEST_F(QELPartTest, ANoteIsWrittenWholeOrNotAtAll) {
+  const QELPart one = part("https://a.example/1.mp3");
+  write(one.name(), "half");
+  one.note("\"old\"", "1.mp3", 5);
+  // What stands there is not replaced by half a note.
+  EXPECT_TRUE(holdsInChild([&] {
+    std::signal(SIGXFSZ, SIG_IGN);
+    const rlimit limit{20, 20};
+    ::setrlimit(RLIMIT_FSIZE, &limit);
+    one.note("\"new\"", "1.mp3", 5);
+    return true;
+  }));
+  EXPECT_EQ(one.validator(), "\"old\"");
+  fs::remove_all(path_);
+  one.note("\"new\"", "1.mp3", 5);
+  EXPECT_EQ(one.validator(), "");
+  EXPECT_FALSE(fs::exists(path_));
 }
 
 TEST_F(QELPartTest, AnotherEpisodeOfOneURLHasNoShareInIt) {

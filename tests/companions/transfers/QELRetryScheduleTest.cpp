@@ -67,4 +67,8 @@ TEST(QELRetryScheduleTest, TheServerMayAskForAnotherWait) {
   }
 }
 
+TEST(QELRetryScheduleTest, WhatFailedForNoReasonIsNotTriedAgain) {
+  EXPECT_FALSE(QELRetrySchedule().sleepAfter(std::nullopt));
+}
+
 }  // namespace

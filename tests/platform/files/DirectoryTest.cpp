@@ -279,6 +279,7 @@ TEST_F(DirectoryTest, KnowsWhetherAPathStillLeadsToIt) {
   const Directory directory = opened(root_ / "link");
   EXPECT_TRUE(directory.isAt(root_ / "a"));
   EXPECT_TRUE(directory.isAt(root_ / "link"));
+  EXPECT_FALSE(directory.isAt(root_ / std::string("a\0b", 3)));
   std::filesystem::rename(root_ / "a", root_ / "moved");
   EXPECT_FALSE(directory.isAt(root_ / "link"));
   std::filesystem::create_directory(root_ / "a");

@@ -127,6 +127,23 @@ TEST_F(FileManagerTest, FilesOverTheLimitAreNotRead) {
   EXPECT_EQ(error_, (ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"}));
 }
 
+TEST_F(FileManagerTest, FilesThatTurnOutToBeOverTheLimitAreNotReadAnyFurther) {
+  const Interposed sizes(&InterposedCalls::fstat, std::function(&statusWithoutSize));
+  const std::string path = directory_.addFile("file", "");
+  std::vector<char> room(std::size_t{64} << 20U);
+  for (const bool isOver : {false, true}) {
+    std::filesystem::resize_file(path, kWholeReadLimit + (isOver ? 1 : 0));
+    std::optional<ByteSource> file = openWholeFile(path, error_);
+    ASSERT_TRUE(file);
+    std::size_t size = 0;
+    std::optional<std::size_t> count;
+    while ((count = file->read(room, error_)).value_or(0) > 0) size += *count;
+    EXPECT_EQ(count.has_value(), !isOver);
+    EXPECT_EQ(size, kWholeReadLimit);
+  }
+  EXPECT_EQ(error_, (ErrorRecord{"POSIX", EFBIG, "The file is larger than 2 GiB"}));
+}
+
 TEST_F(FileManagerTest, CreatesAllMissingDirectories) {
   for (const char* path : {"a", "b/c/d", "e/", "f//g///", "./h", "i/../j", "k/."}) {
     SCOPED_TRACE(path);
@@ -280,6 +297,23 @@ TEST_F(FileManagerTest, CopyOfAFileThatIsWrittenMeanwhileIsRefused) {
       return ssize_t{0};
     }));
     EXPECT_FALSE(copyFile(source, directory_ / "copy")) << content;
+    EXPECT_THAT(directory_.names(), ElementsAre("source"));
+  }
+}
+
+TEST_F(FileManagerTest, CopyOfAFileWhoseTimeChangesMeanwhileIsRefused) {
+  const std::string source = directory_.addFile("source", "content");
+  for (const timespec& changed : {timespec{5, 8}, timespec{6, 7}}) {
+    const auto setTime = [&source](const timespec& time) {
+      const std::array<timespec, 2> times = {time, time};
+      return ::utimensat(AT_FDCWD, source.c_str(), times.data(), 0);
+    };
+    ASSERT_EQ(setTime({5, 7}), 0);
+    const Interposed writer(&InterposedCalls::copy_file_range, std::function([&](std::size_t) {
+      setTime(changed);
+      return ssize_t{0};
+    }));
+    EXPECT_FALSE(copyFile(source, directory_ / "copy"));
     EXPECT_THAT(directory_.names(), ElementsAre("source"));
   }
 }

@@ -5,13 +5,16 @@
 #include <gtest/gtest.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <csignal>
 #include <filesystem>
 #include <thread>
 
 #include "tests/support/ChildProcess.h"
+#include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
 
 namespace platform {
@@ -91,11 +94,19 @@ TEST_F(FileReplacementTest, DescriptorsAreWrittenThemselves) {
   ASSERT_GE(descriptor, 0);
   struct stat before {};
   ::fstat(descriptor, &before);
-  EXPECT_TRUE(replaces("/dev/fd/" + std::to_string(descriptor)));
+  for (const std::string folder : {"/dev/fd/", "/proc/self/fd/"}) {
+    EXPECT_TRUE(replaces(folder + std::to_string(descriptor), folder));
+    struct stat after {};
+    ASSERT_EQ(::stat(path.c_str(), &after), 0);
+    EXPECT_EQ(before.st_ino, after.st_ino);
+    EXPECT_EQ(contentOf(path), folder);
+  }
+  EXPECT_TRUE(holdsInChild(
+      [&] { return ::dup2(descriptor, STDERR_FILENO) >= 0 && replaces("/dev/stderr", "error"); }));
+  EXPECT_EQ(contentOf(path), "error");
   struct stat after {};
   ASSERT_EQ(::stat(path.c_str(), &after), 0);
   EXPECT_EQ(before.st_ino, after.st_ino);
-  EXPECT_EQ(contentOf(path), "new");
   ::close(descriptor);
 }
 
@@ -120,6 +131,22 @@ TEST_F(FileReplacementTest, FailuresLeaveTheOldFile) {
   }));
   EXPECT_EQ(contentOf(path), "old");
   EXPECT_THAT(directory_.names(), ElementsAre("feed.xml"));
+}
+
+TEST_F(FileReplacementTest, StandardOutputThatTakesNoMoreIsAFailure) {
+  EXPECT_TRUE(holdsInChild([&] {
+    const int full = ::open("/dev/full", O_WRONLY);
+    return ::dup2(full, STDOUT_FILENO) >= 0 && !replaces("-") &&
+           description() == "No space left on device";
+  }));
+}
+
+TEST_F(FileReplacementTest, FailedCloseOfADeviceIsAFailure) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  EXPECT_TRUE(holdsInChild([&] {
+    return refuseSystemCall(SYS_close, EIO) && !replaces("/dev/null") &&
+           description() == "Input/output error";
+  }));
 }
 
 TEST_F(FileReplacementTest, WhatCannotBeWrittenIsAFailure) {

@@ -22,7 +22,7 @@ TEST(PortablePathsTest, SomeNamesAreReservedSomewhere) {
     EXPECT_FALSE(isPortablePath(path)) << path;
   }
   for (const std::string_view path : {"a", "a.mp3", "Posters/a b.png", "\u00FC", ".a", "console",
-                                      "com", "com0", "com10", "a.con"}) {
+                                      "com", "com0", "com10", "coma", "comA", "a.con"}) {
     EXPECT_TRUE(isPortablePath(path)) << path;
   }
 }

@@ -108,5 +108,15 @@ TEST_F(RegularFileTest, FileThatCannotBeLookedAtIsRefused) {
   EXPECT_EQ(error, (ErrorRecord{"POSIX", EIO, "Input/output error"}));
 }
 
+TEST_F(RegularFileTest, FileWhoseFileSystemIsNotToldIsRefused) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  const std::string path = directory_.addFile("file", "content");
+  EXPECT_TRUE(holdsInChild([&] {
+    ErrorSlot error;
+    return refuseSystemCall(SYS_fstatfs, ENOSYS) && !RegularFile::open(path, error) &&
+           error == ErrorRecord{"POSIX", ENOSYS, "Function not implemented"};
+  }));
+}
+
 }  // namespace
 }  // namespace platform

@@ -221,12 +221,13 @@ TEST_F(TemporaryFileTest, FailsWithoutRandomBytes) {
 // Between the creation of a file and its lock, a remover can take it for stale.
 TEST_F(TemporaryFileTest, TriesAgainWhenAnotherHasLockedOrRemovedTheFile) {
   FileDescriptor remover;
-  const std::array<std::function<void(const std::string&)>, 2> interferences = {
+  const std::array<std::function<void(const std::string&)>, 3> interferences = {
       [&](const std::string& path) {
         remover = FileDescriptor::open(path, O_RDWR);
         ::syscall(SYS_flock, remover.get(), LOCK_EX);
       },
-      [](const std::string& path) { ::unlink(path.c_str()); }};
+      [](const std::string& path) { ::unlink(path.c_str()); },
+      [](const std::string& path) { ::unlink(path.c_str()), std::ofstream(path) << "another"; }};
   for (const auto& interfere : interferences) {
     std::string taken;
     const Interposed locks(&InterposedCalls::flock,

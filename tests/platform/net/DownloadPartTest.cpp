@@ -136,6 +136,9 @@ TEST_F(DownloadPartTest, WhatIsNotTheRestOfTheSameFileIsAskedForFromTheStart) {
       rest("Content-Encoding: gzip\r\n"),
       HTTPTestServer::response(" media", "", "206 Partial Content"),
       chunks,
+      // Beyond the largest size there is; as a signed number it is negative.
+      "HTTP/1.1 206 Part\r\nContent-Length: 9223372036854775807\r\n"
+      "Content-Range: bytes 5-9223372036854775811/9223372036854775812\r\n\r\n media",
   };
   for (const std::string& answer : answers) {
     directory_.addFile("part", "other");
@@ -145,6 +148,17 @@ TEST_F(DownloadPartTest, WhatIsNotTheRestOfTheSameFileIsAskedForFromTheStart) {
     EXPECT_EQ(contentOf(directory_ / "media"), "whole media");
     EXPECT_THAT(directory_.names(), ElementsAre("media"));
   }
+}
+
+TEST_F(DownloadPartTest, WithoutAnOpenDirectoryItBeginsAnew) {
+  directory_.addFile("part", "whole");
+  serve("/", rest(kTag));
+  Recorder recorder;
+  const Download download(*URL::parse(server_.url("/")), FilePlace(directory_ / "media"), recorder,
+                          part("\"v1\""));
+  while (!recorder.ended && runEventLoopOnce()) continue;
+  EXPECT_EQ(recorder.events, "response 11 from 0, data 11, finished");
+  EXPECT_EQ(contentOf(directory_ / "media"), "whole media");
 }
 
 TEST_F(DownloadPartTest, AFailedStatusLeavesThePartAsItIs) {

@@ -224,6 +224,18 @@ TEST_F(NetworkTransferTest, FollowsRedirects) {
   EXPECT_EQ(outcomeOf(HTTPTestServer::redirect("/missing")), "HTTP 404: HTTP status 404");
 }
 
+TEST_F(NetworkTransferTest, ARedirectWhoseConnectionIsLostIsNotFollowed) {
+  server_.serve("/5", HTTPTestServer::response("arrived"));
+  const std::string redirect = "HTTP/1.1 302 x\r\nLocation: /5\r\nContent-Length: 5\r\n\r\n";
+  EXPECT_EQ(outcomeOf([&redirect](Connection& connection) {
+              connection.send(redirect + "cut");
+              connection.reset();
+            }),
+            "transfer 56: Recv failure: Connection reset by peer");
+  EXPECT_EQ(server_.hits("/5"), 0);
+  EXPECT_EQ(outcomeOf(redirect + "cut", true), "arrived") << "an orderly end is only cut short";
+}
+
 TEST_F(NetworkTransferTest, FollowsTwentyRedirectsAndNoMore) {
   const auto path = [](int number) { return std::string("/").append(std::to_string(number)); };
   for (int i = 0; i < 21; ++i) server_.serve(path(i), HTTPTestServer::redirect(path(i + 1)));

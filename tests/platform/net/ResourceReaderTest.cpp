@@ -133,6 +133,8 @@ TEST_F(ResourceReaderTest, TheCharsetIsTheEncodingHint) {
       {"text/xml; charset", ""},
       {"text/xml; charset=", ""},
       {"charset=koi8-r; x", "koi8-r"},
+      {"text/xml; charset=koi8\\-r", "koi8\\-r"},
+      {"text/xml; charset=\"koi8-r\\", "koi8-r\\"},
       {"\"", ""},
   };
   for (const auto& [type, hint] : rows) {

@@ -13,6 +13,7 @@ namespace platform {
 namespace {
 
 using testing::ElementsAre;
+using testing::IsEmpty;
 
 /// A list that was read with its places.
 struct List {
@@ -75,6 +76,7 @@ TEST(PropertyListPartTest, PartsOfABinaryListHavePaths) {
   EXPECT_THAT(shown(entries.at(0).parts()),
               ElementsAre("[1].k[1]||a text|nowhere|nowhere", "[1].k[2]||a text|nowhere|nowhere"));
   EXPECT_EQ(entries.at(0).parts().at(0).text(), "x");
+  EXPECT_THAT(entries.at(0).parts().at(0).parts(), IsEmpty());
 }
 
 TEST(PropertyListPartTest, EveryKindHasItsName) {

@@ -3,8 +3,12 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <optional>
+#include <span>
 #include <string>
+#include <string_view>
+#include <utility>
 #include <vector>
 
 #include "tests/support/BinaryPropertyList.h"
@@ -76,6 +80,25 @@ TEST(PropertyListReaderTest, TellsWhereEverythingStands) {
   EXPECT_THAT(placesOf("\xEF\xBB\xBF<plist><true/></plist>"), ElementsAre(" 1:8 1:8 1"));
   BinaryPropertyList list;
   EXPECT_THAT(placesOf(list.bytes(list.addBytes("\x09"))), ElementsAre());
+}
+
+TEST(PropertyListReaderTest, ABinaryListThatCannotBeReadToItsEndTellsTheCause) {
+  bool isFirst = true;
+  ByteSource document(100'000, [&isFirst](std::span<char> room, ErrorSlot& error) {
+    std::optional<std::size_t> count;
+    if (std::exchange(isFirst, false)) {
+      std::fill(room.begin(), room.end(), '\0');
+      std::string_view("bplist00").copy(room.data(), room.size());
+      count = room.size();
+    } else {
+      error = ErrorRecord{"POSIX", 5, "Input/output error"};
+    }
+    return count;
+  });
+  std::optional<PropertyListFault> fault;
+  EXPECT_FALSE(readPropertyList(std::move(document), fault));
+  ASSERT_TRUE(fault);
+  EXPECT_EQ(fault->description, "Input/output error");
 }
 
 TEST(PropertyListReaderTest, WithPlacesAFaultyValueStandsAtItsBeginning) {

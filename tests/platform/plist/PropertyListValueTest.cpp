@@ -117,6 +117,20 @@ TEST(PropertyListValueTest, KindsAreNeverEqualToOneAnother) {
   EXPECT_FALSE(PropertyListValue(PropertyListValue::Data{"1"}) == PropertyListValue("1"));
 }
 
+TEST(PropertyListValueTest, ValuesOfOneKindAreEqualInAllTheirParts) {
+  using Data = PropertyListValue::Data;
+  using Array = PropertyListValue::Array;
+  const auto dictionaryOf = [](const char* key, std::int64_t value) {
+    return PropertyListValue(Dictionary{{key, value}});
+  };
+  EXPECT_TRUE(PropertyListValue(Data{"1"}) == PropertyListValue(Data{"1"}));
+  EXPECT_FALSE(PropertyListValue(Data{"1"}) == PropertyListValue(Data{"2"}));
+  EXPECT_TRUE(dictionaryOf("a", 1) == dictionaryOf("a", 1));
+  EXPECT_FALSE(dictionaryOf("a", 1) == dictionaryOf("a", 2));
+  EXPECT_FALSE(dictionaryOf("a", 1) == dictionaryOf("b", 1));
+  EXPECT_FALSE(PropertyListValue(Array{"1"}) == PropertyListValue(Array{"1", "1"}));
+}
+
 TEST(PropertyListValueTest, ACopySharesItsText) {
   const PropertyListValue original = std::string(1000, 'x');
   const PropertyListValue copy = original;  // NOLINT(performance-unnecessary-copy-initialization)

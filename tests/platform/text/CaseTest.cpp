@@ -2,7 +2,13 @@
 
 #include <gtest/gtest.h>
 
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <limits>
+#include <memory>
 #include <string>
+#include <string_view>
 
 namespace {
 
@@ -39,6 +45,22 @@ TEST(CaseTest, FoldsWhatDiffersInCaseAlone) {
 TEST(CaseTest, KeepsNUL) {
   EXPECT_EQ(platform::lowercased(std::string_view("A\0B", 3)), std::string_view("a\0b", 3));
   EXPECT_EQ(platform::uppercased(std::string_view("ä\0b", 4)), std::string_view("Ä\0B", 4));
+}
+
+// ICU counts in 32 bits. A character that is mapped stands across the end of the first piece.
+TEST(CaseTest, MapsTextsLongerThanICUTakes) {
+  constexpr std::size_t kPieceLimit = std::numeric_limits<std::int32_t>::max() / 4;
+  constexpr std::size_t kSize = kPieceLimit + 3;
+  constexpr std::string_view kAcross = "B\u00C9A";
+  // Zeros that nothing but these characters is written into need no memory.
+  const std::unique_ptr<char, void (*)(void*)> zeros(static_cast<char*>(std::calloc(kSize, 1)),
+                                                     &std::free);
+  ASSERT_TRUE(zeros);
+  kAcross.copy(zeros.get() + kPieceLimit - 2, kAcross.size());
+  const std::string lower = platform::lowercased({zeros.get(), kSize});
+  EXPECT_EQ(lower.size(), kSize);
+  EXPECT_EQ(lower.find_first_not_of('\0'), kPieceLimit - 2);
+  EXPECT_EQ(std::string_view(lower).substr(kPieceLimit - 2), std::string_view("b\u00E9a\0", 5));
 }
 
 TEST(CaseTest, KeepsMalformedSequences) {

@@ -58,6 +58,20 @@ TEST(ExpansionBudgetTest, EntityBombsAreRefused) {
   }
 }
 
+TEST(ExpansionBudgetTest, ConversionsOfCompressedDocumentsAreCounted) {
+  const auto faultOfSize = [](std::size_t size, std::optional<std::uint64_t> compressedSize) {
+    std::string document = "<?xml version='1.0' encoding='windows-1252'?>\n<!--";
+    document.append(size, '\x80').append("--><r/>");  // each becomes three bytes
+    Meter meter;
+    return faultOf(ByteSource(std::move(document), compressedSize), meter);
+  };
+  EXPECT_EQ(faultOfSize(1'600'000, 1000), "");
+  EXPECT_EQ(faultOfSize(1'700'000, 1000),
+            "a document out of all proportion to its compressed form at line 1");
+  EXPECT_EQ(faultOfSize(1'700'000, 3000), "");
+  EXPECT_EQ(faultOfSize(1'700'000, std::nullopt), "");
+}
+
 std::string chainOfEntities(std::size_t length) {
   std::string chain = "<!ENTITY e0 'x'>";
   for (std::size_t link = 1; link <= length; ++link) {
