@@ -55,5 +55,27 @@ TEST(BinaryPropertyListBudgetTest, OverlappingKeysAreCountedAsTextsToo) {
   }
 }
 
+/// As many bytes, five for each of many objects or all but a few in one, and shared elements.
+std::string objectsAndElements(bool areMany, std::size_t elements) {
+  constexpr std::size_t kObjects = 20'000;
+  BinaryPropertyList list(4);
+  const auto shared = list.addBytes("\x09");
+  if (areMany) {
+    for (std::size_t i = 0; i < kObjects; ++i) list.addBytes("\x08");
+  } else {
+    list.addBytes("\x4F\x12" + bigEndian(kObjects * 5, 4) + std::string(kObjects * 5, 'x'));
+  }
+  return list.bytes(list.addArray(std::vector<std::uint64_t>(elements, shared)));
+}
+
+TEST(BinaryPropertyListBudgetTest, TheTableOfObjectsIsCounted) {
+  std::size_t most = 0;
+  for (std::size_t step = 1U << 20; step >= 100; step /= 2) {
+    if (faultOf(objectsAndElements(false, most + step)).empty()) most += step;
+  }
+  EXPECT_EQ(faultOf(objectsAndElements(true, most / 2)), "");
+  EXPECT_EQ(faultOf(objectsAndElements(true, most)), kTooLarge);
+}
+
 }  // namespace
 }  // namespace platform
