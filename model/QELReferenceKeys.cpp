@@ -66,10 +66,6 @@ std::size_t distance(std::string_view left, std::string_view right) {
 
 }  // namespace
 
-std::span<const QELReferenceKey> QELReferenceKeys() {
-  return kKeys;
-}
-
 const QELReferenceKey* QELReferenceKeyNamed(std::string_view name) {
   const auto* const key = std::find_if(kKeys.begin(), kKeys.end(),
                                        [&](const QELReferenceKey& k) { return k.name == name; });

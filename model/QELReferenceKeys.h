@@ -1,6 +1,5 @@
 #pragma once
 
-#include <span>
 #include <string_view>
 
 /// A key of reference files, and what its value must be ("a text", see PropertyListPart).
@@ -10,11 +9,8 @@ struct QELReferenceKey {
   bool isOfEpisode() const { return name.starts_with("Episode") && name != "Episodes"; }
 };
 
-/// All keys: those that the tool reads, and those by which qel-keep remembers where things came
-/// from.
-std::span<const QELReferenceKey> QELReferenceKeys();
-
-/// The key of that name; null when there is none.
+/// The key of that name: one that the tool reads, or by which qel-keep remembers where things came
+/// from. Null when there is none.
 const QELReferenceKey* QELReferenceKeyNamed(std::string_view name);
 
 /// The key of an episode, or of a podcast, that a misspelt one is meant to be: at most two letters

@@ -83,8 +83,6 @@ class FeedParser : private platform::XMLParserEvents {
 
   bool isInItem() const { return currentEpisode_ != nullptr; }
   bool isOfDirectory(const platform::XMLName& name) const;
-  /// The text collected so far.
-  std::string_view buffer() const { return cdataBuffer_; }
   /// Where the event stands that is being delivered.
   platform::TextPosition position() const { return feedParser_.position(); }
   /// What was wrong with the XML.

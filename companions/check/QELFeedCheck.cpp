@@ -67,6 +67,7 @@ class Watch final : public FeedParser {
     text_.clear();
     if (name.qualified == "channel") channelPosition_ = open_.back().position;
     if (name.local == "item") {
+      if (isInItem()) endItem();  // as one within another does
       itemPosition_ = open_.back().position;
       hasGuid_ = false;
     }

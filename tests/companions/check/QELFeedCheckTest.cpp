@@ -52,6 +52,13 @@ TEST(QELFeedCheckTest, OfWhatIsNoFeedNothingElseIsTold) {
   }
 }
 
+TEST(QELFeedCheckTest, AnItemWithinAnotherEndsIt) {
+  const std::string uuid = "<qel:uuid>u</qel:uuid>";
+  EXPECT_THAT(foundInChannel("<item>" + uuid + "<item>" + uuid + "</item></item>"),
+              ElementsAre("f:2:29: warning: the uuid \"u\" is that of an episode before: others "
+                          "take both for one; give each its own"));
+}
+
 TEST(QELFeedCheckTest, IdentifiersCountInEpisodesAlone) {
   const std::string again =
       "warning: the guid \"g\" is that of an episode before: readers show one of the two; give "
