@@ -83,6 +83,8 @@ TEST(QELTransferDisplayTest, LongTimesHaveHours) {
   EXPECT_EQ(drawn(state("A", 1000, 3725000 + 1000), kStart + seconds(1)).substr(70), "   1:02:05");
   EXPECT_EQ(drawn(state("A", 1000, 4199000 + 1000), kStart + seconds(1)).substr(70), "   1:09:59");
   EXPECT_EQ(drawn(state("A", 1000, 4200000 + 1000), kStart + seconds(1)).substr(70), "   1:10:00");
+  EXPECT_EQ(drawn(state("A", 1, 360'000), kStart + seconds(1)).substr(70), "  99:59:59");
+  EXPECT_EQ(drawn(state("A", 1, 360'001), kStart + seconds(1)).substr(70), "     --:--");
   EXPECT_EQ(drawn(state("A", 1, 400000), kStart + seconds(1)).substr(70), "     --:--");
 }
 

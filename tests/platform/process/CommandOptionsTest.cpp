@@ -35,6 +35,11 @@ TEST(CommandOptionsTest, WordsAreTakenAsTheGNULibraryDoes) {
   EXPECT_EQ("quiet= [-][--quick]", parsed({"-", "-q", "--", "--quick"}));
 }
 
+TEST(CommandOptionsTest, AFaultLeavesNothingForTheNextLine) {
+  EXPECT_EQ("unrecognized option '-x'", parsed({"-xqj"}));
+  EXPECT_EQ("jobs=4 ", parsed({"-j", "4"}));
+}
+
 TEST(CommandOptionsTest, EachFaultIsNamed) {
   EXPECT_EQ("unrecognized option '--nope'", parsed({"a", "--nope=3", "-q"}));
   EXPECT_EQ("unrecognized option '-x'", parsed({"-qx"}));

@@ -1,8 +1,11 @@
 #include "platform/text/Memory.h"
 
 #include <gtest/gtest.h>
+#include <sys/resource.h>
 
+#include <cstddef>
 #include <cstdint>
+#include <cstdlib>
 #include <new>
 #include <string_view>
 
@@ -47,6 +50,29 @@ TEST_F(MemoryTest, RefusedMemoryIsTheNewHandlersMatterAsLongAsThereIsOne) {
   void* const block = Memory::allocate(1);
   EXPECT_EQ(callsDuring([&] { return Memory::reallocate(block, kTooMuch); }), 2);
   Memory::release(block);
+}
+
+TEST_F(MemoryTest, WhatTheNewHandlerFreesIsAskedForAgain) {
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+  GTEST_SKIP() << "a sanitizer reserves more memory than any limit";
+#endif
+  constexpr std::size_t kSize = std::size_t{1} << 30U;
+  const auto request = [] {
+    rlimit limit{};
+    ::getrlimit(RLIMIT_AS, &limit);
+    limit.rlim_cur = kSize;
+    ::setrlimit(RLIMIT_AS, &limit);
+    std::set_new_handler([] {
+      std::set_new_handler(nullptr);
+      rlimit lifted{};
+      ::getrlimit(RLIMIT_AS, &lifted);
+      lifted.rlim_cur = lifted.rlim_max;
+      ::setrlimit(RLIMIT_AS, &lifted);
+    });
+    const void* const block = Memory::allocate(kSize);
+    std::exit(block != nullptr && std::get_new_handler() == nullptr ? 0 : 1);
+  };
+  EXPECT_EXIT(request(), testing::ExitedWithCode(0), "");
 }
 
 TEST_F(MemoryTest, BlocksHoldWhatTheyShould) {
