@@ -223,12 +223,18 @@ class ConvertAllTest(FleetTestCase):
 
     def test_what_cannot_be_done_is_refused(self):
         for arguments, message in ((["a.tsv"], "there is no list a.tsv"),
+                                   (["--batch", "0", "feeds.tsv"], "argument --batch: invalid count value: '0'"),
+                                   (["--per-host", "0", "feeds.tsv"], "argument --per-host: invalid count value: '0'"),
+                                   (["--limit", "inf", "feeds.tsv"], "argument --limit: invalid seconds value: 'inf'"),
+                                   (["--limit", "nan", "feeds.tsv"], "argument --limit: invalid seconds value: 'nan'"),
+                                   (["--pause", "-1", "feeds.tsv"], "argument --pause: invalid seconds value: '-1'"),
                                    (["--bring-back", "feeds.tsv"],
                                     "--bring-back needs --nodes, and the list in the working directory"),
                                    (["--bring-back", "--nodes", "nodes", str(self.path("feeds.tsv"))],
                                     "--bring-back needs --nodes, and the list in the working directory")):
             status, _, messages = self.outcome("convert-all", *arguments)
             self.assertEqual((status, messages.splitlines()[-1]), (2, f"convert-all: error: {message}"))
+        self.assertEqual(self.outcome("list-failures", "a.tsv"), (1, "", "list-failures: there is no list a.tsv\n"))
 
     def test_another_program_of_the_same_name_is_refused(self):
         other = self.fake_tool("#!/bin/sh\nexit 0\n")
