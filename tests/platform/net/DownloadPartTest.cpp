@@ -122,6 +122,10 @@ TEST_F(DownloadPartTest, WhatIsNotTheRestOfTheSameFileIsAskedForFromTheStart) {
   const std::string chunks =
       "HTTP/1.1 206 Part\r\nTransfer-Encoding: chunked\r\nContent-Range: bytes 5-10/11\r\n\r\n"
       "6\r\n media\r\n0\r\n\r\n";
+  // As a signed number the end is negative.
+  const std::string beyondAllSizes =
+      "HTTP/1.1 206 Part\r\nContent-Length: 9223372036854775807\r\n"
+      "Content-Range: bytes 5-9223372036854775811/9223372036854775812\r\n\r\n media";
   const std::vector<std::string> answers = {
       HTTPTestServer::response("whole media", kTag),
       HTTPTestServer::response("", "Content-Range: bytes */5\r\n", "416 Range Not Satisfiable"),
@@ -136,9 +140,7 @@ TEST_F(DownloadPartTest, WhatIsNotTheRestOfTheSameFileIsAskedForFromTheStart) {
       rest("Content-Encoding: gzip\r\n"),
       HTTPTestServer::response(" media", "", "206 Partial Content"),
       chunks,
-      // Beyond the largest size there is; as a signed number it is negative.
-      "HTTP/1.1 206 Part\r\nContent-Length: 9223372036854775807\r\n"
-      "Content-Range: bytes 5-9223372036854775811/9223372036854775812\r\n\r\n media",
+      beyondAllSizes,
   };
   for (const std::string& answer : answers) {
     directory_.addFile("part", "other");
