@@ -45,7 +45,8 @@ set(CPACK_DEBIAN_PACKAGE_PRIORITY optional)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 # Loaded by the tool itself, so that it is not found among the linked ones.
 set(CPACK_DEBIAN_PACKAGE_DEPENDS "libcurl4 (>= 7.85)")
-set(CPACK_DEBIAN_PACKAGE_RECOMMENDS "ca-certificates, parallel, python3")  # the latter for the scripts among the examples
+# All but the first for the scripts of fleets among the examples; the last two of those for several machines.
+set(CPACK_DEBIAN_PACKAGE_RECOMMENDS "ca-certificates, parallel, python3, openssh-client, rsync")
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 set(CPACK_DEBIAN_COMPRESSION_TYPE xz)
 

@@ -1,19 +1,22 @@
 """What a list and its log say. They are read as bytes, since paths and URLs may be in any encoding."""
 
+import os
 import sys
 
 FORMS = (b".plist", b".podcast", b".rss", b".xml")
 
 
 def fault_of(entry, targets):
-    """What is wrong with an entry of a list, or None. The targets are those of the entries before it."""
+    """What is wrong with an entry of a list, or None. Adds its target to those of the entries before it."""
     source, _, target = entry.partition(b"\t")
     if not source or not target or b"\t" in target:
         return "not a source, a tab and a target"
     if not target.lower().endswith(FORMS):
         return "the ending of the target names no form"
-    if target in targets:
+    path = os.path.normpath(target)  # two jobs that write "a.xml" and "./a.xml" would spoil one file
+    if path in targets:
         return "an earlier line has the same target"
+    targets.add(path)
     return None
 
 
@@ -24,9 +27,7 @@ def read_list(path):
         for number, line in enumerate(lines, 1):
             entry = line.rstrip(b"\r\n")
             if entry.strip() and not entry.startswith(b"#"):
-                fault = fault_of(entry, targets)
-                targets.add(entry.partition(b"\t")[2])
-                yield number, entry, fault
+                yield number, entry, fault_of(entry, targets)
 
 
 def read_log(path):

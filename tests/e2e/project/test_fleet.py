@@ -161,18 +161,18 @@ class ConvertAllTest(FleetTestCase):
     def test_what_is_no_entry_is_passed_over_or_named_with_its_number(self):
         one, two, *_ = self.sources
         self.list("# comment", "", " ", f"{one}\ta.plist\r", "no target", "\tb.plist", f"{one}\t", "a\tb.plist\tc",
-                  "a\tc.txt", f"{two}\ta.plist", f"{two}\tb.xml", "missing.plist\tb.podcast")
+                  "a\tc.txt", f"{two}\ta.plist", f"{two}\tb.xml", "missing.plist\tb.podcast", f"{two}\t./a//../a.plist")
         no_entry, no_form, twice = ("not a source, a tab and a target", "the ending of the target names no form",
                                     "an earlier line has the same target")
-        faults = {5: no_entry, 6: no_entry, 7: no_entry, 8: no_entry, 9: no_form, 10: twice}
+        faults = {5: no_entry, 6: no_entry, 7: no_entry, 8: no_entry, 9: no_form, 10: twice, 13: twice}
         refusal = 'Could not initialize podcast source with string "missing.plist".'
         self.assertEqual(self.convert_all(), (1, "", "".join(f"feeds.tsv:{number}: {fault}\n" for number, fault in
                                                              faults.items()) +
-                                              f"missing.plist: {refusal}\n2 converted, 7 failed, 0 to do\n"))
+                                              f"missing.plist: {refusal}\n2 converted, 8 failed, 0 to do\n"))
         lines = self.path("feeds.tsv").read_text().splitlines()
         self.assertEqual(self.outcome("list-failures", "feeds.tsv")[1],
                          "".join(f"{number}\t{lines[number - 1]}\t{fault}\n" for number, fault in
-                                 [*faults.items(), (12, refusal)]))
+                                 sorted([*faults.items(), (12, refusal)])))
         self.assertTrue(self.path("a.plist").exists() and self.path("b.xml").exists())
 
     def test_lines_may_be_moved_added_and_corrected(self):
@@ -223,12 +223,18 @@ class ConvertAllTest(FleetTestCase):
 
     def test_what_cannot_be_done_is_refused(self):
         for arguments, message in ((["a.tsv"], "there is no list a.tsv"),
+                                   (["--batch", "0", "feeds.tsv"], "argument --batch: invalid count value: '0'"),
+                                   (["--per-host", "0", "feeds.tsv"], "argument --per-host: invalid count value: '0'"),
+                                   (["--limit", "inf", "feeds.tsv"], "argument --limit: invalid seconds value: 'inf'"),
+                                   (["--limit", "nan", "feeds.tsv"], "argument --limit: invalid seconds value: 'nan'"),
+                                   (["--pause", "-1", "feeds.tsv"], "argument --pause: invalid seconds value: '-1'"),
                                    (["--bring-back", "feeds.tsv"],
                                     "--bring-back needs --nodes, and the list in the working directory"),
                                    (["--bring-back", "--nodes", "nodes", str(self.path("feeds.tsv"))],
                                     "--bring-back needs --nodes, and the list in the working directory")):
             status, _, messages = self.outcome("convert-all", *arguments)
             self.assertEqual((status, messages.splitlines()[-1]), (2, f"convert-all: error: {message}"))
+        self.assertEqual(self.outcome("list-failures", "a.tsv"), (1, "", "list-failures: there is no list a.tsv\n"))
 
     def test_another_program_of_the_same_name_is_refused(self):
         other = self.fake_tool("#!/bin/sh\nexit 0\n")
