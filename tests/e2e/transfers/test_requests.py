@@ -6,11 +6,12 @@ several requests of a whole run.
 
 import gzip
 import os
+import time
 import unittest
 from base64 import b64encode
 
 from bundle_support import BundleTestCase
-from support import rss
+from support import element, item, rss
 
 PODCAST = {"PodcastName": "Night Walks"}
 FEED = rss("<title>Night Walks</title>")
@@ -133,6 +134,19 @@ class MediaTest(RequestTestCase):
                          'Could not save or download episode "(null)"')
         self.assertRequests("identity", "/one.mp3", "/two.mp3", "/three.mp3")
         self.assertEqual(self.web.connections, 2)
+
+    def test_a_server_may_be_silent_as_long_as_it_likes(self):
+        def answer(body):
+            def send(exchange):
+                exchange.head(200, [("Content-Length", str(len(body)))])
+                exchange.send(body[:1])
+                time.sleep(3)
+                exchange.send(body[1:])
+            return send
+        media = self.web.route("/one.mp3", answer(b"one"))
+        feed = self.web.route("/slow.xml", answer(rss(item(element("enclosure", url=media)))))
+        self.assertWarns(self.create(feed))
+        self.assertEqual(self.files(), {"one.mp3": b"one"})
 
     def test_bytes_of_every_value_under_schemes_in_capitals(self):
         everything = bytes(range(256)) * 5000
