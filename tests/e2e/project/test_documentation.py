@@ -181,7 +181,8 @@ class DocumentationTest(ToolTestCase):
     def test_commands_work_as_typed(self):
         counts = {document.name: self.check_commands(document) for document in DOCUMENTS if document != FLEET}
         # A document without such a block would pass unread.
-        for name in ("README.md", INSTALLED_README.name, "bundle.md", "feeds.md", "reference-file.md", *(page.name for page in MANUAL_PAGES)):
+        for name in ("README.md", INSTALLED_README.name, "bundle.md", "feeds.md", "reference-file.md",
+                     *(page.name for page in MANUAL_PAGES)):
             self.assertGreater(counts[name], 0, name)
 
     @unittest.skipUnless(has_gnu_parallel(), "GNU parallel is not installed")
@@ -289,6 +290,19 @@ class ManualPageTest(unittest.TestCase):
                 lint = subprocess.run(["mandoc", "-T", "lint"], input=text, capture_output=True, text=True,
                                       timeout=60, check=False)
                 self.assertEqual(others.sub("", (lint.stdout + lint.stderr).replace("\\-", "-")), "")
+
+
+class OptionsTest(ToolTestCase):
+    def test_the_manuals_name_the_options_that_help_prints(self):
+        for program in PROGRAMS[1:]:
+            with self.subTest(program):
+                manual = (ROOT / "docs" / f"{program}.1").read_text(encoding="utf-8")
+                rows = re.findall(r"^\.It (Fl .*)$", manual.replace("\\-", "-").replace("Fl Fl ", "Fl -"), re.MULTILINE)
+                named = [(re.findall(r"^Fl (\w)\b", row), re.search(r"Fl -([a-z-]+)", row)[1]) for row in rows]
+                printed = self.run_tool("--help", program=program).stdout.decode()
+                self.assertEqual(sorted(named), sorted(
+                    ([letter] if letter else [], name)
+                    for letter, name in re.findall(r"^  (?:-(\w), |    )--([a-z-]+)", printed, re.MULTILINE)))
 
 
 class BundleTablesTest(ToolTestCase):
