@@ -7,7 +7,7 @@ std::string QELNameLedger::reserve(const std::string& name) {
 
   constexpr std::uint64_t kFirstNumber = 2;
   std::uint64_t& number = nextNumbers_.try_emplace(name, kFirstNumber).first->second;
-  while (true) {
+  for (;;) {
     std::string numbered = platform::formattedText("%@-%lu", {name, number});
     ++number;
     if (taken_.insert(numbered).second) return numbered;

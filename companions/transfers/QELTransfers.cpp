@@ -80,5 +80,4 @@ void QELTransfers::draw(QELTransferDisplay& display) const {
 
 void QELTransfers::cancel() {
   for (const auto& fetch : running_) fetch->cancel();
-  running_.clear();
 }

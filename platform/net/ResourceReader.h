@@ -19,7 +19,7 @@ namespace platform {
 /// after decompression, are a failure too, and so is more than 1 MiB that is over 50 times its
 /// compressed size. The charset of the Content-Type is the encoding hint. For the stall limit see
 /// TransferRequest. For a file: URL see openWholeFile.
-std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error,
-                                       std::uint64_t limit = kWholeReadLimit, int stallLimit = 0);
+std::optional<ByteSource> readResource(const URL& url, ErrorSlot& error, std::uint64_t limit,
+                                       int stallLimit);
 
 }  // namespace platform

@@ -27,7 +27,7 @@ CONSTANT = {Kind.STATIC_ASSERT, Kind.ENUM_DECL, Kind.CXX_UNARY_EXPR, Kind.TEMPLA
 BODIES = {Kind.COMPOUND_STMT, Kind.CASE_STMT, Kind.DEFAULT_STMT, Kind.IF_STMT, Kind.FOR_STMT, Kind.WHILE_STMT,
           Kind.CXX_FOR_RANGE_STMT, Kind.DO_STMT}
 # Calls that only time or memory could miss.
-HINT = re.compile(r"\b(reserve|shrink_to_fit) \([^;]*\)$")
+HINT = re.compile(r"\b(reserve|shrink_to_fit|keepFreedMemory|mallopt) \([^;]*\)$")
 INTEGERS = {Type.INT, Type.UINT, Type.LONG, Type.ULONG, Type.LONGLONG, Type.ULONGLONG, Type.SHORT, Type.USHORT,
             Type.CHAR_S, Type.CHAR_U, Type.SCHAR, Type.UCHAR, Type.CHAR16, Type.CHAR32}
 NUMBERS = INTEGERS | {Type.FLOAT, Type.DOUBLE, Type.LONGDOUBLE}

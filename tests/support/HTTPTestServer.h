@@ -15,7 +15,7 @@
 ///
 ///   HTTPTestServer server;
 ///   server.serve("/feed", HTTPTestServer::response("<rss/>"));
-///   readResource(*URL::parse(server.url("/feed")), error);
+///   readResource(*URL::parse(server.url("/feed")), error, kWholeReadLimit, 0);
 ///   EXPECT_EQ(server.hits("/feed"), 1);
 class HTTPTestServer {
  public:

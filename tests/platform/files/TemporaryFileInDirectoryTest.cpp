@@ -12,6 +12,8 @@
 #include <csignal>
 #include <filesystem>
 #include <functional>
+#include <string>
+#include <string_view>
 
 #include "platform/files/TemporaryFile.h"
 #include "tests/support/ChildProcess.h"
@@ -22,6 +24,7 @@
 namespace platform {
 namespace {
 
+using testing::Contains;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
@@ -50,6 +53,24 @@ class TemporaryFileInDirectoryTest : public testing::Test {
   Directory open_;
   TemporaryFile file_;
 };
+
+TEST_F(TemporaryFileInDirectoryTest, NamesAreOfAllDigits) {
+  std::string evenDigits;
+  std::string oddDigits;
+  for (int i = 0; i < 200; ++i) {
+    ASSERT_TRUE(file_.create({open_, "x"}, error_));
+    const std::string name = directory_.names().front();
+    constexpr std::size_t kPrefix = std::string_view(".qel-").size();
+    for (std::size_t at = kPrefix; name[at] != '.'; at += 2) {
+      evenDigits += name[at];
+      oddDigits += name[at + 1];
+    }
+  }
+  for (const char digit : std::string_view("0123456789abcdef")) {
+    EXPECT_THAT(evenDigits, Contains(digit));
+    EXPECT_THAT(oddDigits, Contains(digit));
+  }
+}
 
 TEST_F(TemporaryFileInDirectoryTest, StandsInTheDirectoryWhateverItsPathHasBecome) {
   std::filesystem::create_directory(directory_ / "a");

@@ -163,7 +163,8 @@ TEST_F(DownloadTest, DataEventsComeAsTheDataComes) {
 TEST_F(DownloadTest, ResourcesAndDownloadsShareOneConnection) {
   server_.serve("/feed", HTTPTestServer::response("feed"));
   ErrorSlot error;
-  EXPECT_EQ(readResource(urlOf(server_.url("/feed")), error)->readAll(error), "feed");
+  EXPECT_EQ(readResource(urlOf(server_.url("/feed")), error, kWholeReadLimit, 0)->readAll(error),
+            "feed");
   EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
   EXPECT_EQ(downloadAnswer(HTTPTestServer::response("media")).back(), "finished");
   EXPECT_EQ(server_.connections(), 1);

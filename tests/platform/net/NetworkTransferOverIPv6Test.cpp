@@ -21,7 +21,7 @@ class NetworkTransferOverIPv6Test : public testing::Test {
   std::string read(const std::string& answer) {
     server_->serve("/", answer);
     ErrorSlot error;
-    auto source = readResource(URL::parse(server_->url("/")).value(), error);
+    auto source = readResource(URL::parse(server_->url("/")).value(), error, kWholeReadLimit, 0);
     return source ? source->readAll(error).value_or("") : error->description;
   }
 

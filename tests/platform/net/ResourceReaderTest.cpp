@@ -32,7 +32,7 @@ class ResourceReaderTest : public ::testing::Test {
   /// The resource, or the domain, code and description of the failure in one text.
   static std::string read(const std::string& url, std::uint64_t limit = kWholeReadLimit) {
     ErrorSlot error;
-    std::optional<ByteSource> source = readResource(URL::parse(url).value(), error, limit);
+    std::optional<ByteSource> source = readResource(URL::parse(url).value(), error, limit, 0);
     const std::optional<std::string> resource = source ? source->readAll(error) : std::nullopt;
     EXPECT_NE(resource.has_value(), error.has_value());
     if (resource) return *resource;
@@ -140,7 +140,8 @@ TEST_F(ResourceReaderTest, TheCharsetIsTheEncodingHint) {
   for (const auto& [type, hint] : rows) {
     server_.serve("/", HTTPTestServer::response("<rss/>", "Content-Type: " + type + "\r\n"));
     ErrorSlot error;
-    const auto source = readResource(URL::parse(server_.url("/")).value(), error);
+    const auto source =
+        readResource(URL::parse(server_.url("/")).value(), error, kWholeReadLimit, 0);
     ASSERT_TRUE(source);
     EXPECT_EQ(source->encodingHint(), hint) << type;
   }

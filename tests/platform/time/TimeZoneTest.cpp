@@ -43,6 +43,17 @@ TEST(TimeZoneTest, FixedOffsetsAreAnyNumberOfSeconds) {
   }
 }
 
+TEST(TimeZoneTest, OffsetsChangeWithTheSecond) {
+  const auto zone = TimeZone::named("America/New_York");
+  ASSERT_TRUE(zone);
+  const PointInTime spring = sys_days(year(2007) / 3 / 11) + hours(7);
+  EXPECT_EQ(zone->offsetAt(spring - std::chrono::seconds(1)), -5 * kHour);
+  EXPECT_EQ(zone->offsetAt(spring), -4 * kHour);
+  const PointInTime autumn = sys_days(year(2007) / 11 / 4) + hours(6);
+  EXPECT_EQ(zone->offsetAt(autumn - std::chrono::seconds(1)), -4 * kHour);
+  EXPECT_EQ(zone->offsetAt(autumn), -5 * kHour);
+}
+
 TEST(TimeZoneTest, NamedZonesFollowTheirRules) {
   const struct {
     const char* name;
