@@ -235,6 +235,11 @@ class ConvertAllTest(FleetTestCase):
             status, _, messages = self.outcome("convert-all", *arguments)
             self.assertEqual((status, messages.splitlines()[-1]), (2, f"convert-all: error: {message}"))
         self.assertEqual(self.outcome("list-failures", "a.tsv"), (1, "", "list-failures: there is no list a.tsv\n"))
+        self.assertEqual(self.outcome("draw-log", "a.log"),
+                         (1, "", "draw-log: [Errno 2] No such file or directory: 'a.log'\n"))
+        self.assertEqual(self.outcome("make-feeds", "many"), (
+            2, "", "usage: make-feeds COUNT [EPISODES]\n"
+                   "make-feeds: error: argument count: invalid int value: 'many'\n"))
 
     def test_another_program_of_the_same_name_is_refused(self):
         other = self.fake_tool("#!/bin/sh\nexit 0\n")
