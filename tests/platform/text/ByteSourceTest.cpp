@@ -13,7 +13,7 @@ const ErrorRecord kFailure = {"test", 1, "no more"};
 
 /// The bytes as a reader gives them that reads a few at a time; it fails behind them where it is
 /// to.
-ByteSource read(std::string bytes, bool fails = false, std::uint64_t expectedSize = 0) {
+ByteSource read(std::string bytes, bool fails = false, std::size_t expectedSize = 0) {
   return {expectedSize,
           [bytes = std::move(bytes), fails](
               std::span<char> room, ErrorSlot& error) mutable -> std::optional<std::size_t> {
