@@ -76,7 +76,7 @@ TEST(ByteSourceTest, GivesAllAtOnceWhateverItsSizeWasExpectedToBe) {
   const std::string bytes(100'000, 'x');
   ErrorSlot error;
   EXPECT_EQ(ByteSource(bytes).readAll(error), bytes);
-  for (const std::uint64_t expectedSize : {0U, 1U, 99'999U, 100'000U, 100'001U}) {
+  for (const std::size_t expectedSize : {0U, 1U, 99'999U, 100'000U, 100'001U}) {
     EXPECT_EQ(read(bytes, false, expectedSize).readAll(error), bytes) << expectedSize;
   }
   ByteSource source = read(bytes);

@@ -292,7 +292,7 @@ TEST(XMLParserTest, AFaultHasTheSamePlaceInPieces) {
 }
 
 /// The text and then a failure, or its end.
-ByteSource sourceOf(std::string text, std::uint64_t expectedSize, bool fails) {
+ByteSource sourceOf(std::string text, std::size_t expectedSize, bool fails) {
   return {expectedSize,
           [text = std::move(text), fails](std::span<char> room,
                                           ErrorSlot& error) mutable -> std::optional<std::size_t> {
