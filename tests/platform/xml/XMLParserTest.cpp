@@ -310,7 +310,7 @@ TEST(XMLParserTest, TheExpectedSizeMayBeWrong) {
   for (const std::string& start :
        {""s, "\xEF\xBB\xBF"s, "\n\n"s, "<?xml version='1.0' encoding='KOI8-R'?>"s}) {
     const std::string document = start + "<r a='b'>text</r>";
-    for (const std::uint64_t size : {0U, 1U, 5U, 30U, 1000U}) {
+    for (const std::size_t size : {0U, 1U, 5U, 30U, 1000U}) {
       XMLEventRecorder recorder;
       std::optional<XMLFault> fault;
       EXPECT_TRUE(XMLParser(sourceOf(document, size, false), recorder).parse(fault))
