@@ -50,6 +50,7 @@ enum class Kind : unsigned {
 };
 
 struct Object {
+  std::size_t number;
   Kind kind;
   std::size_t size;     // the low half of the marker, or the count that stands behind it
   std::size_t content;  // the offset of the first byte behind marker and count
@@ -87,7 +88,7 @@ class Reader {
     offsetWidth_ = sizeAt(tableEnd + 6, 1);
     referenceWidth_ = sizeAt(tableEnd + 7, 1);
     objectCount_ = sizeAt(tableEnd + 8, 8);
-    const std::size_t root = sizeAt(tableEnd + 16, 8);
+    const std::uint64_t root = unsignedAt(tableEnd + 16, 8);
     const std::size_t tableOffset = sizeAt(tableEnd + 24, 8);
 
     const auto isWidth = [](std::size_t width) { return width >= 1 && width <= kWidestInteger; };
@@ -115,48 +116,50 @@ class Reader {
     }
     std::size_t reference = level.references + level.next * referenceWidth_;
     if (level.isDictionary) {
-      if (!readKey(sizeAt(reference, referenceWidth_))) return false;
+      if (!readKey(unsignedAt(reference, referenceWidth_))) return false;
       reference += level.count * referenceWidth_;  // the values stand behind all the keys
     }
     ++level.next;
-    return readObject(sizeAt(reference, referenceWidth_));
+    return readObject(unsignedAt(reference, referenceWidth_));
   }
 
-  bool readKey(std::size_t number) {
-    const auto object = objectAt(number);
+  bool readKey(std::uint64_t reference) {
+    const auto object = objectAt(reference);
     if (!object) return false;
-    const auto key = text(number, *object);
-    if (!key) return fail("a key that is no text", number);
+    const auto key = text(*object);
+    if (!key) return fail("a key that is no text", reference);
     // Keys are not written, but compared wherever they stand.
     if (!allow(memory_.take(key->size()))) return false;
     builder_.setKey(*key);
     return true;
   }
 
-  bool readObject(std::size_t number) {
-    const auto object = objectAt(number);
+  bool readObject(std::uint64_t reference) {
+    const auto object = objectAt(reference);
     if (!object) return false;
     switch (object->kind) {
       case Kind::kArray:
       case Kind::kOrderedSet:
       case Kind::kSet:
       case Kind::kDictionary:
-        return openContainer(number, *object);
+        return openContainer(*object);
       default:
         break;
     }
-    auto value = scalar(number, *object);
-    if (!value) return fail("an object that is cut or of an unknown kind", number);
+    auto value = scalar(*object);
+    if (!value) return fail("an object that is cut or of an unknown kind", reference);
     builder_.add(std::move(*value));
     return true;
   }
 
-  bool openContainer(std::size_t number, const Object& object) {
+  bool openContainer(const Object& object) {
     const bool isDictionary = object.kind == Kind::kDictionary;
-    if (isOpen_[number]) return fail("an array or dictionary that contains itself", number);
-    if (levels_.size() >= kPropertyListDepthLimit) return fail(kPropertyListTooDeep, number);
+    if (isOpen_[object.number]) {
+      return fail("an array or dictionary that contains itself", object.number);
+    }
+    if (levels_.size() >= kPropertyListDepthLimit) return fail(kPropertyListTooDeep, object.number);
     if (!holds(object, object.size, isDictionary ? 2 * referenceWidth_ : referenceWidth_)) {
-      return fail("an array or dictionary that is cut", number);
+      return fail("an array or dictionary that is cut", object.number);
     }
     if (!allow(isDictionary ? memory_.takeFields(object.size) : memory_.takeRecords(object.size))) {
       return false;
@@ -167,31 +170,35 @@ class Reader {
     } else {
       builder_.beginArray(object.size);
     }
-    isOpen_[number] = true;
-    levels_.push_back({.number = number,
+    isOpen_[object.number] = true;
+    levels_.push_back({.number = object.number,
                        .isDictionary = isDictionary,
                        .references = object.content,
                        .count = object.size});
     return true;
   }
 
-  std::optional<Object> objectAt(std::size_t number) {
-    if (number >= objectCount_) {
-      fail("an object that does not exist", number);
+  std::optional<Object> objectAt(std::uint64_t reference) {
+    if (reference >= objectCount_) {
+      fail("an object that does not exist", reference);
       return std::nullopt;
     }
+    const auto number = static_cast<std::size_t>(reference);
     const std::size_t offset = sizeAt(tableOffset_ + number * offsetWidth_, offsetWidth_);
     if (offset < kHeader.size() || offset >= tableOffset_) {
       fail("an object that lies outside of the objects", number);
       return std::nullopt;
     }
     const std::size_t marker = sizeAt(offset, 1);
-    Object object{
-        .kind = static_cast<Kind>(marker >> 4), .size = marker & 0xF, .content = offset + 1};
+    Object object{.number = number,
+                  .kind = static_cast<Kind>(marker >> 4),
+                  .size = marker & 0xF,
+                  .content = offset + 1};
 
     const bool isCounted = object.kind >= Kind::kData;
     if (isCounted && object.size == 0xF) {
-      const Object count{.kind = Kind::kInteger, .size = 0, .content = object.content + 1};
+      const Object count{
+          .number = number, .kind = Kind::kInteger, .size = 0, .content = object.content + 1};
       const std::size_t countMarker = holds(object, 1, 1) ? sizeAt(object.content, 1) : 0;
       const std::size_t width = std::size_t{1} << (countMarker & 0x3);
       // Counts of 1, 2, 4 and 8 bytes: markers 0x10 to 0x13.
@@ -206,7 +213,7 @@ class Reader {
   }
 
   /// Absent for an object that is cut or not of a kind that a property list has.
-  std::optional<PropertyListValue> scalar(std::size_t number, const Object& object) {
+  std::optional<PropertyListValue> scalar(const Object& object) {
     switch (object.kind) {
       case Kind::kSimple:
         if (object.size == 0x8) return PropertyListValue(false);
@@ -223,7 +230,7 @@ class Reader {
       default:
         break;
     }
-    auto shared = text(number, object);
+    auto shared = text(object);
     // It is held once, and written wherever it stands.
     if (!shared || !allow(memory_.takeWritten(*shared))) return std::nullopt;
     return PropertyListValue(std::move(*shared));
@@ -272,12 +279,12 @@ class Reader {
         PropertyListValue::Data{std::string(bytes_.substr(object.content, object.size))});
   }
 
-  std::optional<Text> text(std::size_t number, const Object& object) {
+  std::optional<Text> text(const Object& object) {
     const bool isUTF16 = object.kind == Kind::kTextUTF16;
     if (!isUTF16 && object.kind != Kind::kTextASCII && object.kind != Kind::kTextUTF8) {
       return std::nullopt;
     }
-    Text& text = texts_[number];
+    Text& text = texts_[object.number];
     if (!text.empty()) return text;
 
     if (!holds(object, object.size, isUTF16 ? 2 : 1)) return std::nullopt;
