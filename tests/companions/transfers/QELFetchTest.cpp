@@ -34,6 +34,11 @@ class QELFetchTest : public testing::Test {
       connection.close();
     });
   }
+  /// Starts it, and leaves it when its first five bytes are there.
+  static void begin(QELFetch& fetch) {
+    fetch.start(5);
+    while (fetch.progress().received < 5 && platform::runEventLoopOnce()) continue;
+  }
   static void run(QELFetch& fetch) {
     fetch.start(5);
     while (fetch.state() == State::kRunning && platform::runEventLoopOnce()) continue;
@@ -72,8 +77,7 @@ TEST_F(QELFetchTest, ALocalFileThatCannotBeCopiedFails) {
 TEST_F(QELFetchTest, OneThatIsCancelledGoesOnWithItsPart) {
   server_.serve("/", std::string(kHalf) + "ETag: \"v\"\r\n\r\nfirst");
   QELFetch fetch = download();
-  fetch.start(5);
-  while (fetch.progress().received < 5 && platform::runEventLoopOnce()) continue;
+  begin(fetch);
   fetch.cancel();
   EXPECT_EQ(fetch.state(), State::kWaiting);
   EXPECT_FALSE(platform::runEventLoopOnce());
@@ -91,8 +95,7 @@ TEST_F(QELFetchTest, OneThatIsCancelledGoesOnWithItsPart) {
 TEST_F(QELFetchTest, OneThatIsCancelledLeavesNoPartThatNothingVouchesFor) {
   server_.serve("/", std::string(kHalf) + "\r\nfirst");
   QELFetch fetch = download();
-  fetch.start(5);
-  while (fetch.progress().received < 5 && platform::runEventLoopOnce()) continue;
+  begin(fetch);
   EXPECT_EQ(contentOf(directory_ / fetch.partName()), "first");
   fetch.cancel();
   EXPECT_THAT(directory_.names(), IsEmpty());
