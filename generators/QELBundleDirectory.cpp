@@ -34,11 +34,7 @@ bool QELBundleDirectory::open(const std::string& path, ErrorSlot& error, Directo
 
   ErrorSlot ignored;  // a poster that then cannot be saved is warned about
   posters_ = bundle_.openOrMake(std::string(kPostersName), ignored).value_or(Directory());
-  // Another run may fill this very directory as a bundle of its own. Where it is this bundle, the
-  // lock is held by this run.
-  if (posters_.lock(Directory::Wait::kNot) != Directory::Lock::kHeldByAnother) {
-    platform::removeStaleTemporaryFiles(posters_);
-  }
+  platform::removeStaleTemporaryFiles(posters_);
   return true;
 }
 

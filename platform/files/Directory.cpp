@@ -72,13 +72,17 @@ std::optional<Directory> Directory::openOrMake(const std::string& name, ErrorSlo
     return std::nullopt;
   }
   // What exists is not made, since a read-only file system may refuse before it looks.
-  std::optional<Directory> child = openAt(descriptor(), name, error);
-  if (!child && error->code == ENOENT) {
+  ErrorSlot fault;
+  std::optional<Directory> child = openAt(descriptor(), name, fault);
+  if (!child && fault->code == ENOENT) {
     const int failure = ::mkdirat(descriptor(), name.c_str(), 0777) == 0 ? 0 : errno;
-    child = openAt(descriptor(), name, error);
-    if (!child && failure != 0) error = posixError(failure);
+    child = openAt(descriptor(), name, fault);
+    if (!child && failure != 0) fault = posixError(failure);
   }
-  if (!child) return std::nullopt;
+  if (!child) {
+    error = fault;
+    return std::nullopt;
+  }
   if (!isTrusted(descriptor(), name, child->descriptor())) {
     error = posixError(EPERM, "Not a directory of one's own");
     return std::nullopt;
@@ -87,7 +91,6 @@ std::optional<Directory> Directory::openOrMake(const std::string& name, ErrorSlo
     error = posixError(EXDEV, "The link leads out of the directory");
     return std::nullopt;
   }
-  error.reset();
   return child;
 }
 
@@ -132,11 +135,10 @@ std::optional<std::uint64_t> Directory::fileSize(const std::string& name) const 
 
 std::optional<FileAttributes> Directory::attributesForSuccessor(const std::string& name) const {
   struct stat status {};
-  if (!lookAt(descriptor(), name, status) || !S_ISREG(status.st_mode) ||
-      status.st_uid != ::geteuid()) {
-    return std::nullopt;
-  }
-  return FileAttributes{status.st_mode & kPermissions, std::nullopt};
+  if (!lookAt(descriptor(), name, status) || !S_ISREG(status.st_mode)) return std::nullopt;
+  if (status.st_uid == ::geteuid()) return FileAttributes{status.st_mode & kPermissions, {}};
+  if ((status.st_mode & S_IROTH) != 0) return std::nullopt;
+  return FileAttributes{S_IRUSR | S_IWUSR, {}};
 }
 
 bool Directory::remove(const std::string& name, ErrorSlot& error) const {

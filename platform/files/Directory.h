@@ -39,11 +39,13 @@ class Directory {
   static std::optional<Directory> open(const std::string& path, ErrorSlot& error);
   /// The directory of the name below this one, made first where it is missing. A link is followed
   /// to wherever it leads, as long as that is this directory or below it; it fails otherwise
-  /// (EXDEV). Where everyone may make files, a link and a stranger's directory fail (EPERM).
+  /// (EXDEV). Where everyone may make files and remove his own alone (/tmp), a link and a
+  /// stranger's directory fail (EPERM). No value, and the slot filled, on failure.
   std::optional<Directory> openOrMake(const std::string& name, ErrorSlot& error) const;
 
   bool isOpen() const { return descriptor_.isOpen(); }
-  /// Whether the path, links followed, leads to this directory now.
+  /// Whether the path, links followed, leads to this directory now; not where it cannot be looked
+  /// at.
   bool isAt(const std::string& path) const;
   /// For the sources of this folder; -1 when not open.
   int descriptor() const { return descriptor_.get(); }
@@ -57,8 +59,9 @@ class Directory {
   std::optional<FileIdentity> identity(const std::string& name) const;
   /// The size in bytes of a regular file; absent for anything else.
   std::optional<std::uint64_t> fileSize(const std::string& name) const;
-  /// What a successor of a regular file of this user takes over from it, its time not included;
-  /// absent for anything else.
+  /// What the successor of a regular file takes over from it, its time not included: of one of this
+  /// user its permissions; of a stranger's, which may have been put there on purpose, only that not
+  /// everyone may read it, by being this user's alone. Absent for anything else.
   std::optional<FileAttributes> attributesForSuccessor(const std::string& name) const;
 
   /// Removes a file, or a link itself.

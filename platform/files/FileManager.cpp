@@ -39,17 +39,20 @@ std::uint64_t copyInsideKernel(const RegularFile& source, const TemporaryFile& c
   return length;
 }
 
-/// Fails for a file that changed meanwhile: the copy could be of nothing that ever was.
+/// Fails (EIO) for a file that changed meanwhile: the copy could be of nothing that ever was.
 bool copyAll(RegularFile& source, TemporaryFile& copy, ErrorSlot& error) {
   std::uint64_t length = copyInsideKernel(source, copy);
   std::array<char, std::size_t{16} << 10U> buffer;  // on the stack, which may be small
   for (;;) {
     const std::optional<std::size_t> count = source.read(buffer, error);
     if (!count) return false;
-    if (*count == 0) return length >= source.size() && !source.hasChanged();
+    if (*count == 0) break;
     if (!copy.write(std::string_view(buffer.data(), *count), error)) return false;
     length += *count;
   }
+  if (length >= source.size() && !source.hasChanged()) return true;
+  error = posixError(EIO, "The file changed while it was copied");
+  return false;
 }
 
 bool isTaken(const FilePlace& place) {

@@ -37,7 +37,8 @@ bool createDirectories(const std::string& path, ErrorSlot& error);
 
 /// Copies a regular file to a place at which nothing exists yet (not even a dangling symbolic
 /// link). The copy appears under its name whole and on the disk, with the permissions and the time
-/// of the original, or not at all. An original that changes meanwhile is a failure.
+/// of the original, or not at all. An original that changes meanwhile is a failure. False, and the
+/// slot filled, on failure.
 bool copyFile(const std::string& source, const FilePlace& place, ErrorSlot& error);
 bool copyFile(const std::string& source, const FilePlace& place);
 

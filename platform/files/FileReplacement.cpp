@@ -70,7 +70,7 @@ bool replaceFile(const std::string& path, std::string_view bytes, ErrorSlot& err
   if (!target) return false;
   const std::string parent = directoryOf(*target);
   const std::string name = target->substr(parent.size());
-  const std::optional<Directory> directory = Directory::open(parent.empty() ? "." : parent, error);
+  std::optional<Directory> directory = Directory::open(parent.empty() ? "." : parent, error);
   if (!directory) return false;
   removeStaleTemporaryFiles(*directory);
   TemporaryFile file;

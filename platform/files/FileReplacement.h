@@ -12,8 +12,8 @@ namespace platform {
 ///
 /// They are written beside it and are on the disk before they take its name, in one step: whoever
 /// reads the file, and whoever finds it after the power went, has the old content or the new one. A
-/// file that was there hands its permissions on. Where the path is a symbolic link, dangling or
-/// not, the file that it leads to is the one that is replaced.
+/// file that was there hands its permissions on (see Directory::attributesForSuccessor). Where the
+/// path is a symbolic link, dangling or not, the file that it leads to is the one that is replaced.
 ///
 /// What exists and is no regular file (a FIFO, a device) is written itself, as are open descriptors
 /// that have a path (/dev/fd/3) and the standard output (kStandardOutputPath, "-"): then a failure

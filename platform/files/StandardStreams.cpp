@@ -13,7 +13,7 @@
 namespace platform {
 namespace {
 
-/// The errno value of the last write to standard output that failed; 0 without one.
+/// The errno value of the first write to standard output that failed; 0 without one.
 int& outputFailure() {
   static int code = 0;
   return code;
@@ -21,7 +21,7 @@ int& outputFailure() {
 
 ssize_t writeBuffered(void* /*cookie*/, const char* bytes, std::size_t length) {
   if (writeAll(STDOUT_FILENO, {bytes, length})) return static_cast<ssize_t>(length);
-  outputFailure() = errno;
+  if (outputFailure() == 0) outputFailure() = errno;
   return 0;
 }
 

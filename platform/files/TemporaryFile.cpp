@@ -367,7 +367,11 @@ bool isTemporaryFileName(std::string_view name) {
          std::string_view::npos;
 }
 
-void removeStaleTemporaryFiles(const Directory& directory) {
+void removeStaleTemporaryFiles(Directory& directory) {
+  if (!directory.isLocked() &&
+      directory.lock(Directory::Wait::kNot) == Directory::Lock::kHeldByAnother) {
+    return;
+  }
   FileDescriptor listed(::fcntl(directory.descriptor(), F_DUPFD_CLOEXEC, 0));
   const std::unique_ptr<DIR, int (*)(DIR*)> entries(::fdopendir(listed.get()), &::closedir);
   if (!entries) return;
@@ -378,7 +382,7 @@ void removeStaleTemporaryFiles(const Directory& directory) {
     if (!isTemporaryFileName(name) || !directory.fileSize(name)) continue;
     constexpr int kFlags = O_NONBLOCK | O_NOFOLLOW;
     FileDescriptor file = FileDescriptor::openAt(directory.descriptor(), name, O_RDWR | kFlags);
-    // A copy may have the permissions of its original already; only NFS locks no file like that.
+    // A killed copy may be read-only already. A read-only descriptor can be locked except on NFS.
     if (!file.isOpen() && errno == EACCES) {
       file = FileDescriptor::openAt(directory.descriptor(), name, O_RDONLY | kFlags);
     }

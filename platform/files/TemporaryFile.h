@@ -85,7 +85,9 @@ class TemporaryFile {
 bool isTemporaryFileName(std::string_view name);
 
 /// Removes from a directory the hidden files that a killed run left there. A file that a living
-/// process still writes is not touched, nor is any other; failures are not reported.
-void removeStaleTemporaryFiles(const Directory& directory);
+/// process still writes is not touched, nor is any other; failures are not reported. The directory
+/// is locked where nobody else holds its lock, as it has to be: files in a directory that is locked
+/// have no locks of their own.
+void removeStaleTemporaryFiles(Directory& directory);
 
 }  // namespace platform

@@ -47,6 +47,12 @@ int mkdir(const char* path, mode_t mode) noexcept {
   return answer ? answer(path, mode) : ::mkdirat(AT_FDCWD, path, mode);
 }
 
+int renameat(int from, const char* oldPath, int to, const char* newPath) noexcept {
+  const auto& answer = interposedCalls().renameat;
+  return answer ? answer(from, oldPath, newPath)
+                : static_cast<int>(::syscall(SYS_renameat, from, oldPath, to, newPath));
+}
+
 int stat(const char* path, struct stat* status) noexcept {
   const auto& answer = interposedCalls().stat;
   return answer ? answer(path, status) : ::fstatat(AT_FDCWD, path, status, 0);

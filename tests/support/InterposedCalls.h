@@ -17,6 +17,7 @@ struct InterposedCalls {
   std::function<int(void* buffer, std::size_t length)> getentropy;
   std::function<int(int descriptor, struct stat* status)> fstat;
   std::function<int(const char* path, mode_t mode)> mkdir;
+  std::function<int(int directory, const char* from, const char* to)> renameat;  // in one directory
   std::function<int(const char* path, struct stat* status)> stat;
 };
 

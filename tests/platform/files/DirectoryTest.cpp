@@ -263,13 +263,17 @@ TEST_F(DirectoryTest, TakesNothingOfStrangersInDirectoriesOfEveryone) {
   EXPECT_TRUE(directory.openOrMake("art", error_));
 }
 
-TEST_F(DirectoryTest, SuccessorsTakeNothingOverFromStrangers) {
+TEST_F(DirectoryTest, SuccessorsTakeNothingOverFromStrangersButPrivacy) {
   ::chmod(root_.addFile("file", "").c_str(), 0640);
   const Directory directory = opened(root_.path());
   const auto attributes = directory.attributesForSuccessor("file");
   ASSERT_TRUE(attributes);
   EXPECT_EQ(attributes->mode, 0640U);
   if (::chown((root_ / "file").c_str(), 65534, 65534) != 0) GTEST_SKIP() << "root is needed";
+  const auto ofStranger = directory.attributesForSuccessor("file");
+  ASSERT_TRUE(ofStranger);
+  EXPECT_EQ(ofStranger->mode, 0600U);
+  ::chmod((root_ / "file").c_str(), 0666);
   EXPECT_FALSE(directory.attributesForSuccessor("file"));
 }
 

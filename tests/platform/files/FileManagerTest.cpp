@@ -296,7 +296,8 @@ TEST_F(FileManagerTest, CopyOfAFileThatIsWrittenMeanwhileIsRefused) {
       directory_.addFile("source", content);
       return ssize_t{0};
     }));
-    EXPECT_FALSE(copyFile(source, directory_ / "copy")) << content;
+    EXPECT_FALSE(copyFile(source, directory_ / "copy", error_)) << content;
+    EXPECT_EQ(error_, (ErrorRecord{"POSIX", EIO, "The file changed while it was copied"}));
     EXPECT_THAT(directory_.names(), ElementsAre("source"));
   }
 }

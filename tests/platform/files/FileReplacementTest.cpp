@@ -13,6 +13,8 @@
 #include <filesystem>
 #include <thread>
 
+#include "platform/files/Directory.h"
+#include "platform/files/TemporaryFile.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/RefusedSystemCall.h"
 #include "tests/support/TemporaryDirectory.h"
@@ -56,6 +58,23 @@ TEST_F(FileReplacementTest, PermissionsAreHandedOn) {
   ::chmod(path.c_str(), 0604);
   EXPECT_TRUE(replaces(path));
   EXPECT_EQ(std::filesystem::status(path).permissions(), std::filesystem::perms(0604));
+}
+
+// Whoever fills the directory as a bundle has it locked as a whole, and not each file.
+TEST_F(FileReplacementTest, LeavesWhatARunInTheSameDirectoryStillWrites) {
+  Directory bundle = *Directory::open(directory_.path(), error_);
+  ASSERT_EQ(bundle.lock(Directory::Wait::kForever), Directory::Lock::kTaken);
+  TemporaryFile file;
+  ASSERT_TRUE(file.create({bundle, "one.mp3"}, error_));
+  EXPECT_TRUE(replaces(directory_ / "feed.xml"));
+  EXPECT_TRUE(file.commitNew(error_));
+  EXPECT_THAT(directory_.names(), ElementsAre("feed.xml", "one.mp3"));
+}
+
+TEST_F(FileReplacementTest, RemovesWhatAKilledRunLeft) {
+  directory_.addFile(".qel-0123456789abcdef.part", "stale");
+  EXPECT_TRUE(replaces(directory_ / "feed.xml"));
+  EXPECT_THAT(directory_.names(), ElementsAre("feed.xml"));
 }
 
 TEST_F(FileReplacementTest, LinksAreWrittenThrough) {

@@ -172,6 +172,24 @@ TEST_F(TemporaryFileInDirectoryTest, NameThatWasHeldIsFreeAgainAfterAFailure) {
   EXPECT_THAT(directory_.names(), IsEmpty());
 }
 
+TEST_F(TemporaryFileInDirectoryTest, NameThatIsHeldGetsItsFileBeforeASignalIsHeard) {
+  if (!canRefuseSystemCalls()) GTEST_SKIP() << kCannotRefuse;
+  const int status = statusOfChild([&] {
+    const Interposed signals(
+        &InterposedCalls::renameat,
+        std::function([&](int directory, const char* from, const char* to) {
+          ::raise(SIGTERM);
+          return static_cast<int>(::syscall(SYS_renameat, directory, from, directory, to));
+        }));
+    refuseSystemCall(SYS_renameat2, EINVAL);
+    refuseSystemCall(SYS_linkat, EPERM);
+    return isCommitted("new") ? 0 : 1;
+  });
+  EXPECT_EQ(WTERMSIG(status), SIGTERM);
+  EXPECT_THAT(directory_.names(), ElementsAre("new"));
+  EXPECT_EQ(contentOf(directory_ / "new"), "new");
+}
+
 // Where the directory as a whole is locked, its files need no locks of their own.
 TEST_F(TemporaryFileInDirectoryTest, LocksItselfOnlyWhereTheDirectoryIsNotLocked) {
   int fileLocks = 0;

@@ -45,7 +45,10 @@ class TemporaryFileTest : public testing::Test {
   bool isReplaced(const std::string& destination, std::string_view content) {
     return createWith(content, destination) && file_.commitReplacing(error_);
   }
-  void removeStale() { removeStaleTemporaryFiles(*Directory::open(directory_.path(), error_)); }
+  void removeStale() {
+    Directory directory = *Directory::open(directory_.path(), error_);
+    removeStaleTemporaryFiles(directory);
+  }
   std::string description() const { return error_ ? error_->description : ""; }
 
   TemporaryDirectory directory_;
@@ -356,14 +359,15 @@ TEST_F(TemporaryFileTest, OnlyHiddenFilesOfOursAreStale) {
   const std::vector<std::string> before = directory_.names();
   directory_.addFile(".qel-0123456789abcdef.part", "stale");
   removeStale();
-  removeStaleTemporaryFiles(Directory());
+  Directory nowhere;
+  removeStaleTemporaryFiles(nowhere);
   EXPECT_EQ(directory_.names(), before);
 }
 
 TEST_F(TemporaryFileTest, StaleFilesThatCannotBeOpenedStay) {
   directory_.addFile(".qel-0123456789abcdef.part", "stale");
   EXPECT_TRUE(holdsInChild([&] {
-    const std::optional<Directory> directory = Directory::open(directory_.path(), error_);
+    std::optional<Directory> directory = Directory::open(directory_.path(), error_);
     // The list of the directory takes the last descriptor that is to be had.
     const FileDescriptor next(::dup(STDIN_FILENO));
     const rlim_t count = static_cast<rlim_t>(next.get()) + 2;
