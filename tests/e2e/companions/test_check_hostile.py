@@ -31,7 +31,11 @@ class HostileTest(ToolTestCase):
         document = plistlib.dumps(SHOW, fmt=plistlib.FMT_BINARY)
         for position in range(6, len(document), STEP):
             for byte in (0x00, 0x7F, 0xD1, 0xFF):
-                self.check(document[:position] + bytes([byte]) + document[position + 1:])
+                damaged = document[:position] + bytes([byte]) + document[position + 1:]
+                findings = self.check(damaged)
+                if self.run_tool("parsefeed", "-i", stdin=damaged).status != 0:
+                    with self.subTest(position=position, byte=byte):
+                        self.assertIn(": error: ", "".join(findings))
 
     def test_depth(self):
         deep = 100_000

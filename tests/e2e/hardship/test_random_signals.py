@@ -241,19 +241,22 @@ class KillTest(InterruptionTestCase):
         self.assertGreater(amid, 0, "no kill met a bundle half made")
 
     def test_hidden_files_of_a_killed_run_are_cleared_away(self):
-        url, gate = self.held(self.server(), "/one.mp3", b"half of it")
-        process = self.begin({"Episodes": [{"EpisodeReference": url}]})
-        gate.reached()
-        eventually(lambda: hidden(self.bundle))
-        process.kill()
-        process.communicate(timeout=60)
-        name, = hidden(self.bundle)
-        for folder in ("Posters", ".."):
-            (self.bundle / folder / name).write_bytes(b"half of it")
-        (self.bundle / ".qel-notes.part").write_bytes(b"mine")
-        self.assertRuns(self.create({}), "Fetching 0 episodes")
-        self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", ".qel-notes.part"})
-        self.assertTrue(self.path(name).exists())
+        for number in (signal.SIGKILL, signal.SIGABRT, signal.SIGSEGV):
+            with self.subTest(number):
+                url, gate = self.held(self.server(), f"/{number}.mp3", b"half of it")
+                process = self.begin({"Episodes": [{"EpisodeReference": url}]})
+                gate.reached()
+                eventually(lambda: hidden(self.bundle))
+                process.send_signal(number)
+                process.communicate(timeout=60)
+                name, = hidden(self.bundle)
+                for folder in ("Posters", ".."):
+                    (self.bundle / folder / name).write_bytes(b"half of it")
+                (self.bundle / ".qel-notes.part").write_bytes(b"mine")
+                self.assertRuns(self.create({}), "Fetching 0 episodes")
+                self.assertEqual(contents(self.bundle).keys(), {"Info.plist", "Posters", ".qel-notes.part"})
+                self.assertTrue(self.path(name).exists())
+                (self.bundle / ".qel-notes.part").unlink()
 
 
 if __name__ == "__main__":
