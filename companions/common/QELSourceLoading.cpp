@@ -49,8 +49,22 @@ bool QELIsSourceItself(const std::string& file, const std::string& source) {
 
 std::string QELLastingSource(const std::string& source) {
   if (QELIsOnNetwork(source) || source.starts_with("file:")) return source;
-  std::error_code ignored;
-  return std::filesystem::absolute(source, ignored).lexically_normal().string();
+  std::error_code failure;
+  const std::filesystem::path absolute = std::filesystem::absolute(source, failure);
+  if (failure) return source;
+  std::filesystem::path lasting;
+  for (const std::filesystem::path& part : absolute) {
+    if (part == "..") {
+      // It leads out of where a link leads to. Other links may lead elsewhere tomorrow.
+      if (std::filesystem::is_symlink(lasting, failure)) {
+        lasting = std::filesystem::weakly_canonical(lasting, failure);
+      }
+      lasting = lasting.parent_path();
+    } else if (part != ".") {
+      lasting /= part;
+    }
+  }
+  return lasting.string();
 }
 
 std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <memory>
 #include <string>
 
@@ -18,7 +19,41 @@ TEST(QELSourceLoadingTest, TellsWhatLiesOnTheNetwork) {
     EXPECT_FALSE(QELIsOnNetwork(source)) << source;
   }
   EXPECT_EQ(QELLastingSource("file:///a/../b.xml"), "file:///a/../b.xml");
-  EXPECT_EQ(QELLastingSource("/a/../b.plist"), "/b.plist");
+}
+
+TEST(QELSourceLoadingTest, ASourceIsFoundFromAnyWorkingDirectory) {
+  for (const char* path : {"/a/../b.plist", "/../b.plist", "//b.plist", "/./b.plist"}) {
+    EXPECT_EQ(QELLastingSource(path), "/b.plist") << path;
+  }
+  EXPECT_EQ(QELLastingSource("/a/b/"), "/a/b/");
+  const TemporaryDirectory directory;
+  const std::string real = std::filesystem::canonical(directory.path()).string();
+  const std::filesystem::path before = std::filesystem::current_path();
+  std::filesystem::current_path(real);
+  EXPECT_EQ(QELLastingSource("b.plist"), real + "/b.plist");
+  EXPECT_EQ(QELLastingSource("./c/../b.plist"), real + "/b.plist");
+  std::filesystem::create_directory("gone");
+  std::filesystem::current_path("gone");
+  std::filesystem::remove(real + "/gone");
+  EXPECT_EQ(QELLastingSource("b.plist"), "b.plist");
+  EXPECT_EQ(QELLastingSource(""), "");
+  EXPECT_EQ(QELLastingSource("/b.plist"), "/b.plist");
+  std::filesystem::current_path(before);
+}
+
+TEST(QELSourceLoadingTest, LinksKeepTheirNamesUnlessTheWayLeadsOutOfThem) {
+  const TemporaryDirectory directory;
+  std::filesystem::create_directories(directory / "away/today/show");
+  std::filesystem::create_directory_symlink("away/today", directory / "current");
+  std::filesystem::create_directory_symlink("today", directory / "away/again");
+  std::filesystem::create_symlink("current/b.plist", directory / "b.plist");
+  const std::string away = std::filesystem::canonical(directory / "away").string();
+  EXPECT_EQ(QELLastingSource(directory / "b.plist"), directory / "b.plist");
+  EXPECT_EQ(QELLastingSource(directory / "away/../b.plist"), directory / "b.plist");
+  EXPECT_EQ(QELLastingSource(directory / "current/b.plist"), directory / "current/b.plist");
+  EXPECT_EQ(QELLastingSource(directory / "current/show/../b.plist"), directory / "current/b.plist");
+  EXPECT_EQ(QELLastingSource(directory / "current/../b.plist"), away + "/b.plist");
+  EXPECT_EQ(QELLastingSource(directory / "current/../again/b.plist"), away + "/again/b.plist");
 }
 
 class LoadedSourceTest : public testing::Test {

@@ -241,6 +241,30 @@ class KeepTest(KeepTestCase):
         self.assertEqual(self.listed("EpisodePosterReference"), ["Posters/1.png"])
         self.assertKept(self.keep(source=None), "0 new, 1 known, 0 failed")
 
+    def test_a_way_out_of_a_link_leads_to_where_the_link_is_not(self):
+        for folder in (self.directory, self.path("away")):
+            (folder / "show").mkdir(parents=True)
+            (folder / "1.mp3").write_bytes(b"media 1" if folder.name == "away" else b"another")
+        (self.path("away") / "feed.plist").write_bytes(plistlib.dumps({"Episodes": [
+            {"EpisodeName": "Episode 1", "EpisodeReference": "1.mp3"}]}))
+        self.path("link").symlink_to("away/show")
+        self.assertKept(self.keep(source="link/../feed.plist"), "1 new, 0 known, 0 failed")
+        self.media(1)
+        self.assertTrue(os.path.samefile(self.info()["PodcastOrigin"], self.path("away") / "feed.plist"))
+        self.assertKept(self.keep(source=None), "0 new, 1 known, 0 failed")
+
+    def test_a_source_is_remembered_by_the_name_of_a_link(self):
+        for day in ("monday", "tuesday"):
+            self.path(day).mkdir()
+            source = self.reference({"Episodes": [{"EpisodeName": f"Episode {day}", "EpisodeReference":
+                                                   self.web.serve(f"/{day}.mp3", b"media")}]})
+            source.rename(self.path(day) / "feed.plist")
+            self.path("current").unlink(missing_ok=True)
+            self.path("current").symlink_to(day)
+            result = self.keep(source="current/feed.plist" if day == "monday" else None)
+        self.assertKept(result, "1 new, 0 known, 0 failed")
+        self.assertEqual(self.info()["PodcastOrigin"], str(self.path("current") / "feed.plist"))
+
     def test_the_case_of_uuids_does_not_matter(self):
         for case in (str.upper, str.lower):
             source = self.reference({"Episodes": [{

@@ -96,6 +96,16 @@ class PublishTest(PublishTestCase):
             self.assertEqual(enclosures[0].getAttribute("length"),
                              str((EXAMPLE / "media" / "first-light.wav").stat().st_size))
 
+    def test_files_lie_beside_a_reference_file_behind_a_link(self):
+        away = self.path("away")
+        (away / "show").mkdir(parents=True)
+        (away / "a.mp3").write_bytes(b"12345")
+        self.show({"EpisodeName": "e", "EpisodeUUID": "u", "EpisodeDate": datetime(2026, 5, 4),
+                   "EpisodeReference": "a.mp3"})[0].rename(away / "show.plist")
+        self.path("link").symlink_to("away/show")
+        (entry,) = self.items("link/../show.plist", "-b", BASE, *ALL)
+        self.assertEqual(entry.getElementsByTagName("enclosure")[0].getAttribute("length"), "5")
+
     def test_a_feed_on_disk_has_its_files_beside_it(self):
         self.write("a.mp3", b"12345")
         feed = self.feed(rss(element("title", "t"), element("description", "d"), "<image><url>p.png</url></image>",
