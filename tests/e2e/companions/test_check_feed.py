@@ -99,6 +99,10 @@ class TakenTest(FeedTestCase):
             'warning: the uuid "u" is that of an episode before: others take both for one; give each its own',
             'warning: the guid "g" is that of an episode before: readers show one of the two; give each its own'])
 
+    def test_an_empty_uuid_is_none(self):
+        result = self.run_tool("-", stdin=rss(item("<qel:uuid/>"), item(element("qel:uuid", "u"))), program="qel-check")
+        self.assertIn(b" 0 with a date, 1 with a uuid, ", result.stdout)
+
     def test_labels(self):
         for label in ("yes", "CLEAN", "no", "False", ""):
             self.assertEqual(self.said(element("orvane:explicit", label)), [])
