@@ -304,6 +304,13 @@ class KeepTest(KeepTestCase):
                             'qel-keep: "Episode 1": ftp://a.example/1.mp3: '
                             "Only http, https and file URLs are fetched\n")
 
+    def test_a_url_that_is_said_to_be_local_is_told_as_such(self):
+        for location in ("https://a.example/1.mp3", "HTTP://a.example/1.mp3", "file:///1.mp3"):
+            source = self.reference({"Episodes": [{"EpisodeName": "Episode 1", "EpisodeReference": location,
+                                                   "EpisodeReferenceType": "local"}]})
+            self.assertKept(self.keep(source=source), "0 new, 0 known, 1 failed", 1,
+                            f'qel-keep: "Episode 1": {location}: It is a URL, but its type is not "remote"\n')
+
     def test_a_feed_on_disk_may_name_local_files(self):
         media = self.write("one.mp3", b"media 1")
         feed = self.feed(rss(self.episode(1, url=str(media))), name="my feed.xml")

@@ -41,7 +41,9 @@ class OptionsTest(KeepTestCase):
                               (self.write("feed.xml", b"<rss/>"), "it is no reference file or bundle; "
                                "a feed on the disk is named by a file:/// URL"),
                               ("HTTP://a.example/", "a URL begins with http:, https: or file:, in lower case"),
-                              ("http://a b/", '" " is written %20'),
+                              ("FTP://a.example/", "a URL begins with http:, https: or file:, in lower case"),
+                              ("http://a b/", '" " is written %20'), ("pcast://a b/x", '" " is written %20'),
+                              ("pcast:///x", "it has no host"),
                               (f"file://{self.directory}/my feed.xml", '" " is written %20')]:
             with self.subTest(source):
                 self.assertRefused(self.keep(source=source), f"{source}: {cause}")
