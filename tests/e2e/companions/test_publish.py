@@ -233,7 +233,11 @@ class PublishTest(PublishTestCase):
             first, *others = whole["Episodes"]
             (bundle / "Info.plist").write_bytes(plistlib.dumps(
                 {**whole, **podcast, "Episodes": [*others, {**first, **episode}]}))
-            self.published(bundle, "-b", BASE, *ALL, warnings=warnings)
+            feed = self.write("lantern.podcast/feed.xml", rss(*(element(name, "x") for name in ("title", "description")),
+                                                              "<image><url>Posters/Podcast.png</url></image>"))
+            for source in (bundle, bundle / "Info.plist", "lantern.podcast/Info.plist", feed.as_uri()):
+                self.published(source, "-b", BASE, *ALL, warnings=warnings)
+            self.assertNotIn(b"remembers", self.publish(bundle / "Info.plist", *ALL, "-").stderr)
         self.published(*self.show({"EpisodeName": "e", "EpisodeUUID": "u", "EpisodeDate": datetime(2026, 5, 4),
                                    "EpisodeReference": private, "EpisodeFileSize": 5}),
                        warnings="qel-publish: warning: its URL has a user or a password, which all can read in the "
