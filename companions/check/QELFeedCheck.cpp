@@ -156,7 +156,7 @@ class Watch final : public FeedParser {
           "%@ is no date, and the episode has none: write it like %@",
           {QELQuoted(text_), kRightDate});
     } else if (!fault.empty() && date_) {
-      add(QELSeverity::kWarning, element.position, "%@ is taken for %@, since %@: write it like %@",
+      add(QELSeverity::kWarning, element.position, "%@ is taken for %@, but %@: write it like %@",
           {QELQuoted(text_), platform::propertyListDate(*date_), fault, kRightDate});
     }
   }
