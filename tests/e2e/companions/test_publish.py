@@ -209,7 +209,6 @@ class PublishTest(PublishTestCase):
         self.assertEqual(len(channel.getElementsByTagName("item")), 8)
         self.assertEqual(len(channel.getElementsByTagName("enclosure")), 2)
 
-
     def test_a_file_that_is_missing_is_something_to_look_at(self):
         for key, gone in (("EpisodeReference", '"e"'), ("EpisodePosterReference", 'the poster of "e"')):
             self.write("a.mp3", b"12345")
@@ -273,8 +272,8 @@ class WrongUseTest(PublishTestCase):
             before = Path(feed).read_bytes()
             self.assertWrong(f"'{feed}' is the source itself", show, feed)
             self.assertEqual(Path(feed).read_bytes(), before)
-        feed = self.path("a b.xml")
-        before = feed.write_bytes(rss(element("title", "t"))) and feed.read_bytes()
+        feed = self.write("a b.xml", rss(element("title", "t")))
+        before = feed.read_bytes()
         self.assertWrong(f"'{feed}' is the source itself", feed.as_uri(), feed)
         self.assertEqual(feed.read_bytes(), before)
 
