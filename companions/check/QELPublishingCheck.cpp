@@ -23,7 +23,7 @@ void QELCheckForPublishing(const QELReferenceRecord& record, QELFindings& findin
   demand("EpisodeName", "this episode has no title: add \"EpisodeName\"");
   demand("EpisodeDate", "this episode has no date, by which readers sort: add \"EpisodeDate\"");
   const auto identifies = [](const platform::PropertyListPart* part) {
-    return part && QELIsIdentifier(part->text());
+    return part != nullptr && QELIsIdentifier(part->text());
   };
   const platform::PropertyListPart* const location = record.value("EpisodeReference");
   if (!identifies(record.value("EpisodeUUID")) && identifies(location)) {
