@@ -48,7 +48,7 @@ bool QELIsSourceItself(const std::string& file, const std::string& source) {
          std::filesystem::equivalent(file, platform::joinedPath(path, "Info.plist"), ignored);
 }
 
-std::string QELLastingSource(const std::string& source) {
+std::string QELLastingName(const std::string& source) {
   if (QELURLTextOf(source)) return source;
   std::error_code failure;
   const std::filesystem::path absolute = std::filesystem::absolute(source, failure);
@@ -83,7 +83,7 @@ std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
   if (QELURLTextOf(source)) return made;
   const bool isBundle = platform::lowercased(platform::pathExtension(source)) == "podcast";
   const std::string folder =
-      isBundle ? source : std::filesystem::path(QELLastingSource(source)).parent_path().string();
+      isBundle ? source : std::filesystem::path(QELLastingName(source)).parent_path().string();
   if (!isBundle) made->setPosterLocation(below(folder, made->posterReference()));
   if (!made->episodes()) return made;
   for (const auto& episode : *made->episodes()) {

@@ -76,7 +76,7 @@ int keep(const QELCommandLine& arguments, const Options& options) {
   if (!wasThere && !open()) return fail(path, error);
 
   QELKeptShow show(*kept, directory, path);
-  show.update(*source, QELLastingSource(name), options.selection.of(*source),
+  show.update(*source, QELLastingName(name), options.selection.of(*source),
               options.allowsLocalFiles || !QELIsOnNetwork(name));
   QELKeepRun run(arguments, show, std::move(*kept), options.isQuiet);
   if (options.isRehearsal) return run.rehearse();

@@ -9,6 +9,7 @@
 #include "cli/common/QELReferenceType.h"
 #include "companions/common/QELMediaType.h"
 #include "companions/common/QELPrivateURL.h"
+#include "companions/common/QELSourceLoading.h"
 #include "companions/publish/QELPublishedFeedGenerator.h"
 #include "platform/files/Paths.h"
 #include "platform/files/RegularFile.h"
@@ -152,8 +153,8 @@ QELPublication::Place QELPublication::placeOf(const Text& location, std::string_
   };
   if (!root_ || (isFileURL && !url)) return leftOut("a path is nothing that others can fetch");
   const std::string given = isFileURL ? url->path() : location.string();
-  const std::string path = platform::standardisedPath(
-      platform::isAbsolutePath(given) ? given : platform::joinedPath(*root_, given));
+  const std::string path =
+      QELLastingName(platform::isAbsolutePath(given) ? given : platform::joinedPath(*root_, given));
   std::error_code ignored;
   holdsFeed_ |= std::filesystem::equivalent(path, feed_, ignored);
   const std::optional<std::string> below = pathBelow(*root_, path);

@@ -90,7 +90,7 @@ bool findRoot(const std::string& text, const QELPodcastSource& source, OptionalS
     if (!directory) return false;
     path = platform::joinedPath(*directory, path);
   }
-  root = QELLastingSource(path);
+  root = QELLastingName(path);
   return true;
 }
 

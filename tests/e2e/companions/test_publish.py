@@ -106,6 +106,22 @@ class PublishTest(PublishTestCase):
         (entry,) = self.items("link/../show.plist", "-b", BASE, *ALL)
         self.assertEqual(entry.getElementsByTagName("enclosure")[0].getAttribute("length"), "5")
 
+    def test_a_way_out_of_a_link_leads_to_where_the_link_is_not(self):
+        for name in ("away/show", "show/media/wind"):
+            self.path(name).mkdir(parents=True)
+        self.path("show/link").symlink_to("media/wind")
+        self.path("show/out").symlink_to("../away/show")
+        for name in ("show/media/a.mp3", "away/b.mp3", "show/b.mp3"):
+            self.write(name, b"12345")
+        show = {"EpisodeName": "e", "EpisodeUUID": "u", "EpisodeDate": datetime(2026, 5, 4)}
+        source = self.path("show") / "show.plist"
+        self.show({**show, "EpisodeReference": "link/../a.mp3"})[0].rename(source)
+        (entry,) = self.items(source, "-b", BASE, *ALL)
+        self.assertEqual(entry.getElementsByTagName("enclosure")[0].getAttribute("url"), f"{BASE}/media/a.mp3")
+        self.show({**show, "EpisodeReference": "out/../b.mp3"})[0].rename(source)
+        self.items(source, "-b", BASE, *ALL, warnings="qel-publish: warning: left out, since it does not lie in "
+                                                      f'{self.path("show")}/: "e" (out/../b.mp3)\n')
+
     def test_a_feed_on_disk_has_its_files_beside_it(self):
         self.write("a.mp3", b"12345")
         feed = self.feed(rss(element("title", "t"), element("description", "d"), "<image><url>p.png</url></image>",
@@ -232,7 +248,7 @@ class PublishTest(PublishTestCase):
             first, *others = whole["Episodes"]
             (bundle / "Info.plist").write_bytes(plistlib.dumps(
                 {**whole, **podcast, "Episodes": [*others, {**first, **episode}]}))
-            feed = self.write("lantern.podcast/feed.xml", rss(*(element(name, "x") for name in ("title", "description")),
+            feed = self.write("lantern.podcast/feed.xml", rss(element("title", "t"), element("description", "d"),
                                                               "<image><url>Posters/Podcast.png</url></image>"))
             for source in (bundle, bundle / "Info.plist", "lantern.podcast/Info.plist", feed.as_uri()):
                 self.published(source, "-b", BASE, *ALL, warnings=warnings)
