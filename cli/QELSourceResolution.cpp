@@ -13,26 +13,17 @@
 #include "sources/QELFeedPodcastSource.h"
 #include "sources/QELReferenceFilePodcastSource.h"
 
-namespace {
-
-constexpr std::string_view kPcast = "pcast";
-
-/// Whether the string is a URL and not a path. Case counts here, unlike in the reference type of a
-/// location: "HTTP://..." is a path.
-bool namesURL(std::string_view source) {
-  return source.starts_with("http") || source.starts_with(kPcast) || source.starts_with("file:");
+std::optional<std::string> QELURLTextOf(std::string_view source) {
+  constexpr std::string_view kPcast = "pcast";
+  if (source.starts_with(kPcast)) return "http" + std::string(source.substr(kPcast.size()));
+  if (source.starts_with("http") || source.starts_with("file:")) return std::string(source);
+  return std::nullopt;
 }
-
-std::optional<platform::URL> urlFromSource(std::string_view source) {
-  if (!source.starts_with(kPcast)) return platform::URL::parse(source);
-  return platform::URL::parse("http" + std::string(source.substr(kPcast.size())));
-}
-
-}  // namespace
 
 bool QELValidateSource(std::optional<std::string_view> source, bool readStandardInput) {
-  if (source) return !namesURL(*source) || urlFromSource(*source).has_value();
-  return readStandardInput && QELPodcastFromStandardInput();
+  if (!source) return readStandardInput && QELPodcastFromStandardInput();
+  const std::optional<std::string> url = QELURLTextOf(*source);
+  return !url || platform::URL::parse(*url).has_value();
 }
 
 std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput() {
@@ -50,8 +41,8 @@ std::shared_ptr<const platform::PropertyListValue> QELPodcastFromStandardInput()
 std::unique_ptr<QELPodcastSource> initWithSourceString(std::string_view source,
                                                        std::vector<std::string> directoryPrefixes,
                                                        int stallLimit) {
-  if (namesURL(source)) {
-    auto feed = QELFeedPodcastSource::initWithURL(urlFromSource(source));
+  if (const std::optional<std::string> url = QELURLTextOf(source)) {
+    auto feed = QELFeedPodcastSource::initWithURL(platform::URL::parse(*url));
     if (!feed) return nullptr;
     feed->setDirectoryPrefixes(std::move(directoryPrefixes));
     feed->setStallLimit(stallLimit);

@@ -10,9 +10,13 @@
 #include "model/QELPodcastSource.h"
 #include "platform/plist/PropertyListValue.h"
 
-/// Whether the source string is acceptable at all. One that begins with "http", "pcast" or "file:"
-/// (in lower case) must be a valid URL, "pcast" read as "http"; any other, even an empty one, is
-/// acceptable, whether it names a file or not. Without a source string, standard input must be
+/// The URL, valid or not, that a source string is to be: one that begins with "http", "pcast" or
+/// "file:", with "pcast" read as "http". Absent for a path. Case counts here, unlike in the
+/// reference type of a location: "HTTP://..." is a path.
+std::optional<std::string> QELURLTextOf(std::string_view source);
+
+/// Whether the source string is acceptable at all. A URL must be valid; a path, even an empty one,
+/// is acceptable, whether it names a file or not. Without a source string, standard input must be
 /// asked for and hold a property list.
 bool QELValidateSource(std::optional<std::string_view> source, bool readStandardInput);
 

@@ -44,7 +44,7 @@ std::string_view dayFault(std::string_view name, platform::CivilDay day) {
       "that day is a Sunday",   "that day is a Monday", "that day is a Tuesday",
       "that day is a Wednesday"};
   const bool isOfTwoDigits = day.year < 100;
-  if (isOfTwoDigits) day.year += 2000;  // its months are as long as those of 19xx
+  if (isOfTwoDigits) day.year += 2000;  // in 19xx its months are as long, but for 1900
   const std::int64_t number = platform::daysFromCivil(day);
   if (platform::civilFromDays(number).day != day.day) return "the month has no such day";
   if (isOfTwoDigits) return "";
@@ -75,7 +75,7 @@ std::string_view RFC822Fault(std::string_view text) {
     return month.size() >= 3 && name.starts_with(month.substr(0, 3));
   });
   if (found == kMonths.end()) return "the month is not known";
-  if (month.size() > 3 && month != *found) return "the month is no English one";
+  if (month.size() > 3 && month != *found) return "the month is not written as in RFC 822";
   if (!isNumber(field[2], 0, 9999)) return "the year is none";
   const std::vector<std::string_view> time = platform::splitAt(field[3], ':', 4);
   const bool hasTime = (time.size() == 2 || (time.size() == 3 && isNumber(time[2], 0, 60))) &&

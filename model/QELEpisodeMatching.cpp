@@ -19,9 +19,8 @@ std::optional<std::chrono::seconds> wholeSeconds(std::optional<platform::PointIn
   return std::chrono::floor<std::chrono::seconds>(date->time_since_epoch());
 }
 
-/// An empty element is no uuid: others have the same.
 platform::OptionalText unlessBlank(platform::OptionalText uuid) {
-  return uuid && platform::trimmed(*uuid).empty() ? std::nullopt : std::move(uuid);
+  return uuid && QELIsIdentifier(*uuid) ? std::move(uuid) : std::nullopt;
 }
 
 /// Unlike for different values, an absent one included, also when others are appended; alike for
@@ -36,11 +35,11 @@ std::string written(const std::optional<std::chrono::seconds>& date) {
 }
 
 Sign uuidSign(const Identity& episode) {
-  return episode.uuid ? Sign(platform::lowercased(written(episode.uuid))) : std::nullopt;
+  return episode.uuid ? Sign(QELComparableUUID(*episode.uuid)) : std::nullopt;
 }
 Sign uuidOriginSign(const Identity& episode) {
   if (!episode.uuid || !episode.origin) return std::nullopt;
-  return *uuidSign(episode) + written(episode.origin);
+  return written(episode.origin) + *uuidSign(episode);
 }
 Sign originTitleDateSign(const Identity& episode) {
   if (!episode.origin) return std::nullopt;
@@ -82,6 +81,14 @@ struct Candidates {
 };
 
 }  // namespace
+
+bool QELIsIdentifier(std::string_view text) {
+  return !platform::trimmed(text).empty();
+}
+
+std::string QELComparableUUID(std::string_view uuid) {
+  return platform::lowercased(platform::textReadBack(uuid));
+}
 
 QELEpisodeIdentity QELIdentityOf(const QELEpisode& episode) {
   return {unlessBlank(episode.uuid()), episode.location(), episode.title(),

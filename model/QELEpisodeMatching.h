@@ -4,11 +4,21 @@
 #include <cstddef>
 #include <optional>
 #include <span>
+#include <string>
+#include <string_view>
 #include <vector>
 
 #include "model/QELEpisode.h"
 #include "platform/plist/PropertyListValue.h"
 #include "platform/text/Text.h"
+
+/// Whether an episode can be told from others by the text, a uuid or what stands in for one: not by
+/// a blank one, which others have, too.
+bool QELIsIdentifier(std::string_view text);
+
+/// The same for texts that are one uuid: in any mix of case, and without what no reference file
+/// holds.
+std::string QELComparableUUID(std::string_view uuid);
 
 /// What an episode is known by.
 struct QELEpisodeIdentity {

@@ -17,7 +17,7 @@
 
 void QELBundleCheck::check(platform::ByteSource bytes) {
   // It may be the working directory.
-  if (platform::lowercased(platform::pathExtension(QELLastingSource(directory_))) != "podcast") {
+  if (platform::lowercased(platform::pathExtension(QELLastingName(directory_))) != "podcast") {
     findings_.add(QELSeverity::kWarning, {.file = directory_},
                   "qel takes a directory for a bundle when its name ends in .podcast: rename it");
   }

@@ -12,6 +12,7 @@
 #include "companions/common/QELFaultAdvice.h"
 #include "companions/common/QELMediaType.h"
 #include "dates/RFC822Faults.h"
+#include "model/QELEpisodeMatching.h"
 #include "platform/net/URL.h"
 #include "platform/net/URLFault.h"
 #include "platform/plist/PropertyListDate.h"
@@ -155,7 +156,7 @@ class Watch final : public FeedParser {
           "%@ is no date, and the episode has none: write it like %@",
           {QELQuoted(text_), kRightDate});
     } else if (!fault.empty() && date_) {
-      add(QELSeverity::kWarning, element.position, "%@ is taken for %@, since %@: write it like %@",
+      add(QELSeverity::kWarning, element.position, "%@ is taken for %@, but %@: write it like %@",
           {QELQuoted(text_), platform::propertyListDate(*date_), fault, kRightDate});
     }
   }
@@ -180,7 +181,9 @@ class Watch final : public FeedParser {
     ++episodeCount_;
     for (auto& [key, number] : facts_) number += has(item, key) ? 1U : 0U;
     const auto uuid = platform::textForKey(item, "QELUUID");
-    if (uuid && !uuids_.insert(uuid->string()).second) {
+    const bool hasUUID = uuid && QELIsIdentifier(*uuid);
+    if (hasUUID) ++uuidCount_;
+    if (hasUUID && !uuids_.insert(QELComparableUUID(*uuid)).second) {
       add(QELSeverity::kWarning, itemPosition_,
           "the uuid %@ is that of an episode before: others take both for one; give each its "
           "own",
@@ -254,7 +257,7 @@ class Watch final : public FeedParser {
                   "qel takes %lu episodes: %lu with media, %lu with the size of them, %lu with a "
                   "date, %lu with a uuid, %lu with a poster",
                   {episodeCount_, facts_["url"], facts_["contentLength"], facts_["date"],
-                   facts_["QELUUID"], facts_["poster"]});
+                   uuidCount_, facts_["poster"]});
     if (!taken_.empty()) findings_.add(QELSeverity::kNote, {}, "taken: %@", {QELListed(taken_)});
     if (!left_.empty()) findings_.add(QELSeverity::kNote, {}, "not taken: %@", {QELListed(left_)});
   }
@@ -279,9 +282,10 @@ class Watch final : public FeedParser {
   std::set<std::string> guids_;
   std::set<std::string> uuids_;
   std::size_t episodeCount_ = 0;
+  std::size_t uuidCount_ = 0;
   /// How many episodes have these.
   std::map<std::string_view, std::size_t> facts_ = {
-      {"url", 0}, {"contentLength", 0}, {"date", 0}, {"QELUUID", 0}, {"poster", 0}};
+      {"url", 0}, {"contentLength", 0}, {"date", 0}, {"poster", 0}};
   std::map<std::string, std::size_t> taken_;  // elements by their names
   std::map<std::string, std::size_t> left_;
 };

@@ -1,6 +1,7 @@
 #include "companions/check/QELPublishingCheck.h"
 
 #include "cli/common/QELReferenceType.h"
+#include "model/QELEpisodeMatching.h"
 
 void QELCheckForPublishing(const QELReferenceRecord& record, QELFindings& findings,
                            bool isInBundle) {
@@ -21,13 +22,16 @@ void QELCheckForPublishing(const QELReferenceRecord& record, QELFindings& findin
   }
   demand("EpisodeName", "this episode has no title: add \"EpisodeName\"");
   demand("EpisodeDate", "this episode has no date, by which readers sort: add \"EpisodeDate\"");
-  if (!record.has("EpisodeUUID")) {
+  const auto identifies = [](const platform::PropertyListPart* part) {
+    return part != nullptr && QELIsIdentifier(part->text());
+  };
+  const platform::PropertyListPart* const location = record.value("EpisodeReference");
+  if (!identifies(record.value("EpisodeUUID")) && identifies(location)) {
     findings.add(
         QELSeverity::kNote, place,
         "this episode has no \"EpisodeUUID\", so the URL of its media becomes its guid, and "
         "readers show it again when that changes: add one");
   }
-  const platform::PropertyListPart* const location = record.value("EpisodeReference");
   if (!location || isInBundle) return;
   const platform::PropertyListPart* const type = record.value("EpisodeReferenceType");
   const bool isRemote = type ? type->text() == kReferenceTypeRemote

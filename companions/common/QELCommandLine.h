@@ -51,8 +51,8 @@ class QELCommandLine {
   void report(std::string_view message) const;
   /// Reports the wrong use, with a hint at "--help", and gives its exit status.
   int wrongUse(std::string_view message) const;
-  /// The status with which a run ends that would end with the given one: a worse one, which was
-  /// reported, when standard output has not taken all that was printed.
+  /// Flushes standard output. Returns the status; at least kSomethingToLookAt, after a message,
+  /// when not all that was printed was taken.
   int finish(int status) const;
 
  private:
@@ -68,7 +68,7 @@ class QELCommandLine {
 /// A `take` that stores true, and one that stores a whole number of at least `least`.
 std::function<bool(const std::string&)> QELTakeFlag(bool& flag);
 std::function<bool(const std::string&)> QELTakeNumber(std::int64_t& number, std::int64_t least);
-/// A `take` that stores the text if it is a URL of the network.
+/// A `take` that stores a URL of http or https, percent-encoded where that was left out.
 std::function<bool(const std::string&)> QELTakeURL(std::optional<std::string>& text);
 /// A `take` that stores what looks like a language tag of RFC 5646: letters first, hyphens between
 /// the parts.

@@ -15,8 +15,9 @@ namespace {
 
 /// What is wrong with the name of a source that is none.
 std::string faultOf(const std::string& source) {
-  if (platform::looksLikeURL(source)) {
-    const std::string fault = platform::hasFetchedScheme(source) ? platform::urlFault(source) : "";
+  const std::string url = QELURLTextOf(source).value_or(source);
+  if (platform::looksLikeURL(url)) {
+    const std::string fault = platform::hasFetchedScheme(url) ? platform::urlFault(url) : "";
     return fault.empty() ? "a URL begins with http:, https: or file:, in lower case" : fault;
   }
   if (platform::fileExists(source)) {
@@ -29,7 +30,7 @@ std::string faultOf(const std::string& source) {
 platform::OptionalText below(const std::string& directory, const QELMediaReference& reference) {
   const platform::OptionalText& location = reference.location;
   if (!location || location->empty() || reference.isRemote) return location;
-  if (location->view().starts_with("/") || platform::looksLikeURL(*location)) return location;
+  if (platform::isAbsolutePath(*location) || platform::looksLikeURL(*location)) return location;
   return platform::joinedPath(directory, *location);
 }
 
@@ -47,10 +48,24 @@ bool QELIsSourceItself(const std::string& file, const std::string& source) {
          std::filesystem::equivalent(file, platform::joinedPath(path, "Info.plist"), ignored);
 }
 
-std::string QELLastingSource(const std::string& source) {
-  if (QELIsOnNetwork(source) || source.starts_with("file:")) return source;
-  std::error_code ignored;
-  return std::filesystem::absolute(source, ignored).lexically_normal().string();
+std::string QELLastingName(const std::string& source) {
+  if (QELURLTextOf(source)) return source;
+  std::error_code failure;
+  const std::filesystem::path absolute = std::filesystem::absolute(source, failure);
+  if (failure) return source;
+  std::filesystem::path lasting;
+  for (const std::filesystem::path& part : absolute) {
+    if (part == "..") {
+      // It leads out of where a link leads to. Other links may lead elsewhere tomorrow.
+      if (std::filesystem::is_symlink(lasting, failure)) {
+        lasting = std::filesystem::weakly_canonical(lasting, failure);
+      }
+      lasting = lasting.parent_path();
+    } else if (part != ".") {
+      lasting /= part;
+    }
+  }
+  return lasting.string();
 }
 
 std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
@@ -65,10 +80,10 @@ std::unique_ptr<QELPodcastSource> QELLoadedSource(const std::string& source,
     return nullptr;
   }
   if (!made->loadSourceWithError(error)) return nullptr;
-  if (QELIsOnNetwork(source) || source.starts_with("file:")) return made;
+  if (QELURLTextOf(source)) return made;
   const bool isBundle = platform::lowercased(platform::pathExtension(source)) == "podcast";
   const std::string folder =
-      isBundle ? source : std::filesystem::path(QELLastingSource(source)).parent_path().string();
+      isBundle ? source : std::filesystem::path(QELLastingName(source)).parent_path().string();
   if (!isBundle) made->setPosterLocation(below(folder, made->posterReference()));
   if (!made->episodes()) return made;
   for (const auto& episode : *made->episodes()) {

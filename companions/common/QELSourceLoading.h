@@ -13,8 +13,11 @@ bool QELIsOnNetwork(const std::string& source);
 /// Whether the file is the source itself, or the reference file of one that is a bundle.
 bool QELIsSourceItself(const std::string& file, const std::string& source);
 
-/// The name of a source by which it is found from any working directory.
-std::string QELLastingSource(const std::string& source);
+/// The name of a source, or of a file of one, by which it is found from any working directory: a
+/// URL as it is, and of a path the absolute one without "." and "..". Links keep their names but
+/// for those that a ".." comes behind. A relative path stays as it is when the working directory
+/// cannot be told.
+std::string QELLastingName(const std::string& source);
 
 /// The source that the name stands for, loaded, with the elements of the podcast directory read
 /// under that one's prefix. Unlike those of a bundle source as such, posters of a bundle's episodes

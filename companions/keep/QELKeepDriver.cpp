@@ -6,6 +6,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <thread>
 #include <utility>
 
 #include "companions/common/QELCommandLine.h"
@@ -67,14 +68,15 @@ int keep(const QELCommandLine& arguments, const Options& options) {
   const int stallLimit = static_cast<int>(std::min<std::int64_t>(options.stallLimit, INT_MAX));
   QELRetrySchedule schedule;
   std::unique_ptr<QELPodcastSource> source;
-  do {
-    source = QELLoadedSource(name, options.directory, stallLimit, error = std::nullopt);
-  } while (!source && schedule.sleepAfter(error));
-  if (!source) return fail(name, error);
+  while (!(source = QELLoadedSource(name, options.directory, stallLimit, error = std::nullopt))) {
+    const auto wait = error ? schedule.waitAfter(*error, "", {}) : std::nullopt;
+    if (!wait) return fail(name, error);
+    std::this_thread::sleep_for(*wait);
+  }
   if (!wasThere && !open()) return fail(path, error);
 
   QELKeptShow show(*kept, directory, path);
-  show.update(*source, QELLastingSource(name), options.selection.of(*source),
+  show.update(*source, QELLastingName(name), options.selection.of(*source),
               options.allowsLocalFiles || !QELIsOnNetwork(name));
   QELKeepRun run(arguments, show, std::move(*kept), options.isQuiet);
   if (options.isRehearsal) return run.rehearse();

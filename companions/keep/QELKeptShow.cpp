@@ -169,11 +169,12 @@ void QELKeptShow::updatePoster(Entry& entry, const std::string& prefix,
                                const QELMediaReference& poster, const std::string& title,
                                std::string_view baseName) {
   if (!poster.location || poster.location->empty()) return;
+  // Nobody lists the poster of an episode that does not come.
+  const bool isNew = entry.media && !entry.wasListed;
+  if (isNew && entry.media->state() == QELFetch::State::kFailed) return;
   const std::string key = prefix + "PosterReference";
   const std::string originKey = prefix + "PosterOrigin";
   const std::string origin = platform::textReadBack(*poster.location);
-  // Nobody lists the poster of an episode that does not come.
-  const bool isNew = entry.media && !entry.wasListed;
   const OptionalText oldOrigin = platform::textForKey(entry.dictionary, originKey);
   const OptionalText old = platform::textForKey(entry.dictionary, key);
   const bool isThere = QELBundleDirectory::sizeOfFile(path_, old).has_value();

@@ -9,11 +9,13 @@
 #include "cli/common/QELReferenceType.h"
 #include "companions/common/QELMediaType.h"
 #include "companions/common/QELPrivateURL.h"
+#include "companions/common/QELSourceLoading.h"
 #include "companions/publish/QELPublishedFeedGenerator.h"
 #include "platform/files/Paths.h"
 #include "platform/files/RegularFile.h"
 #include "platform/net/URL.h"
 #include "platform/text/Case.h"
+#include "platform/text/FormattedText.h"
 
 namespace {
 
@@ -24,14 +26,11 @@ bool isAbsent(const OptionalText& text) {
   return !text || text->empty();
 }
 
-std::string quoted(std::string_view text) {
-  return std::string("\"").append(text).append("\"");
-}
-
 /// As a remark names it.
 std::string nameOf(const QELEpisode& episode, std::size_t number) {
   const OptionalText title = episode.title();
-  return isAbsent(title) ? "episode " + std::to_string(number) : quoted(*title);
+  if (isAbsent(title)) return "episode " + std::to_string(number);
+  return platform::formattedText("\"%@\"", {*title});
 }
 
 bool isOfNetwork(const std::optional<platform::URL>& url) {
@@ -41,9 +40,8 @@ bool isOfNetwork(const std::optional<platform::URL>& url) {
 /// What of the path lies below the root, which ends in "/"; absent for a path that leads elsewhere.
 std::optional<std::string> pathBelow(const std::string& root, const std::string& path) {
   const auto rest = [](const std::string& whole, const std::string& begin) {
-    if (!whole.starts_with(begin) || whole.size() == begin.size())
-      return std::optional<std::string>();
-    return std::optional(whole.substr(begin.size()));
+    const bool isBelow = whole.starts_with(begin) && whole.size() > begin.size();
+    return isBelow ? std::optional(whole.substr(begin.size())) : std::nullopt;
   };
   if (auto below = rest(path, root)) return below;
   // An absolute path may name the same place by other links.
@@ -155,8 +153,8 @@ QELPublication::Place QELPublication::placeOf(const Text& location, std::string_
   };
   if (!root_ || (isFileURL && !url)) return leftOut("a path is nothing that others can fetch");
   const std::string given = isFileURL ? url->path() : location.string();
-  const std::string path = platform::standardisedPath(
-      platform::isAbsolutePath(given) ? given : platform::joinedPath(*root_, given));
+  const std::string path =
+      QELLastingName(platform::isAbsolutePath(given) ? given : platform::joinedPath(*root_, given));
   std::error_code ignored;
   holdsFeed_ |= std::filesystem::equivalent(path, feed_, ignored);
   const std::optional<std::string> below = pathBelow(*root_, path);

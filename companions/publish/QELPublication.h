@@ -16,9 +16,9 @@
 ///     for (const std::string& line : publication.remarks().lines()) warn(line);
 class QELPublication {
  public:
-  /// The root is the directory in which the show lies: relative locations begin there, and what
-  /// lies below it will be found below the base, a URL that ends in "/". Absolute and standardised;
-  /// without one, the show has no local file that could be published.
+  /// The root is the directory in which the show lies, absolute and without "." and "..": relative
+  /// locations begin there, and what lies below it will be found below the base, a URL that ends in
+  /// "/". Without a root, the show has no local file that could be published.
   /// The feed is the path at which it will be written.
   QELPublication(std::optional<std::string> root, std::optional<std::string> base,
                  std::string feed = {});

@@ -90,15 +90,14 @@ bool findRoot(const std::string& text, const QELPodcastSource& source, OptionalS
     if (!directory) return false;
     path = platform::joinedPath(*directory, path);
   }
-  root = platform::standardisedPath(path);
+  root = QELLastingName(path);
   return true;
 }
 
-/// Whether the source is a bundle that came from a private URL; asked before it is prepared.
-bool remembersUser(const QELPodcastSource& source) {
-  if (dynamic_cast<const QELBundlePodcastSource*>(&source) == nullptr) return false;
+/// Whether the directory has an Info.plist that remembers a private URL.
+bool remembersUser(const std::string& directory) {
   platform::ErrorSlot ignored;
-  const auto kept = QELBundleDirectory::readReferenceFile(source.location()->string(), ignored);
+  const auto kept = QELBundleDirectory::readReferenceFile(directory, ignored);
   return kept && QELRemembersUser(*kept);
 }
 
@@ -127,7 +126,7 @@ int publish(const QELCommandLine& commandLine, const Options& options,
     return kNothingDone;
   }
 
-  const bool isPrivate = options.base && remembersUser(*source);
+  const bool isPrivate = options.base && root && remembersUser(*root);
   QELPublication publication(std::move(root), options.base, feed);
   publication.setLink(options.link);
   publication.prepare(*source);

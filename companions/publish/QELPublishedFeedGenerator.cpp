@@ -1,6 +1,6 @@
 #include "companions/publish/QELPublishedFeedGenerator.h"
 
-#include "platform/text/ASCII.h"
+#include "model/QELEpisodeMatching.h"
 #include "platform/time/DateFormatter.h"
 #include "platform/time/TimeZone.h"
 
@@ -30,7 +30,7 @@ QELPublishedFeedGenerator::QELPublishedFeedGenerator(QELDirectory directory,
 
 std::optional<Text> QELPublishedFeedGenerator::guidOf(const QELEpisode& episode) {
   for (auto text : {episode.uuid(), episode.location()}) {
-    if (text && !platform::trimmed(*text).empty()) return text;
+    if (text && QELIsIdentifier(*text)) return text;
   }
   return std::nullopt;
 }

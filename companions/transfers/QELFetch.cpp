@@ -18,7 +18,9 @@ QELFetch::QELFetch(std::string title, QELMediaReference reference,
   } else if (reference_.isRemote && !reference_.url) {
     refuse("It is no valid URL");
   } else if (!reference_.isRemote && platform::looksLikeURL(*reference_.location)) {
-    refuse("Only http, https and file URLs are fetched");
+    refuse(platform::hasFetchedScheme(*reference_.location)
+               ? "It is a URL, but its type is not \"remote\""
+               : "Only http, https and file URLs are fetched");
   } else if (!allowsLocalFiles && (!reference_.isRemote || reference_.url->scheme() == "file")) {
     refuse("A feed of the network names a local file, see --allow-local");
   } else if (reference_.isRemote && reference_.url->scheme() != "file") {

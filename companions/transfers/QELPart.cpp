@@ -38,10 +38,10 @@ std::string contentOf(const std::string& path) {
 }  // namespace
 
 QELPart::QELPart(const platform::Directory& directory, std::string path, const std::string& url,
-                 const std::string& title)
+                 const std::string& titleAndUUID)
     : directory_(directory),
       path_(std::move(path)),
-      file_(url + "\n" + title),
+      file_(url + "\n" + titleAndUUID),
       name_(std::string(kPrefix) + digest(file_) + ".part"),
       noteName_(std::string(kPrefix) + digest(file_) + ".note") {}
 

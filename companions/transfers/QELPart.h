@@ -13,13 +13,14 @@
 /// proves that a server still has the same file, so that another try can go on behind the part; and
 /// which name the whole file gets, so that one that a run had no time to list is not lost.
 ///
-/// The names are ".qel-keep-", a digest of the URL and the title, and ".part" or ".note". Of one
-/// URL another episode may come each week, as of "latest.mp3"; each has its own part.
+/// The names are ".qel-keep-", a digest of the URL, the title and the uuid, and ".part" or ".note".
+/// Of one URL another episode may come each week, as of "latest.mp3"; each has its own part.
 class QELPart {
  public:
-  /// `path` is that of the directory, which must outlive this.
+  /// `path` is that of the directory, which must outlive this. The title, with the uuid behind it
+  /// where there is one, tells the file from others of the URL.
   QELPart(const platform::Directory& directory, std::string path, const std::string& url,
-          const std::string& title);
+          const std::string& titleAndUUID);
 
   const std::string& name() const { return name_; }
 
@@ -49,7 +50,7 @@ class QELPart {
 
   const platform::Directory& directory_;
   std::string path_;
-  std::string file_;  // what the part is of: the URL and the title
+  std::string file_;  // what the part is of: the URL, the title and the uuid
   std::string name_;
   std::string noteName_;
 };

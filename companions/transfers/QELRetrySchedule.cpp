@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <array>
 #include <cstdint>
-#include <thread>
 
 #include "dates/RFC822Parsing.h"
 #include "platform/net/Download.h"
@@ -46,10 +45,4 @@ std::optional<milliseconds> QELRetrySchedule::waitAfter(const platform::ErrorRec
   if (failures_ == kWaits.size() || !mayPass(error)) return std::nullopt;
   const milliseconds planned = kWaits.at(failures_++);
   return waitAskedFor(retryAfter, now).value_or(planned);
-}
-
-bool QELRetrySchedule::sleepAfter(const platform::ErrorSlot& error) {
-  const auto wait = error ? waitAfter(*error, "", {}) : std::nullopt;
-  if (wait) std::this_thread::sleep_for(*wait);
-  return wait.has_value();
 }

@@ -24,10 +24,6 @@ class QELRetrySchedule {
                                                      std::string_view retryAfter,
                                                      platform::PointInTime now);
 
-  /// Waits as planned after the failure, of which no more is known. False, and no wait, when there
-  /// is to be no other try.
-  bool sleepAfter(const platform::ErrorSlot& error);
-
  private:
   std::size_t failures_ = 0;
 };

@@ -19,6 +19,15 @@ class QELSourceResolutionTest : public testing::Test {
 
 constexpr const char* kReferenceFile = "<plist version=\"1.0\"><dict/></plist>";
 
+TEST_F(QELSourceResolutionTest, WhatIsToBeAURL) {
+  EXPECT_EQ(QELURLTextOf("https://a.example/"), "https://a.example/");
+  EXPECT_EQ(QELURLTextOf("pcasts://a b"), "https://a b");
+  EXPECT_EQ(QELURLTextOf("file:relative"), "file:relative");
+  for (const char* path : {"", "/a", "file", "HTTP://a.example/", "Pcast://a.example/"}) {
+    EXPECT_EQ(QELURLTextOf(path), std::nullopt) << path;
+  }
+}
+
 TEST_F(QELSourceResolutionTest, Validation) {
   const struct {
     std::optional<std::string_view> source;

@@ -105,6 +105,12 @@ TEST(QELEpisodeMatchingTest, ABlankUUIDIsNone) {
   }
 }
 
+TEST(QELEpisodeMatchingTest, TheUUIDAndTheOriginDoNotRunTogether) {
+  const Identities kept = {identity("u", "x1:y", "A", 1), identity("u4:x", "y", "B", 2)};
+  EXPECT_EQ(QELMatchedEpisodes(Identities{identity("u4:x", "y", "C", 3)}, kept), (Matches{1}));
+  EXPECT_EQ(QELMatchedEpisodes(Identities{identity("u", "x1:y", "C", 3)}, kept), (Matches{0}));
+}
+
 TEST(QELEpisodeMatchingTest, FractionsOfSecondsDoNotCount) {
   const auto episode = QELEpisode::episode();
   episode->setDate(platform::PointInTime(std::chrono::milliseconds(1999)));

@@ -11,6 +11,16 @@
 #include <system_error>
 #include <vector>
 
+/// The names of all that is in the directory, hidden ones included, sorted.
+inline std::vector<std::string> namesIn(const std::string& directory) {
+  std::vector<std::string> result;
+  for (const auto& entry : std::filesystem::directory_iterator(directory)) {
+    result.push_back(entry.path().filename().string());
+  }
+  std::sort(result.begin(), result.end());
+  return result;
+}
+
 /// A new, empty directory that is removed with all its content at the end of the scope.
 class TemporaryDirectory {
  public:
@@ -38,15 +48,7 @@ class TemporaryDirectory {
     return *this / name;
   }
 
-  /// The names of all that is in it, hidden ones included, sorted.
-  std::vector<std::string> names() const {
-    std::vector<std::string> result;
-    for (const auto& entry : std::filesystem::directory_iterator(path_)) {
-      result.push_back(entry.path().filename().string());
-    }
-    std::sort(result.begin(), result.end());
-    return result;
-  }
+  std::vector<std::string> names() const { return namesIn(path_); }
 
  private:
   std::string path_;

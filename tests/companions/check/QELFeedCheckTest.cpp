@@ -59,6 +59,18 @@ TEST(QELFeedCheckTest, AnItemWithinAnotherEndsIt) {
                           "take both for one; give each its own"));
 }
 
+TEST(QELFeedCheckTest, UUIDsAreThoseByWhichEpisodesAreKnownAgain) {
+  const auto items = [](const std::string& one, const std::string& other) {
+    return "<item><qel:uuid>" + one + "</qel:uuid></item>\n<item><qel:uuid>" + other +
+           "</qel:uuid></item>";
+  };
+  EXPECT_THAT(foundInChannel(items("a", "A")),
+              ElementsAre("f:3:1: warning: the uuid \"A\" is that of an episode before: others "
+                          "take both for one; give each its own"));
+  EXPECT_THAT(foundInChannel(items("", "")), IsEmpty());
+  EXPECT_THAT(foundInChannel(items(" \n", " ")), IsEmpty());
+}
+
 TEST(QELFeedCheckTest, IdentifiersCountInEpisodesAlone) {
   const std::string again =
       "warning: the guid \"g\" is that of an episode before: readers show one of the two; give "

@@ -96,6 +96,21 @@ TEST(QELReferenceCheckTest, SizesAreWantedOfWhatIsNotOnTheDisk) {
               ElementsAre(isPath));
 }
 
+TEST(QELReferenceCheckTest, TheURLOfMediaBecomesAGuidWhereThereAreMediaAndNoUUID) {
+  const auto hasGuidOfMedia = testing::Contains(
+      EndsWith("note: this episode has no \"EpisodeUUID\", so the URL of its media becomes its "
+               "guid, and readers show it again when that changes: add one"));
+  const std::string media = entry("EpisodeReference", "https://a.example/1.mp3");
+  for (const std::string& uuid :
+       {std::string(), entry("EpisodeUUID", ""), entry("EpisodeUUID", " \n"),
+        std::string("<key>EpisodeUUID</key><integer>1</integer>")}) {
+    EXPECT_THAT(foundIn(uuid + media, true), hasGuidOfMedia) << uuid;
+    EXPECT_THAT(foundIn(uuid, true), testing::Not(hasGuidOfMedia)) << uuid;
+    EXPECT_THAT(foundIn(uuid + entry("EpisodeReference", " "), true), testing::Not(hasGuidOfMedia));
+  }
+  EXPECT_THAT(foundIn(entry("EpisodeUUID", "u") + media, true), testing::Not(hasGuidOfMedia));
+}
+
 TEST(QELBundleCheckTest, EpisodesMayShareAPosterButNoFile) {
   const TemporaryDirectory root;
   const std::string bundle = root / "show.podcast";

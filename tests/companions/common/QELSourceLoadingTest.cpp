@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <memory>
 #include <string>
 
@@ -12,13 +13,47 @@ namespace {
 TEST(QELSourceLoadingTest, TellsWhatLiesOnTheNetwork) {
   for (const char* source : {"http://a.example/", "https://a.example/", "pcast://a.example/"}) {
     EXPECT_TRUE(QELIsOnNetwork(source)) << source;
-    EXPECT_EQ(QELLastingSource(source), source);
+    EXPECT_EQ(QELLastingName(source), source);
   }
   for (const char* source : {"file:///a.xml", "/a.plist", "a.podcast", "", "HTTP://a.example/"}) {
     EXPECT_FALSE(QELIsOnNetwork(source)) << source;
   }
-  EXPECT_EQ(QELLastingSource("file:///a/../b.xml"), "file:///a/../b.xml");
-  EXPECT_EQ(QELLastingSource("/a/../b.plist"), "/b.plist");
+  EXPECT_EQ(QELLastingName("file:///a/../b.xml"), "file:///a/../b.xml");
+}
+
+TEST(QELSourceLoadingTest, ASourceIsFoundFromAnyWorkingDirectory) {
+  for (const char* path : {"/a/../b.plist", "/../b.plist", "//b.plist", "/./b.plist"}) {
+    EXPECT_EQ(QELLastingName(path), "/b.plist") << path;
+  }
+  EXPECT_EQ(QELLastingName("/a/b/"), "/a/b/");
+  const TemporaryDirectory directory;
+  const std::string real = std::filesystem::canonical(directory.path()).string();
+  const std::filesystem::path before = std::filesystem::current_path();
+  std::filesystem::current_path(real);
+  EXPECT_EQ(QELLastingName("b.plist"), real + "/b.plist");
+  EXPECT_EQ(QELLastingName("./c/../b.plist"), real + "/b.plist");
+  std::filesystem::create_directory("gone");
+  std::filesystem::current_path("gone");
+  std::filesystem::remove(real + "/gone");
+  EXPECT_EQ(QELLastingName("b.plist"), "b.plist");
+  EXPECT_EQ(QELLastingName(""), "");
+  EXPECT_EQ(QELLastingName("/b.plist"), "/b.plist");
+  std::filesystem::current_path(before);
+}
+
+TEST(QELSourceLoadingTest, LinksKeepTheirNamesUnlessTheWayLeadsOutOfThem) {
+  const TemporaryDirectory directory;
+  std::filesystem::create_directories(directory / "away/today/show");
+  std::filesystem::create_directory_symlink("away/today", directory / "current");
+  std::filesystem::create_directory_symlink("today", directory / "away/again");
+  std::filesystem::create_symlink("current/b.plist", directory / "b.plist");
+  const std::string away = std::filesystem::canonical(directory / "away").string();
+  EXPECT_EQ(QELLastingName(directory / "b.plist"), directory / "b.plist");
+  EXPECT_EQ(QELLastingName(directory / "away/../b.plist"), directory / "b.plist");
+  EXPECT_EQ(QELLastingName(directory / "current/b.plist"), directory / "current/b.plist");
+  EXPECT_EQ(QELLastingName(directory / "current/show/../b.plist"), directory / "current/b.plist");
+  EXPECT_EQ(QELLastingName(directory / "current/../b.plist"), away + "/b.plist");
+  EXPECT_EQ(QELLastingName(directory / "current/../again/b.plist"), away + "/again/b.plist");
 }
 
 class LoadedSourceTest : public testing::Test {

@@ -74,11 +74,7 @@ TEST_F(QELKeepDriverTest, AListThatCannotBeWrittenInTheEndIsToldAndTheFileFoundA
   EXPECT_EQ(keep(bundle), kAllWell);
   EXPECT_EQ(errors_, "");
   EXPECT_EQ(server_.hits("/1.mp3"), 1);
-  std::vector<std::string> names;
-  for (const auto& entry : std::filesystem::directory_iterator(bundle)) {
-    names.push_back(entry.path().filename().string());
-  }
-  EXPECT_THAT(names, testing::UnorderedElementsAre("Info.plist", "1.mp3", "Posters"));
+  EXPECT_THAT(namesIn(bundle), testing::ElementsAre("1.mp3", "Info.plist", "Posters"));
 }
 
 /// The content of the one part in the bundle; empty when there is none yet.

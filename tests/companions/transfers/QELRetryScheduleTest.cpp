@@ -67,8 +67,4 @@ TEST(QELRetryScheduleTest, TheServerMayAskForAnotherWait) {
   }
 }
 
-TEST(QELRetryScheduleTest, WhatFailedForNoReasonIsNotTriedAgain) {
-  EXPECT_FALSE(QELRetrySchedule().sleepAfter(std::nullopt));
-}
-
 }  // namespace

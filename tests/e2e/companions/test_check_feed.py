@@ -16,6 +16,7 @@ NO_DATES = ["", "2026-04-04", "Sat,  04 Apr 2026 04:30:00 GMT", "04 Apr 2026 043
 OTHER_DATES = [
     ("Sa, 04 Avril 2026 04:30:00 GMT", "2026-01-04T04:30:00Z", "the month is not known"),
     ("04 Ja 2026 04:30:00 GMT", "2026-01-04T04:30:00Z", "the month is not known"),
+    ("04 Sept 2026 04:30:00 GMT", "2026-09-04T04:30:00Z", "the month is not written as in RFC 822"),
     ("32 May 2026 04:30:00 GMT", "2026-06-01T04:30:00Z", "the day is none"),
     ("Tue, 31 Feb 2026 10:00:00 GMT", "2026-03-03T10:00:00Z", "the month has no such day"),
     ("Mon, 04 Apr 2026 10:00:00 GMT", "2026-04-04T10:00:00Z", "that day is a Saturday"),
@@ -91,13 +92,17 @@ class TakenTest(FeedTestCase):
         for date, taken, fault in OTHER_DATES:
             with self.subTest(date):
                 self.assertEqual(self.said(item(element("pubDate", date))), [
-                    f'warning: "{date}" is taken for {taken}, since {fault}: {RIGHT}'])
+                    f'warning: "{date}" is taken for {taken}, but {fault}: {RIGHT}'])
 
     def test_repeated_identifiers(self):
         items = [item(element("qel:uuid", "u"), element("orvane:duration", "9"), element("guid", "g"))] * 2
         self.assertEqual(self.said(*items), [
             'warning: the uuid "u" is that of an episode before: others take both for one; give each its own',
             'warning: the guid "g" is that of an episode before: readers show one of the two; give each its own'])
+
+    def test_an_empty_uuid_is_none(self):
+        result = self.run_tool("-", stdin=rss(item("<qel:uuid/>"), item(element("qel:uuid", "u"))), program="qel-check")
+        self.assertIn(b" 0 with a date, 1 with a uuid, ", result.stdout)
 
     def test_labels(self):
         for label in ("yes", "CLEAN", "no", "False", ""):

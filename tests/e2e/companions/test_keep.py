@@ -241,6 +241,30 @@ class KeepTest(KeepTestCase):
         self.assertEqual(self.listed("EpisodePosterReference"), ["Posters/1.png"])
         self.assertKept(self.keep(source=None), "0 new, 1 known, 0 failed")
 
+    def test_a_way_out_of_a_link_leads_to_where_the_link_is_not(self):
+        for folder in (self.directory, self.path("away")):
+            (folder / "show").mkdir(parents=True)
+            (folder / "1.mp3").write_bytes(b"media 1" if folder.name == "away" else b"another")
+        (self.path("away") / "feed.plist").write_bytes(plistlib.dumps({"Episodes": [
+            {"EpisodeName": "Episode 1", "EpisodeReference": "1.mp3"}]}))
+        self.path("link").symlink_to("away/show")
+        self.assertKept(self.keep(source="link/../feed.plist"), "1 new, 0 known, 0 failed")
+        self.media(1)
+        self.assertTrue(os.path.samefile(self.info()["PodcastOrigin"], self.path("away") / "feed.plist"))
+        self.assertKept(self.keep(source=None), "0 new, 1 known, 0 failed")
+
+    def test_a_source_is_remembered_by_the_name_of_a_link(self):
+        for day in ("monday", "tuesday"):
+            self.path(day).mkdir()
+            source = self.reference({"Episodes": [{"EpisodeName": f"Episode {day}", "EpisodeReference":
+                                                   self.web.serve(f"/{day}.mp3", b"media")}]})
+            source.rename(self.path(day) / "feed.plist")
+            self.path("current").unlink(missing_ok=True)
+            self.path("current").symlink_to(day)
+            result = self.keep(source="current/feed.plist" if day == "monday" else None)
+        self.assertKept(result, "1 new, 0 known, 0 failed")
+        self.assertEqual(self.info()["PodcastOrigin"], str(self.path("current") / "feed.plist"))
+
     def test_the_case_of_uuids_does_not_matter(self):
         for case in (str.upper, str.lower):
             source = self.reference({"Episodes": [{
@@ -279,6 +303,13 @@ class KeepTest(KeepTestCase):
             self.assertKept(self.keep(*options), "0 new, 0 known, 1 failed", 1,
                             'qel-keep: "Episode 1": ftp://a.example/1.mp3: '
                             "Only http, https and file URLs are fetched\n")
+
+    def test_a_url_that_is_said_to_be_local_is_told_as_such(self):
+        for location in ("https://a.example/1.mp3", "HTTP://a.example/1.mp3", "file:///1.mp3"):
+            source = self.reference({"Episodes": [{"EpisodeName": "Episode 1", "EpisodeReference": location,
+                                                   "EpisodeReferenceType": "local"}]})
+            self.assertKept(self.keep(source=source), "0 new, 0 known, 1 failed", 1,
+                            f'qel-keep: "Episode 1": {location}: It is a URL, but its type is not "remote"\n')
 
     def test_a_feed_on_disk_may_name_local_files(self):
         media = self.write("one.mp3", b"media 1")

@@ -41,7 +41,9 @@ class OptionsTest(KeepTestCase):
                               (self.write("feed.xml", b"<rss/>"), "it is no reference file or bundle; "
                                "a feed on the disk is named by a file:/// URL"),
                               ("HTTP://a.example/", "a URL begins with http:, https: or file:, in lower case"),
-                              ("http://a b/", '" " is written %20'),
+                              ("FTP://a.example/", "a URL begins with http:, https: or file:, in lower case"),
+                              ("http://a b/", '" " is written %20'), ("pcast://a b/x", '" " is written %20'),
+                              ("pcast:///x", "it has no host"),
                               (f"file://{self.directory}/my feed.xml", '" " is written %20')]:
             with self.subTest(source):
                 self.assertRefused(self.keep(source=source), f"{source}: {cause}")
@@ -97,6 +99,21 @@ class OptionsTest(KeepTestCase):
         self.assertIn('would not fetch "Episode 5" from /etc/passwd: A feed of the network names a local file, '
                       "see --allow-local\n", result.stdout.decode())
         self.assertEqual((self.bundle / "Info.plist").read_bytes(), before)
+
+    def test_a_rehearsal_has_the_posters_alone_of_episodes_that_come(self):
+        alone, shared = (element("orvane:image", href=self.web.serve(f"/{name}.png", b"poster"))
+                         for name in ("alone", "shared"))
+        self.publish(self.episode(1, alone, url="/etc/passwd"), self.episode(2, shared, url="ftp://a.example/2.mp3"))
+        self.assertKept(self.keep("-n"), "0 to fetch, 0 known")
+        self.publish(self.episode(1, alone, url="/etc/passwd"), self.episode(2, shared, url="ftp://a.example/2.mp3"),
+                     self.episode(3, shared))
+        result = self.keep("-n")
+        self.assertKept(result, "2 to fetch, 0 known")
+        self.assertIn(f'would fetch poster of "Episode 3" from {self.web.url("/shared.png")}\n', result.stdout.decode())
+        result = self.keep()
+        self.assertKept(result, "1 new, 0 known, 2 failed", 1, result.stderr.decode())
+        self.assertIn('fetched poster of "Episode 3": 3.png (6 B)\n', result.stdout.decode())
+        self.assertEqual(self.listed("EpisodePosterReference"), ["Posters/3.png"])
 
     def test_a_title_of_two_lines_is_told_in_one(self):
         self.publish(self.episode(1, title="One\nTwo"))

@@ -96,6 +96,32 @@ class PublishTest(PublishTestCase):
             self.assertEqual(enclosures[0].getAttribute("length"),
                              str((EXAMPLE / "media" / "first-light.wav").stat().st_size))
 
+    def test_files_lie_beside_a_reference_file_behind_a_link(self):
+        away = self.path("away")
+        (away / "show").mkdir(parents=True)
+        (away / "a.mp3").write_bytes(b"12345")
+        self.show({"EpisodeName": "e", "EpisodeUUID": "u", "EpisodeDate": datetime(2026, 5, 4),
+                   "EpisodeReference": "a.mp3"})[0].rename(away / "show.plist")
+        self.path("link").symlink_to("away/show")
+        (entry,) = self.items("link/../show.plist", "-b", BASE, *ALL)
+        self.assertEqual(entry.getElementsByTagName("enclosure")[0].getAttribute("length"), "5")
+
+    def test_a_way_out_of_a_link_leads_to_where_the_link_is_not(self):
+        for name in ("away/show", "show/media/wind"):
+            self.path(name).mkdir(parents=True)
+        self.path("show/link").symlink_to("media/wind")
+        self.path("show/out").symlink_to("../away/show")
+        for name in ("show/media/a.mp3", "away/b.mp3", "show/b.mp3"):
+            self.write(name, b"12345")
+        show = {"EpisodeName": "e", "EpisodeUUID": "u", "EpisodeDate": datetime(2026, 5, 4)}
+        source = self.path("show") / "show.plist"
+        self.show({**show, "EpisodeReference": "link/../a.mp3"})[0].rename(source)
+        (entry,) = self.items(source, "-b", BASE, *ALL)
+        self.assertEqual(entry.getElementsByTagName("enclosure")[0].getAttribute("url"), f"{BASE}/media/a.mp3")
+        self.show({**show, "EpisodeReference": "out/../b.mp3"})[0].rename(source)
+        self.items(source, "-b", BASE, *ALL, warnings="qel-publish: warning: left out, since it does not lie in "
+                                                      f'{self.path("show")}/: "e" (out/../b.mp3)\n')
+
     def test_a_feed_on_disk_has_its_files_beside_it(self):
         self.write("a.mp3", b"12345")
         feed = self.feed(rss(element("title", "t"), element("description", "d"), "<image><url>p.png</url></image>",
@@ -199,7 +225,6 @@ class PublishTest(PublishTestCase):
         self.assertEqual(len(channel.getElementsByTagName("item")), 8)
         self.assertEqual(len(channel.getElementsByTagName("enclosure")), 2)
 
-
     def test_a_file_that_is_missing_is_something_to_look_at(self):
         for key, gone in (("EpisodeReference", '"e"'), ("EpisodePosterReference", 'the poster of "e"')):
             self.write("a.mp3", b"12345")
@@ -223,7 +248,11 @@ class PublishTest(PublishTestCase):
             first, *others = whole["Episodes"]
             (bundle / "Info.plist").write_bytes(plistlib.dumps(
                 {**whole, **podcast, "Episodes": [*others, {**first, **episode}]}))
-            self.published(bundle, "-b", BASE, *ALL, warnings=warnings)
+            feed = self.write("lantern.podcast/feed.xml", rss(element("title", "t"), element("description", "d"),
+                                                              "<image><url>Posters/Podcast.png</url></image>"))
+            for source in (bundle, bundle / "Info.plist", "lantern.podcast/Info.plist", feed.as_uri()):
+                self.published(source, "-b", BASE, *ALL, warnings=warnings)
+            self.assertNotIn(b"remembers", self.publish(bundle / "Info.plist", *ALL, "-").stderr)
         self.published(*self.show({"EpisodeName": "e", "EpisodeUUID": "u", "EpisodeDate": datetime(2026, 5, 4),
                                    "EpisodeReference": private, "EpisodeFileSize": 5}),
                        warnings="qel-publish: warning: its URL has a user or a password, which all can read in the "
@@ -259,8 +288,8 @@ class WrongUseTest(PublishTestCase):
             before = Path(feed).read_bytes()
             self.assertWrong(f"'{feed}' is the source itself", show, feed)
             self.assertEqual(Path(feed).read_bytes(), before)
-        feed = self.path("a b.xml")
-        before = feed.write_bytes(rss(element("title", "t"))) and feed.read_bytes()
+        feed = self.write("a b.xml", rss(element("title", "t")))
+        before = feed.read_bytes()
         self.assertWrong(f"'{feed}' is the source itself", feed.as_uri(), feed)
         self.assertEqual(feed.read_bytes(), before)
 
