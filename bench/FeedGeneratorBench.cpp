@@ -15,8 +15,9 @@ void writeFeed(benchmark::State& state) {
   for (auto _ : state) {
     QELFeedPodcastGenerator generator;
     platform::ErrorSlot error;
-    if (!generator.generateFromSource(*podcast, error))
+    if (!generator.generateFromSource(*podcast, error)) {
       throw std::runtime_error("no feed was made");
+    }
     size = generator.xmlData()->size();
   }
   state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(size));

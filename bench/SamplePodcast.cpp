@@ -15,8 +15,9 @@ std::unique_ptr<QELPodcastSource> samplePodcast(int items) {
   auto source =
       QELFeedPodcastSource::initWithURL(platform::URL::parse(platform::fileURLText(path)));
   platform::ErrorSlot error;
-  if (!source || !source->loadSourceWithError(error))
+  if (!source || !source->loadSourceWithError(error)) {
     throw std::runtime_error("the sample is wrong");
+  }
   return source;
 }
 

@@ -44,8 +44,9 @@ int _dl_find_object(void* address, dl_find_object* result) noexcept {
     for (const ElfW(Phdr) & segment : std::span(object->dlpi_phdr, object->dlpi_phnum)) {
       const std::uintptr_t begin = object->dlpi_addr + segment.p_vaddr;
       if (segment.p_type == PT_GNU_EH_FRAME) frames = begin;
-      if (segment.p_type == PT_LOAD && wanted->address - begin < segment.p_memsz)
+      if (segment.p_type == PT_LOAD && wanted->address - begin < segment.p_memsz) {
         holdsAddress = true;
+      }
     }
     if (!holdsAddress || frames == 0) return 0;
     *wanted->result = {};

@@ -52,8 +52,9 @@ class BodyCollector : public NetworkTransfer::Sink {
   /// document.
   bool begin(std::int64_t expectedLength, const std::vector<std::string>& contentCodings,
              ErrorSlot& error) override {
-    if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kIgnored, error))
+    if (!decoder_.begin(contentCodings, ContentDecoder::UnknownNames::kIgnored, error)) {
       return false;
+    }
     if (decoder_.isCoded() || expectedLength <= 0) return true;
     const auto length = static_cast<std::uint64_t>(expectedLength);
     if (length > limit_) return refuseAsTooLarge(error);

@@ -52,7 +52,8 @@ std::string BinaryPropertyList::references(const std::vector<std::uint64_t>& num
 
 std::string bigEndian(std::uint64_t number, std::size_t width) {
   std::string bytes(width, '\0');
-  for (std::size_t i = width; i > 0; --i, number >>= 8)
+  for (std::size_t i = width; i > 0; --i, number >>= 8) {
     bytes[i - 1] = static_cast<char>(number & 0xFF);
+  }
   return bytes;
 }

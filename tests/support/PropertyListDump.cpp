@@ -107,6 +107,7 @@ std::string readOutcome(std::string_view bytes) {
 }
 
 void expectOutcomes(const std::vector<PropertyListRow>& rows) {
-  for (const PropertyListRow& row : rows)
+  for (const PropertyListRow& row : rows) {
     EXPECT_EQ(readOutcome(row.bytes), row.outcome) << row.name;
+  }
 }

@@ -235,8 +235,9 @@ TEST_F(TemporaryFileTest, TriesAgainWhenAnotherHasLockedOrRemovedTheFile) {
     std::string taken;
     const Interposed locks(&InterposedCalls::flock,
                            std::function([&](int descriptor, int operation) {
-                             if (taken.empty())
+                             if (taken.empty()) {
                                interfere(directory_ / (taken = directory_.names().at(0)));
+                             }
                              return static_cast<int>(::syscall(SYS_flock, descriptor, operation));
                            }));
     ASSERT_TRUE(createWith("x", directory_ / "a"));
@@ -275,8 +276,9 @@ TEST_F(TemporaryFileTest, EndingSignalsRemoveTheFilesAndTellThemselves) {
   for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
     SCOPED_TRACE(signal);
     const int status = statusOfChild([&] {
-      if (const auto before = ::signal(signal, SIG_DFL); before != SIG_IGN)
+      if (const auto before = ::signal(signal, SIG_DFL); before != SIG_IGN) {
         ::signal(signal, before);
+      }
       TemporaryFile second;
       TemporaryFile committed;
       return createWith("x", directory_ / "a") && second.create(directory_ / "b", error_) &&

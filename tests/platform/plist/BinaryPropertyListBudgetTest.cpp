@@ -36,8 +36,9 @@ std::string dictionariesOfOneKey(std::size_t size, std::size_t count) {
 std::string overlappingKeys(std::size_t size, std::size_t count) {
   BinaryPropertyList list(4);
   std::vector<std::uint64_t> keys;
-  for (std::size_t i = 0; i < count; ++i)
+  for (std::size_t i = 0; i < count; ++i) {
     keys.push_back(list.addBytes("\x5F\x12" + bigEndian(size, 4)));
+  }
   list.addBytes(std::string(size, 'k'));
   const std::vector<std::uint64_t> values(count, list.addBytes("\x09"));
   return list.bytes(list.addDictionary(keys, values));
