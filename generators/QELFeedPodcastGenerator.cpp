@@ -1,5 +1,6 @@
 #include "generators/QELFeedPodcastGenerator.h"
 
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <string_view>
@@ -12,6 +13,7 @@
 #include "platform/net/URL.h"
 #include "platform/text/Case.h"
 #include "platform/text/FormattedText.h"
+#include "platform/xml/XMLEscaping.h"
 
 namespace {
 
@@ -41,13 +43,12 @@ std::optional<std::string_view> explicitValue(const std::optional<Text>& label) 
 }
 
 /// The location as a feed can carry it: an absolute local path becomes a file URL, a relative path
-/// and a URL stay as they are. Absent for an absent location and for an unknown reference type.
-std::optional<Text> resolvedURL(const std::optional<Text>& location,
-                                const std::optional<Text>& referenceType) {
-  if (!location || !referenceType || *referenceType == kReferenceTypeRemote) return location;
+/// and a URL stay as they are. Absent for an unknown reference type.
+std::optional<Text> resolvedURL(const Text& location, const std::optional<Text>& referenceType) {
+  if (!referenceType || *referenceType == kReferenceTypeRemote) return location;
   if (*referenceType != kReferenceTypeLocal) return std::nullopt;
-  if (!platform::isAbsolutePath(*location)) return location;
-  return Text(platform::fileURLText(*location));
+  if (!platform::isAbsolutePath(location)) return location;
+  return Text(platform::fileURLText(location));
 }
 
 void appendTextChild(XMLElement element, std::string_view name, const std::optional<Text>& text) {
@@ -55,22 +56,39 @@ void appendTextChild(XMLElement element, std::string_view name, const std::optio
 }
 
 void appendEnclosure(XMLElement item, const QELEpisode& episode) {
-  const std::optional<Text> url = resolvedURL(episode.location(), episode.referenceType());
+  const std::optional<Text> location = episode.location();
+  if (!location) return;
+  const std::optional<Text> url = resolvedURL(*location, episode.referenceType());
   if (!url) return;
   const XMLElement enclosure = item.appendChild("enclosure");
   enclosure.appendAttribute("url", *url);
   if (const auto type = episode.contentType()) enclosure.appendAttribute("type", *type);
   if (const std::uint64_t length = episode.contentLength(); length != 0) {
-    enclosure.appendAttribute("length", platform::formattedText("%lu", {length}));
+    enclosure.appendAttribute("length", std::to_string(length));
   }
+}
+
+template <typename Item>
+void appendPoster(XMLElement element, const Item& item, const QELFeedStyle& style) {
+  const auto& location = item.posterLocation();
+  if (!location) return;
+  const std::optional<Text> url = resolvedURL(*location, item.posterReferenceType());
+  if (!url) return;
+  if constexpr (isPodcast<Item>) {
+    const XMLElement image = element.appendChild("image");
+    image.appendChild("url", *url);
+    appendTextChild(image, "title", item.title());
+  }
+  element.appendChild(style.image).appendAttribute("href", *url);
 }
 
 /// Both kinds of item go through the same rows, so that their common children stand in one order.
 template <typename Item>
 void populate(XMLElement element, const Item& item, bool stampNow, const QELFeedStyle& style) {
   appendTextChild(element, "title", item.title());
-  appendTextChild(element, "dc:creator", item.author());
-  appendTextChild(element, style.author, item.author());
+  const auto& author = item.author();
+  appendTextChild(element, "dc:creator", author);
+  appendTextChild(element, style.author, author);
   if (stampNow) {
     element.appendChild("pubDate", style.dateText(style.now()));
   } else if constexpr (!isPodcast<Item>) {
@@ -81,26 +99,20 @@ void populate(XMLElement element, const Item& item, bool stampNow, const QELFeed
   if (const auto& category = item.category()) {
     element.appendChild(style.category).appendAttribute("text", *category);
   }
-  appendTextChild(element, "description", descriptionOf(item));
-  appendTextChild(element, style.summary, descriptionOf(item));
+  const std::optional<Text> description = descriptionOf(item);
+  appendTextChild(element, "description", description);
+  appendTextChild(element, style.summary, description);
   if (const auto value = explicitValue(item.advisoryLabel())) {
     element.appendChild(style.explicitness, *value);
   }
   appendTextChild(element, "qel:uuid", item.uuid());
   if constexpr (!isPodcast<Item>) {
     if (const std::int64_t order = item.orvaneOrder(); order >= 0) {
-      element.appendChild("qel:order", platform::formattedText("%ld", {order}));
+      element.appendChild("qel:order", std::to_string(order));
     }
   }
 
-  if (const auto posterURL = resolvedURL(item.posterLocation(), item.posterReferenceType())) {
-    if constexpr (isPodcast<Item>) {
-      const XMLElement image = element.appendChild("image");
-      image.appendChild("url", *posterURL);
-      appendTextChild(image, "title", item.title());
-    }
-    element.appendChild(style.image).appendAttribute("href", *posterURL);
-  }
+  appendPoster(element, item, style);
   if constexpr (isPodcast<Item>) {
     appendTextChild(element, "link", item.location());
   } else {
@@ -108,29 +120,60 @@ void populate(XMLElement element, const Item& item, bool stampNow, const QELFeed
   }
 }
 
-/// What the feed will hardly exceed, in bytes: one that moves while it grows stands in memory twice
-/// for a moment. What is not used of it costs nothing.
-std::size_t likelySize(const QELPodcastSource& source) {
-  std::size_t size = 1024;
-  // Each of these texts also brings its share of the markup, and of the texts that are short.
-  const auto add = [&size](const std::optional<Text>& text, std::size_t times) {
-    constexpr std::size_t kShare = 256;
-    if (text) size += kShare + times * text->size();
+// Sizes of feeds are counted in 64 bits: texts that many episodes share may come to more than the
+// addresses of the processor.
+
+/// What `populate` writes of the item at most, in bytes; `escaped` tells that of a text.
+template <typename Item, typename Escaped>
+std::uint64_t sizeOfItem(const Item& item, Escaped escaped) {
+  constexpr std::uint64_t kSizeOfMarkup = 128;  // of a field, whose text may stand there twice
+  constexpr std::uint64_t kTimesInPodcast = isPodcast<Item> ? 2 : 1;
+  std::uint64_t size = kSizeOfMarkup;  // that of the item, with its label and its order
+  const auto add = [&](const std::optional<Text>& text, std::uint64_t times) {
+    if (text) size += kSizeOfMarkup + times * escaped(*text);
   };
-  // A description stands there twice, and longer by what is escaped; of a path each byte may become
-  // three.
-  add(source.podcastDescription(), 3);
-  add(source.posterLocation(), 6);
-  if (!source.episodes()) return size;
-  for (const auto& episode : *source.episodes()) {
-    constexpr std::size_t kSizeOfEmptyItem = 16;
-    size += kSizeOfEmptyItem;
-    add(episode->title(), 1);
-    add(episode->episodeDescription(), 3);
-    add(episode->location(), 3);
-    add(episode->posterLocation(), 3);
+  const auto addLocation = [&](const std::optional<Text>& text, std::uint64_t times) {
+    add(text, times);
+    // Each byte of a path may become three.
+    if (text) size += 2 * times * text->size();
+  };
+  add(item.title(), kTimesInPodcast);
+  add(item.author(), 2);
+  add(item.keywords(), 1);
+  add(item.category(), 1);
+  add(descriptionOf(item), 2);
+  add(item.uuid(), 1);
+  addLocation(item.posterLocation(), kTimesInPodcast);
+  addLocation(item.location(), 1);
+  if constexpr (isPodcast<Item>) {
+    add(item.copyright(), 1);
+  } else {
+    add(item.contentType(), 1);
+    if (item.date()) size += kSizeOfMarkup;
   }
   return size;
+}
+
+template <typename Escaped>
+std::uint64_t sizeOfFeed(const QELPodcastSource& source, Escaped escaped) {
+  constexpr std::uint64_t kSizeOfEmptyFeed = 1024;
+  std::uint64_t size = kSizeOfEmptyFeed + sizeOfItem(source, escaped);
+  if (!source.episodes()) return size;
+  for (const auto& episode : *source.episodes()) size += sizeOfItem(*episode, escaped);
+  return size;
+}
+
+/// What the feed takes at most, in bytes: one that moves while it grows stands in memory twice for
+/// a moment. What is not used of it costs nothing but addresses, so the texts are only read for it
+/// where those would be very many.
+std::uint64_t sizeOfFeed(const QELPodcastSource& source) {
+  constexpr std::uint64_t kVeryMany = std::uint64_t{512} << 20;
+  constexpr std::uint64_t kLongestReference = std::string_view("&quot;").size();
+  const std::uint64_t size =
+      sizeOfFeed(source, [](const Text& text) { return kLongestReference * text.size(); });
+  if (size <= kVeryMany) return size;
+  return sizeOfFeed(
+      source, [](const Text& text) { return text.size() + platform::sizeOfReferences(text); });
 }
 
 }  // namespace
@@ -141,7 +184,8 @@ bool QELFeedPodcastGenerator::generateFromSource(QELPodcastSource& source,
   platform::XMLWriter document(bytes,
                                {.indentation = ' ', .indentationWidth = 2, .emptyTagEnd = " />"});
   if (format_ == "rss") {
-    bytes.reserve(likelySize(source));
+    bytes.reserve(
+        static_cast<std::size_t>(std::min<std::uint64_t>(sizeOfFeed(source), bytes.max_size())));
     addRSS(document, source);
   } else if (format_ != "atom") {
     error =

@@ -275,6 +275,20 @@ TEST(QELFeedPodcastGeneratorTest, EmptyTextsAreWritten) {
   EXPECT_EQ(channelOf(source), channel("<title></title><orvane:category text=\"\" />"));
 }
 
+TEST(QELFeedPodcastGeneratorTest, RoomForMuchIsNotMadeAsIfAllOfItWereEscaped) {
+  constexpr std::size_t kEpisodes = 50;
+  constexpr std::size_t kSize = std::size_t{1} << 20;
+  const auto episode = unorderedEpisode();
+  episode->setEpisodeDescription(std::string(kSize, '\1'));  // none of which is written
+  QELPodcastSource source;
+  source.setEpisodes(std::make_shared<QELEpisodeList>(kEpisodes, episode));
+  QELFeedPodcastGenerator generator;
+  platform::ErrorSlot error;
+  ASSERT_TRUE(generator.generateFromSource(source, error));
+  EXPECT_GE(generator.xmlData()->capacity(), 2 * kEpisodes * kSize);
+  EXPECT_LE(generator.xmlData()->capacity(), 2 * kEpisodes * kSize + 16'384);
+}
+
 TEST(QELFeedPodcastGeneratorTest, AtomIsAnEmptyDocument) {
   QELPodcastSource source;
   source.setTitle("t");

@@ -253,29 +253,48 @@ LISTS = _lists(
            64),
 )
 
-def _shared(text, count_of):
-    """Episodes that share one, whose description is shared, too; and data, so that the size is what it is."""
+def _shared(fields, count_of):
+    """Episodes that share one, whose fields are shared, too; and data, so that the size is what it is."""
     def make(size):
-        return binary_podcast(b"Episodes", array_object(b"\3" * count_of(size)), dictionary_object({4: 5}),
-                              ascii_object(b"EpisodeDescription"), ascii_object(text),
+        keys = range(4, 4 + 2 * len(fields), 2)
+        objects = [ascii_object(part) for field in fields.items() for part in field]
+        return binary_podcast(b"Episodes", array_object(b"\3" * count_of(size)),
+                              dictionary_object({key: key + 1 for key in keys}), *objects,
                               counted(0x4, size) + bytes(size), offset_size=4)
     return make
 
 
+def _described(text, count_of):
+    return _shared({b"EpisodeDescription": text}, count_of)
+
+
+_PATH = b"/" + b" " * 10_000  # each of which becomes three bytes
+
+# Paths count for less than they take, so that room for a feed is to be made for all that stands beside them, too.
+_BESIDE_PATHS = tuple(Family(f"binary: paths and {key.decode()}, shared, to a feed", _shared(
+    {b"EpisodeReference": _PATH, b"EpisodePosterReference": _PATH, key: text}, lambda size: size // 1250), RECORDS,
+                             "createfeed") for key, text in (
+    (b"EpisodeAuthor", b"t" * 2000), (b"EpisodeKeywords", b"t" * 2000), (b"EpisodeCategory", b"t" * 2000),
+    (b"EpisodeUUID", b"t" * 2000), (b"EpisodeType", b"t" * 2000), (b"EpisodeName", b"&" * 400),
+    (b"EpisodeDescription", b"&" * 400)))
+
 # With what is given, some 6 MB and 40 bytes for each, three in four of these texts are written.
 INTO_FEEDS = _lists(
     Family("binary: ordinary episodes, to a feed", lambda size: _binary_episodes(size // 400), command="createfeed"),
-    Family("binary: one text, shared, to a feed", _shared(b"t" * 10_000, lambda size: size // 700), RECORDS,
+    Family("binary: one text, shared, to a feed", _described(b"t" * 10_000, lambda size: size // 700), RECORDS,
            "createfeed"),
-    Family("binary: one text of markup, shared, to a feed", _shared(b"&" * 10_000, lambda size: size // 6000), RECORDS,
-           "createfeed"),
-    Family("binary: one text of markup, shared too often, to a feed", _shared(b"&" * 10_000, lambda size: size // 10),
-           RECORDS, "createfeed", NO_LIST),
+    Family("binary: one author, shared, to a feed", _shared(
+        {b"EpisodeAuthor": b"t" * 10_000}, lambda size: size // 520), RECORDS, "createfeed"),
+    Family("binary: one text of markup, shared, to a feed", _described(b"&" * 10_000, lambda size: size // 6000),
+           RECORDS, "createfeed"),
+    Family("binary: one text of markup, shared too often, to a feed", _described(
+        b"&" * 10_000, lambda size: size // 10), RECORDS, "createfeed", NO_LIST),
     Family("binary: one long text of markup, to a feed", lambda size: binary_podcast(
         b"PodcastDescription", ascii_object(b"&" * size)), command="createfeed"),
     Family("binary: distinct episodes of one letter, to a feed", lambda size: binary_podcast(
         b"Episodes", array_object(range(5, 5 + size // 18), 4), ascii_object(b"EpisodeName"), ascii_object(b"n"),
         *[dictionary_object({3: 4}, 4)] * (size // 18), **_WIDE), RECORDS, "createfeed"),
+    *_BESIDE_PATHS,
 )
 
 
