@@ -5,8 +5,7 @@
 namespace platform {
 
 bool MemoryBudget::takeWritten(std::string_view text) {
-  // Room for a feed is made for texts as they are, so that one that is much longer when it is
-  // escaped stands in memory twice while it is written.
+  // A feed holds authors and descriptions twice, and may hold three bytes for one of a path.
   constexpr std::uint64_t kTimesWritten = 2;
   return take(kTimesWritten * (text.size() + 2 * std::uint64_t{sizeOfReferences(text)}));
 }
