@@ -224,6 +224,13 @@ TEST(FeedParserTest, LinksCarryUuids) {
   EXPECT_EQ(feed.episodes.at(0), Dictionary());
 }
 
+TEST(FeedParserTest, LinksAreSearchedFromTheirBeginning) {
+  const std::string before = "<link>" + std::string(100, 'x') + "</link><title>t</title>";
+  const Dictionary expected{{"title", "t"}, {"QELUUID", kUuid}};
+  EXPECT_EQ(channelWith(before + "<link>collection/uuid/" + kUuid + "</link>"), expected);
+  EXPECT_EQ(itemWith(before + "<link>document/uuid/" + kUuid + "</link>"), expected);
+}
+
 TEST(FeedParserTest, ShortUuidIsIgnored) {
   const std::string text = std::string(kUuid).substr(1);
   EXPECT_EQ(channelWith("<link>collection/uuid/" + text + "</link>"), Dictionary());

@@ -31,6 +31,7 @@ TEST(URLFaultTest, SaysHowAURLIsMended) {
            Row{"https://h/#x#y", "a second \"#\" is written %23"},
            Row{"https:///a", "it has no host"},
            Row{"https://user@/a", "it has no host"},
+           Row{"https://:80/a", "it has no host"},
            Row{"http:a", "it has no host"},
            Row{"https://h:http/a", "\"http\" is no port"},
            Row{"https://[::1]:65536/a", "\"65536\" is no port"},
