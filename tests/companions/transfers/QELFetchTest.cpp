@@ -92,6 +92,18 @@ TEST_F(QELFetchTest, OneThatIsCancelledGoesOnWithItsPart) {
   EXPECT_EQ(contentOf(directory_ / "1.mp3"), "first last");
 }
 
+TEST_F(QELFetchTest, WhatAppearsMeanwhileUnderTheNameStays) {
+  server_.serve("/", [this](Connection& connection) {
+    directory_.addFile("1.mp3", "of another program");
+    connection.send(std::string(kHalf) + "\r\nfirst last");
+  });
+  QELFetch fetch = download();
+  run(fetch);
+  EXPECT_EQ(fetch.state(), State::kFailed);
+  EXPECT_EQ(fetch.cause(), "File exists");
+  EXPECT_EQ(contentOf(directory_ / "1.mp3"), "of another program");
+}
+
 TEST_F(QELFetchTest, OneThatIsCancelledLeavesNoPartThatNothingVouchesFor) {
   server_.serve("/", std::string(kHalf) + "\r\nfirst");
   QELFetch fetch = download();
