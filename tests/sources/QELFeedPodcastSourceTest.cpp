@@ -90,6 +90,13 @@ TEST_F(QELFeedPodcastSourceTest, AtomIsRefusedWithCodeThree) {
   EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 3, "The feed was neither RSS nor Atom"}));
 }
 
+TEST_F(QELFeedPodcastSourceTest, EmptyFilesAreRefusedWithCodeThree) {
+  platform::ErrorSlot error;
+  EXPECT_FALSE(sourceFor("")->loadSourceWithError(error));
+  EXPECT_EQ(error, (platform::ErrorRecord{"QELDomain", 3,
+                                          "Could not load or read the specified feed URL"}));
+}
+
 TEST_F(QELFeedPodcastSourceTest, FailedReadPassesItsRecordOn) {
   const auto source =
       QELFeedPodcastSource::initWithURL(platform::URL::parse("file:///nowhere/f.xml"));

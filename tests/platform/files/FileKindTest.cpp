@@ -18,6 +18,7 @@ TEST(FileKindTest, FirstBytesTellTheKind) {
   EXPECT_EQ(kindOfBytes("\xFF\xF9"), "an AAC file");
   EXPECT_EQ(kindOfBytes("\xFF\xD8\xFF"), "a JPEG picture");
   EXPECT_EQ(kindOfBytes("\xEF\xBB\xBF\r\n <HTML>"), kHTMLPage);
+  EXPECT_EQ(kindOfBytes("\xEF\xBB\xBF<head>"), kHTMLPage);
   for (const std::string_view head : {"", "\xFF", "\xFF\xE9", "\xFF\xE0", "\xFF\x7B", "\xFF\xBB",
                                       "\xFF\xDB", "\xFE\xFB", "RIFF", "<htm", "text"}) {
     EXPECT_EQ(kindOfBytes(head), std::nullopt) << head;
