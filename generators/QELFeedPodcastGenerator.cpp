@@ -123,14 +123,14 @@ void populate(XMLElement element, const Item& item, bool stampNow, const QELFeed
 // Sizes of feeds are counted in 64 bits: texts that many episodes share may come to more than the
 // addresses of the processor.
 
-/// What `populate` writes of the item at most, in bytes; `escaped` tells that of a text.
-template <typename Item, typename Escaped>
-std::uint64_t sizeOfItem(const Item& item, Escaped escaped) {
+/// What `populate` writes of the item at most, in bytes.
+template <typename Item>
+std::uint64_t sizeOfItem(const Item& item) {
   constexpr std::uint64_t kSizeOfMarkup = 128;  // of a field, whose text may stand there twice
   constexpr std::uint64_t kTimesInPodcast = isPodcast<Item> ? 2 : 1;
   std::uint64_t size = kSizeOfMarkup;  // that of the item, with its label and its order
   const auto add = [&](const std::optional<Text>& text, std::uint64_t times) {
-    if (text) size += kSizeOfMarkup + times * escaped(*text);
+    if (text) size += kSizeOfMarkup + times * (text->size() + platform::sizeOfReferences(*text));
   };
   const auto addLocation = [&](const std::optional<Text>& text, std::uint64_t times) {
     add(text, times);
@@ -154,26 +154,14 @@ std::uint64_t sizeOfItem(const Item& item, Escaped escaped) {
   return size;
 }
 
-template <typename Escaped>
-std::uint64_t sizeOfFeed(const QELPodcastSource& source, Escaped escaped) {
-  constexpr std::uint64_t kSizeOfEmptyFeed = 1024;
-  std::uint64_t size = kSizeOfEmptyFeed + sizeOfItem(source, escaped);
-  if (!source.episodes()) return size;
-  for (const auto& episode : *source.episodes()) size += sizeOfItem(*episode, escaped);
-  return size;
-}
-
 /// What the feed takes at most, in bytes: one that moves while it grows stands in memory twice for
-/// a moment. What is not used of it costs nothing but addresses, so the texts are only read for it
-/// where those would be very many.
+/// a moment.
 std::uint64_t sizeOfFeed(const QELPodcastSource& source) {
-  constexpr std::uint64_t kVeryMany = std::uint64_t{512} << 20;
-  constexpr std::uint64_t kLongestReference = std::string_view("&quot;").size();
-  const std::uint64_t size =
-      sizeOfFeed(source, [](const Text& text) { return kLongestReference * text.size(); });
-  if (size <= kVeryMany) return size;
-  return sizeOfFeed(
-      source, [](const Text& text) { return text.size() + platform::sizeOfReferences(text); });
+  constexpr std::uint64_t kSizeOfEmptyFeed = 1024;
+  std::uint64_t size = kSizeOfEmptyFeed + sizeOfItem(source);
+  if (!source.episodes()) return size;
+  for (const auto& episode : *source.episodes()) size += sizeOfItem(*episode);
+  return size;
 }
 
 }  // namespace
